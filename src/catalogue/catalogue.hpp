@@ -1,0 +1,274 @@
+// The catalogue: one row for every export of the library.
+//
+// A row names the export, says whether this build has it, and gives its SQL
+// name, frame variant, the layouts of its inputs and results, its
+// properties, the SYSFUN codes it can raise and a one-line summary.  From
+// this table come the linker's export list (the build reads the rows that
+// are marked Built::yes), the SQLite host's registrations, the function
+// reference in docs/functions.md and the test that the library exports
+// exactly what the table says.  Adding a routine is its logic plus setting
+// its row to Built::yes.
+//
+// Keep each row on one line that starts with {"<export>", Built::<state>:
+// the build reads the rows by that shape.
+#pragma once
+
+#include <cstddef>
+#include <cstdint>
+#include <string_view>
+
+namespace cli::catalogue {
+
+// Value layouts of the frame.
+enum class Layout : std::uint8_t {
+  none,        // an unused slot
+  int16,       // 16-bit signed integer
+  int32,       // 32-bit signed integer
+  int64,       // 64-bit signed integer
+  real,        // 64-bit IEEE 754 double
+  text,        // terminated text
+  lob,         // CLI_udfLob: 32-bit length, then the data
+  fixedText,   // exactly `size` bytes, filled up with blanks, no terminator
+  fixedBytes,  // exactly `size` opaque bytes
+};
+
+// One input or result.  `size` is, for a text result, the longest text the
+// routine can write (its area holds one byte more); for a CLI_udfLob result,
+// the capacity of the area's data; for fixed layouts, the byte count.
+struct Slot {
+  Layout layout = Layout::none;
+  std::uint32_t size = 0;
+  const char *name = nullptr;
+};
+
+// The extras behind the diagnostic message buffer.
+enum class Frame : std::uint8_t {
+  plain,          // none
+  dbinfo,         // database information block
+  scratchpad,     // scratchpad
+  table,          // scratchpad, call type
+  tableCallback,  // scratchpad, call type, table-function callback
+};
+
+enum class Built : bool { no, yes };
+
+// Properties, as bits.
+enum : unsigned {
+  kDeterministic = 1u,  // the same inputs always give the same result
+  kInnocuous = 2u,      // no side effects and no access to outside state
+  kHandlesNull = 4u,    // reads its input indicators itself
+};
+inline constexpr unsigned kPure = kDeterministic | kInnocuous;
+
+inline constexpr std::size_t kMaxInputs = 4;
+inline constexpr std::size_t kMaxResults = 18;
+
+struct Routine {
+  const char *symbol;
+  Built built;
+  const char *sqlName;
+  Frame frame;
+  Slot inputs[kMaxInputs];
+  Slot results[kMaxResults];
+  unsigned properties;
+  const char *sysfunCodes;  // the SYSFUN codes it can raise, "" for none
+  const char *summary;
+};
+
+// Slot makers.  Inputs carry a name for the reference; results a size.
+constexpr Slot int16(const char *name = "") { return {Layout::int16, 0, name}; }
+constexpr Slot int32(const char *name = "") { return {Layout::int32, 0, name}; }
+constexpr Slot int64(const char *name = "") { return {Layout::int64, 0, name}; }
+constexpr Slot real(const char *name = "") { return {Layout::real, 0, name}; }
+constexpr Slot text(const char *name) { return {Layout::text, 0, name}; }
+constexpr Slot lob(const char *name) { return {Layout::lob, 0, name}; }
+constexpr Slot bytes(std::uint32_t size, const char *name) {
+  return {Layout::fixedBytes, size, name};
+}
+constexpr Slot textOf(std::uint32_t longest) { return {Layout::text, longest, ""}; }
+constexpr Slot lobOf(std::uint32_t capacity) { return {Layout::lob, capacity, ""}; }
+constexpr Slot fixedText(std::uint32_t size) { return {Layout::fixedText, size, ""}; }
+
+inline constexpr std::uint32_t kText = 4000;    // longest terminated text built
+inline constexpr std::uint32_t kLob = 1048576;  // longest CLI_udfLob string
+inline constexpr std::uint32_t kStamp = 26;     // a timestamp text
+inline constexpr std::uint32_t kName = 101;     // a day or month name
+
+// clang-format off
+inline constexpr Routine kRoutines[] = {
+  // Day and second counts
+  {"CLI_udfJULIAN_DAY1", Built::no, "JULIAN_DAY", Frame::plain, {text("date")}, {int32()}, kPure, "04", "Julian day number of the date at the head of the text; what stands behind the date is not read."},
+  {"CLI_udfJULIAN_DAY2", Built::no, "JULIAN_DAY", Frame::plain, {text("date")}, {int32()}, kPure, "04 06", "Julian day number of a date or timestamp, validated to its end."},
+  {"CLI_udfMIDNIGHT_SECONDS1", Built::no, "MIDNIGHT_SECONDS", Frame::plain, {text("time")}, {int32()}, kPure, "05", "Seconds since midnight of a time."},
+  {"CLI_udfMIDNIGHT_SECONDS2", Built::no, "MIDNIGHT_SECONDS", Frame::plain, {text("value")}, {int32()}, kPure, "04 05 06", "Seconds since midnight of a time, or of the time of day of a timestamp."},
+  // Timestamps
+  {"CLI_udfTIMESTAMP", Built::no, "TIMESTAMP", Frame::plain, {text("value")}, {textOf(kStamp)}, kInnocuous, "04 05 06", "Timestamp text from a date, a time (on today's UTC date) or a timestamp."},
+  {"CLI_udfTIMESTAMPDATE", Built::no, "TIMESTAMPDATE", Frame::plain, {text("date")}, {textOf(kStamp)}, kPure, "04", "Timestamp text of a date at midnight."},
+  {"CLI_udfTIMESTAMPTIME", Built::no, "TIMESTAMPTIME", Frame::plain, {text("time")}, {textOf(kStamp)}, kInnocuous, "05", "Timestamp text of a time on today's UTC date."},
+  // Timestamp durations
+  {"CLI_udfTIMESTAMPDIFF", Built::no, "TIMESTAMPDIFF", Frame::plain, {int32("interval"), text("duration")}, {int32()}, kPure, "03 07 08 10", "A timestamp duration as a number of the unit that the interval code names."},
+  // Weeks
+  {"CLI_udfWEEK1", Built::no, "WEEK", Frame::plain, {text("date")}, {int32()}, kPure, "04", "Week of the year, weeks starting on Sunday, of the date at the head of the text."},
+  {"CLI_udfWEEK2", Built::no, "WEEK", Frame::plain, {text("date")}, {int32()}, kPure, "04 06", "Week of the year, weeks starting on Sunday, of a date or timestamp."},
+  {"CLI_udfWEEK_ISO1", Built::no, "WEEK_ISO", Frame::plain, {text("date")}, {int32()}, kPure, "04", "ISO 8601 week number of the date at the head of the text."},
+  {"CLI_udfWEEK_ISO2", Built::no, "WEEK_ISO", Frame::plain, {text("date")}, {int32()}, kPure, "04 06", "ISO 8601 week number of a date or timestamp."},
+  // Numbers in a date
+  {"CLI_udfQUARTER1", Built::no, "QUARTER", Frame::plain, {text("date")}, {int32()}, kPure, "04", "Quarter of the year of the date at the head of the text."},
+  {"CLI_udfQUARTER2", Built::no, "QUARTER", Frame::plain, {text("date")}, {int32()}, kPure, "04 06", "Quarter of the year of a date or timestamp."},
+  {"CLI_udfDAYOFYEAR1", Built::no, "DAYOFYEAR", Frame::plain, {text("date")}, {int32()}, kPure, "04", "Ordinal day in the year of the date at the head of the text."},
+  {"CLI_udfDAYOFYEAR2", Built::no, "DAYOFYEAR", Frame::plain, {text("date")}, {int32()}, kPure, "04 06", "Ordinal day in the year of a date or timestamp."},
+  {"CLI_udfDAYOFWEEK1", Built::no, "DAYOFWEEK", Frame::plain, {text("date")}, {int32()}, kPure, "04 06", "Day of the week, Sunday = 1, of a date or timestamp."},
+  {"CLI_udfDAYOFWEEK2", Built::no, "DAYOFWEEK", Frame::plain, {text("date")}, {int32()}, kPure, "04", "Day of the week, Sunday = 1, of the date at the head of the text."},
+  {"CLI_udfDAYOFWEEK_ISO1", Built::no, "DAYOFWEEK_ISO", Frame::plain, {text("date")}, {int32()}, kPure, "04 06", "Day of the week, Monday = 1, of a date or timestamp."},
+  {"CLI_udfDAYOFWEEK_ISO2", Built::no, "DAYOFWEEK_ISO", Frame::plain, {text("date")}, {int32()}, kPure, "04", "Day of the week, Monday = 1, of the date at the head of the text."},
+  // Names in a date
+  {"CLI_udfDAYNAME1", Built::no, "DAYNAME", Frame::dbinfo, {text("date")}, {textOf(kName)}, kInnocuous, "03 04 06", "Name of the day of the week of a date or timestamp, in the server's language."},
+  {"CLI_udfDAYNAME2", Built::no, "DAYNAME", Frame::dbinfo, {text("date")}, {textOf(kName)}, kInnocuous, "03 04", "Name of the day of the week of the date at the head of the text."},
+  {"CLI_udfMONTHNAME1", Built::no, "MONTHNAME", Frame::dbinfo, {text("date")}, {textOf(kName)}, kInnocuous, "03 04", "Name of the month of the date at the head of the text, in the server's language."},
+  {"CLI_udfMONTHNAME2", Built::no, "MONTHNAME", Frame::dbinfo, {text("date")}, {textOf(kName)}, kInnocuous, "03 04 06", "Name of the month of a date or timestamp."},
+  // Integer and sign
+  {"CLI_udfABS1", Built::no, "ABS", Frame::plain, {real("x")}, {real()}, kPure, "", "Absolute value of a double: its sign bit cleared."},
+  {"CLI_udfABS2", Built::no, "ABS", Frame::plain, {int32("x")}, {int32()}, kPure, "", "Absolute value of a 32-bit integer."},
+  {"CLI_udfABS3", Built::no, "ABS", Frame::plain, {int16("x")}, {int16()}, kPure, "", "Absolute value of a 16-bit integer."},
+  {"CLI_udfABS4", Built::no, "ABS", Frame::plain, {int64("x")}, {int64()}, kPure, "01", "Absolute value of a 64-bit integer."},
+  {"CLI_udfSIGN1", Built::no, "SIGN", Frame::plain, {real("x")}, {real()}, kPure, "", "Sign of a double: -1.0, 0.0 or 1.0."},
+  {"CLI_udfSIGN2", Built::no, "SIGN", Frame::plain, {int32("x")}, {int32()}, kPure, "", "Sign of a 32-bit integer."},
+  {"CLI_udfSIGN3", Built::no, "SIGN", Frame::plain, {int16("x")}, {int16()}, kPure, "", "Sign of a 16-bit integer."},
+  {"CLI_udfSIGN4", Built::no, "SIGN", Frame::plain, {int64("x")}, {int64()}, kPure, "", "Sign of a 64-bit integer."},
+  {"CLI_udfMOD1", Built::no, "MOD", Frame::plain, {int32("x"), int32("y")}, {int32()}, kPure, "02", "Remainder of 32-bit integers, with the sign of the dividend."},
+  {"CLI_udfMOD2", Built::no, "MOD", Frame::plain, {int16("x"), int16("y")}, {int16()}, kPure, "03", "Remainder of 16-bit integers, with the sign of the dividend."},
+  {"CLI_udfMOD3", Built::no, "MOD", Frame::plain, {int64("x"), int64("y")}, {int64()}, kPure, "03", "Remainder of 64-bit integers, with the sign of the dividend."},
+  {"CLI_udfCEILING1", Built::no, "CEILING", Frame::plain, {real("x")}, {real()}, kPure, "", "Smallest whole double not below x."},
+  {"CLI_udfCEILING2", Built::no, "CEILING", Frame::plain, {int32("x")}, {int32()}, kPure, "", "A 32-bit integer, unchanged."},
+  {"CLI_udfCEILING3", Built::no, "CEILING", Frame::plain, {int16("x")}, {int16()}, kPure, "", "A 16-bit integer, unchanged."},
+  {"CLI_udfCEILING4", Built::no, "CEILING", Frame::plain, {int64("x")}, {int64()}, kPure, "", "A 64-bit integer, unchanged."},
+  {"CLI_udfFLOOR1", Built::no, "FLOOR", Frame::plain, {real("x")}, {real()}, kPure, "", "Largest whole double not above x."},
+  {"CLI_udfFLOOR2", Built::no, "FLOOR", Frame::plain, {int32("x")}, {int32()}, kPure, "", "A 32-bit integer, unchanged."},
+  {"CLI_udfFLOOR3", Built::no, "FLOOR", Frame::plain, {int16("x")}, {int16()}, kPure, "", "A 16-bit integer, unchanged."},
+  {"CLI_udfFLOOR4", Built::no, "FLOOR", Frame::plain, {int64("x")}, {int64()}, kPure, "", "A 64-bit integer, unchanged."},
+  // Cutting digits
+  {"CLI_udfROUND1", Built::no, "ROUND", Frame::plain, {real("x"), int32("n")}, {real()}, kPure, "03", "A double rounded to n decimal places (n < 0: left of the point)."},
+  {"CLI_udfROUND2", Built::no, "ROUND", Frame::plain, {int32("x"), int32("n")}, {int32()}, kPure, "03", "A 32-bit integer rounded to n decimal places."},
+  {"CLI_udfROUND5", Built::no, "ROUND", Frame::plain, {int64("x"), int32("n")}, {int64()}, kPure, "03", "A 64-bit integer rounded to n decimal places, without floating point."},
+  {"CLI_udfTRUNCATE1", Built::no, "TRUNCATE", Frame::plain, {real("x"), int32("n")}, {real()}, kPure, "03", "A double cut to n decimal places."},
+  {"CLI_udfTRUNCATE2", Built::no, "TRUNCATE", Frame::plain, {int32("x"), int32("n")}, {int32()}, kPure, "03", "A 32-bit integer cut to n decimal places."},
+  {"CLI_udfTRUNCATE5", Built::no, "TRUNCATE", Frame::plain, {int64("x"), int32("n")}, {int64()}, kPure, "", "A 64-bit integer cut to n decimal places, without floating point."},
+  // Powers
+  {"CLI_udfPOWER1", Built::no, "POWER", Frame::plain, {real("x"), real("y")}, {real()}, kPure, "01 03", "x to the power y, in doubles."},
+  {"CLI_udfPOWER2", Built::no, "POWER", Frame::plain, {real("x"), int32("y")}, {real()}, kPure, "01 03", "A double to a whole power."},
+  {"CLI_udfPOWER3", Built::no, "POWER", Frame::plain, {int32("x"), int32("y")}, {int32()}, kPure, "01 03", "A 32-bit integer to a whole power, rounded to 32 bits."},
+  {"CLI_udfPOWER4", Built::no, "POWER", Frame::plain, {int64("x"), int64("y")}, {int64()}, kPure, "01 03", "A 64-bit integer to a whole power, by exact multiplication."},
+  // Elementary
+  {"CLI_udfSIN", Built::no, "SIN", Frame::plain, {real("x")}, {real()}, kPure, "", "Sine of x radians."},
+  {"CLI_udfCOS", Built::no, "COS", Frame::plain, {real("x")}, {real()}, kPure, "", "Cosine of x radians."},
+  {"CLI_udfTAN", Built::no, "TAN", Frame::plain, {real("x")}, {real()}, kPure, "01", "Tangent of x radians."},
+  {"CLI_udfCOT", Built::no, "COT", Frame::plain, {real("x")}, {real()}, kPure, "02", "Cotangent of x radians."},
+  {"CLI_udfASIN", Built::no, "ASIN", Frame::plain, {real("x")}, {real()}, kPure, "01", "Arc sine in radians."},
+  {"CLI_udfACOS", Built::no, "ACOS", Frame::plain, {real("x")}, {real()}, kPure, "01", "Arc cosine in radians."},
+  {"CLI_udfATAN", Built::no, "ATAN", Frame::plain, {real("x")}, {real()}, kPure, "", "Arc tangent in radians."},
+  {"CLI_udfATAN2", Built::no, "ATAN2", Frame::plain, {real("a"), real("b")}, {real()}, kPure, "02", "Arc tangent of a / b in radians, by quadrant."},
+  {"CLI_udfLOG", Built::no, "LOG", Frame::plain, {real("x")}, {real()}, kPure, "01", "Natural logarithm."},
+  {"CLI_udfLOG10", Built::no, "LOG10", Frame::plain, {real("x")}, {real()}, kPure, "01", "Logarithm to base 10."},
+  {"CLI_udfEXP", Built::no, "EXP", Frame::plain, {real("x")}, {real()}, kPure, "03", "e to the power x."},
+  {"CLI_udfSQRT", Built::no, "SQRT", Frame::plain, {real("x")}, {real()}, kPure, "01", "Square root."},
+  {"CLI_udfDEGREES1", Built::no, "DEGREES", Frame::plain, {real("x")}, {real()}, kPure, "", "Radians in degrees."},
+  {"CLI_udfRADIANS1", Built::no, "RADIANS", Frame::plain, {real("x")}, {real()}, kPure, "", "Degrees in radians."},
+  // Random
+  {"CLI_udfRAND1", Built::no, "RAND", Frame::plain, {}, {real()}, kInnocuous, "", "A pseudo-random double from 0.0 to 1.0."},
+  {"CLI_udfRAND2", Built::no, "RAND", Frame::scratchpad, {int32("seed")}, {real()}, kInnocuous, "", "A pseudo-random double from 0.0 to 1.0; the first call of a statement seeds the generator."},
+  // Number text
+  {"CLI_udfCHARTODOUBLE", Built::no, "CHARTODOUBLE", Frame::plain, {text("text")}, {real()}, kPure, "11", "The number that a text spells, as a double."},
+  {"CLI_udfDOUBLETOCHAR", Built::no, "DOUBLETOCHAR", Frame::plain, {real("x")}, {fixedText(24)}, kPure, "", "A double in short scientific notation, 24 bytes filled up with blanks."},
+  // Basic strings
+  {"CLI_udfSPACE", Built::yes, "SPACE", Frame::plain, {int32("count")}, {textOf(kText)}, kPure, "01", "count blanks, 0 to 4000."},
+  {"CLI_udfLCASE1", Built::yes, "LCASE", Frame::plain, {text("string")}, {textOf(kText)}, kPure, "", "The string with each byte lowered by the process's locale."},
+  {"CLI_udfLCASE2", Built::yes, "LCASE", Frame::plain, {lob("string")}, {lobOf(kLob)}, kPure, "", "The string with each byte lowered by the process's locale; NUL bytes are data."},
+  {"CLI_udfRTRIM1", Built::yes, "RTRIM", Frame::plain, {text("string")}, {textOf(kText)}, kPure, "", "The string without trailing blanks and tabs."},
+  {"CLI_udfRTRIM2", Built::yes, "RTRIM", Frame::plain, {lob("string")}, {lobOf(kLob)}, kPure, "", "The string without trailing blanks and tabs."},
+  {"CLI_udfLTRIM1", Built::yes, "LTRIM", Frame::plain, {text("string")}, {textOf(kText)}, kPure, "", "The string without leading blanks and tabs."},
+  {"CLI_udfLTRIM2", Built::yes, "LTRIM", Frame::plain, {lob("string")}, {lobOf(kLob)}, kPure, "", "The string without leading blanks and tabs."},
+  {"CLI_udfLEFT1", Built::yes, "LEFT", Frame::plain, {text("string"), int32("n")}, {textOf(kText)}, kPure, "01", "The first n bytes, filled up with blanks; n from 0 to 4000."},
+  {"CLI_udfLEFT2", Built::yes, "LEFT", Frame::plain, {lob("string"), int32("n")}, {lobOf(kLob)}, kPure, "01", "The first n bytes, filled up with blanks; n from 0 to the capacity minus 1."},
+  {"CLI_udfRIGHT1", Built::yes, "RIGHT", Frame::plain, {text("string"), int32("n")}, {textOf(kText)}, kPure, "01", "The last n bytes, or the string followed by blanks up to n; n from 0 to 4000."},
+  {"CLI_udfRIGHT2", Built::yes, "RIGHT", Frame::plain, {lob("string"), int32("n")}, {lobOf(kLob)}, kPure, "01", "The last n bytes, or the string followed by blanks up to n; n from 0 to the capacity."},
+  {"CLI_udfREPEAT1", Built::yes, "REPEAT", Frame::plain, {text("string"), int32("count")}, {textOf(kText)}, kPure, "10", "The string count times; the result at most 4000 bytes."},
+  {"CLI_udfREPEAT2", Built::yes, "REPEAT", Frame::plain, {lob("string"), int32("count")}, {lobOf(kLob)}, kPure, "10", "The string count times; the result at most 1048576 bytes."},
+  {"CLI_udfCHAR", Built::yes, "CHAR", Frame::plain, {int32("code")}, {textOf(1)}, kPure, "", "The byte of a code 1 to 255; 0 gives a blank, anything else 0xFF."},
+  {"CLI_udfASCII1", Built::yes, "ASCII", Frame::plain, {text("string")}, {int32()}, kPure, "", "The first byte as a number 0 to 255; 0 for empty text."},
+  {"CLI_udfASCII2", Built::yes, "ASCII", Frame::plain, {text("string")}, {int32()}, kPure, "", "The first byte as a number 0 to 255; 0 for empty text."},
+  {"CLI_udfASCII3", Built::yes, "ASCII", Frame::plain, {lob("string")}, {int32()}, kPure, "", "The first byte as a number 0 to 255; 0 for an empty string."},
+  // Searching
+  {"CLI_udfLOCATE1", Built::no, "LOCATE", Frame::plain, {text("search"), text("string"), int32("start")}, {int32()}, kPure, "01", "Position of the first match at or after start, counted from 1; 0 for none."},
+  {"CLI_udfLOCATE2", Built::no, "LOCATE", Frame::plain, {lob("search"), lob("string"), int32("start")}, {int32()}, kPure, "01", "Position of the first match at or after start, counted from 1; 0 for none."},
+  {"CLI_udfLOCATE3", Built::no, "LOCATE", Frame::plain, {text("search"), text("string")}, {int32()}, kPure, "", "Position of the first match, counted from 1; 0 for none."},
+  {"CLI_udfLOCATE4", Built::no, "LOCATE", Frame::plain, {lob("search"), lob("string")}, {int32()}, kPure, "", "Position of the first match, counted from 1; 0 for none."},
+  // Rebuilding
+  {"CLI_udfREPLACE1", Built::no, "REPLACE", Frame::plain, {text("source"), text("search"), text("replacement")}, {textOf(kText)}, kPure, "10", "The source with every match of search, left to right, replaced."},
+  {"CLI_udfREPLACE2", Built::no, "REPLACE", Frame::plain, {lob("source"), lob("search"), lob("replacement")}, {lobOf(kLob)}, kPure, "10", "The source with every match of search, left to right, replaced."},
+  {"CLI_udfINSERT1", Built::no, "INSERT", Frame::plain, {text("source"), int32("start"), int32("length"), text("insert")}, {textOf(kText)}, kPure, "01 10", "The source with length bytes from start replaced by the new string."},
+  {"CLI_udfINSERT2", Built::no, "INSERT", Frame::plain, {lob("source"), int32("start"), int32("length"), lob("insert")}, {lobOf(kLob)}, kPure, "01 10", "The source with length bytes from start replaced by the new string."},
+  // Phonetic
+  {"CLI_udfSOUNDEX", Built::no, "SOUNDEX", Frame::plain, {text("string")}, {textOf(4)}, kPure, "", "Four-character Soundex code; Z000 for a text without a letter."},
+  {"CLI_udfDIFFERENCE", Built::no, "DIFFERENCE", Frame::plain, {text("a"), text("b")}, {int32()}, kPure, "", "How many of the four Soundex positions agree, 0 to 4."},
+  // Table functions
+  {"CLI_udfFmpThreads", Built::no, "FmpThreads", Frame::tableCallback, {int32("selector")}, {int32(), int32(), int32(), int32(), int32(), int32()}, 0, "", "The engine's table of Fmp threads."},
+  {"CLI_udfFmpRows", Built::no, "FmpRows", Frame::tableCallback, {}, {int32(), int32(), int16(), int16(), int16(), int16()}, 0, "", "The engine's table of Fmp rows."},
+  // Cache snapshot
+  {"SQLCACHE_SNAPSHOT", Built::no, "SQLCACHE_SNAPSHOT", Frame::table, {}, {int32(), int32(), int32(), int32(), int32(), int32(), int32(), int32(), int32(), int32(), int32(), int32(), int32(), int32(), int32(), int32(), textOf(8), lobOf(kLob)}, 0, "", "One row per statement of the SQL statement cache snapshot."},
+  // Object copy
+  {"CLI_udfVEBLOB_CP_LARGE", Built::no, "VEBLOB_CP_LARGE", Frame::plain, {lob("object"), int32("source code page"), int32("target code page"), int32("byte order")}, {lobOf(1000000)}, kPure | kHandlesNull, "", "A record-chain object copied into another code page, up to 1000000 bytes."},
+  {"CLI_udfVEBLOB_CP_SMALL", Built::no, "VEBLOB_CP_SMALL", Frame::plain, {lob("object"), int32("source code page"), int32("target code page"), int32("byte order")}, {lobOf(500000)}, kPure | kHandlesNull, "", "A record-chain object copied into another code page, up to 500000 bytes."},
+  // Collation
+  {"CLI_udfCOLLATIONNAME", Built::no, "COLLATIONNAME", Frame::plain, {bytes(8, "collation id")}, {textOf(128)}, kPure | kHandlesNull, "", "Name of a collation identifier; INVALID for NULL or an unknown one."},
+};
+// clang-format on
+
+inline constexpr std::size_t kRoutineCount = sizeof kRoutines / sizeof kRoutines[0];
+static_assert(kRoutineCount == 104, "the library has 104 routine exports");
+
+// The data export, which is no routine and has no row.
+inline constexpr const char *kDataExport = "sqlzThisIsAORVLibrary";
+
+template <std::size_t N>
+constexpr std::size_t countSlots(const Slot (&slots)[N]) {
+  std::size_t n = 0;
+  while (n < N && slots[n].layout != Layout::none) ++n;
+  return n;
+}
+constexpr std::size_t inputCount(const Routine &r) { return countSlots(r.inputs); }
+constexpr std::size_t resultCount(const Routine &r) { return countSlots(r.results); }
+
+constexpr std::size_t extraCount(Frame f) {
+  switch (f) {
+    case Frame::plain:
+      return 0;
+    case Frame::dbinfo:
+    case Frame::scratchpad:
+      return 1;
+    case Frame::table:
+      return 2;
+    case Frame::tableCallback:
+      return 3;
+  }
+  return 0;
+}
+
+// Number of arguments of the export: values, indicators, the four status
+// and name arguments, and the extras.
+constexpr std::size_t argumentCount(const Routine &r) {
+  return 2 * (inputCount(r) + resultCount(r)) + 4 + extraCount(r.frame);
+}
+
+static_assert(argumentCount(kRoutines[kRoutineCount - 5]) == 19, "FmpRows has 19 arguments");
+static_assert(argumentCount(kRoutines[kRoutineCount - 6]) == 21, "FmpThreads has 21 arguments");
+static_assert(argumentCount(kRoutines[kRoutineCount - 4]) == 42,
+              "SQLCACHE_SNAPSHOT has 42 arguments");
+
+constexpr const Routine *find(std::string_view symbol) {
+  for (const Routine &r : kRoutines) {
+    if (symbol == r.symbol) return &r;
+  }
+  return nullptr;
+}
+
+}  // namespace cli::catalogue
