@@ -180,7 +180,7 @@ inline constexpr Routine kRoutines[] = {
   {"CLI_udfCHARTODOUBLE", Built::no, "CHARTODOUBLE", Frame::plain, {text("text")}, {real()}, kPure, "11", "The number that a text spells, as a double."},
   {"CLI_udfDOUBLETOCHAR", Built::no, "DOUBLETOCHAR", Frame::plain, {real("x")}, {fixedText(24)}, kPure, "", "A double in short scientific notation, 24 bytes filled up with blanks."},
   // Basic strings
-  {"CLI_udfSPACE", Built::yes, "SPACE", Frame::plain, {int32("count")}, {textOf(kText)}, kPure, "01", "count blanks, 0 to 4000."},
+  {"CLI_udfSPACE", Built::yes, "SPACE", Frame::plain, {int32("count")}, {textOf(kText)}, kPure, "01", "A text of count blanks, count from 0 to 4000."},
   {"CLI_udfLCASE1", Built::yes, "LCASE", Frame::plain, {text("string")}, {textOf(kText)}, kPure, "", "The string with each byte lowered by the process's locale."},
   {"CLI_udfLCASE2", Built::yes, "LCASE", Frame::plain, {lob("string")}, {lobOf(kLob)}, kPure, "", "The string with each byte lowered by the process's locale; NUL bytes are data."},
   {"CLI_udfRTRIM1", Built::yes, "RTRIM", Frame::plain, {text("string")}, {textOf(kText)}, kPure, "", "The string without trailing blanks and tabs."},

@@ -1,0 +1,169 @@
+// Writes the function reference, docs/functions.md, from the catalogue and
+// the SQLite host's naming rules.  Usage: functions_md [output-file]
+#include <sqlite3.h>
+
+#include <cstdio>
+#include <fstream>
+#include <iostream>
+#include <set>
+#include <sstream>
+#include <string>
+
+#include "builtin_names.hpp"
+#include "registry.hpp"
+
+namespace {
+
+using cli::catalogue::kRoutines;
+using cli::catalogue::Layout;
+using cli::catalogue::Routine;
+using cli::catalogue::Slot;
+
+std::string describe(const Slot &s, bool result) {
+  switch (s.layout) {
+    case Layout::int16:
+      return "16-bit integer";
+    case Layout::int32:
+      return "32-bit integer";
+    case Layout::int64:
+      return "64-bit integer";
+    case Layout::real:
+      return "double";
+    case Layout::text:
+      return result ? "text of at most " + std::to_string(s.size) + " bytes" : "text";
+    case Layout::lob:
+      return result ? "CLI_udfLob, capacity " + std::to_string(s.size) : "CLI_udfLob";
+    case Layout::fixedText:
+      return std::to_string(s.size) + " bytes of text, blank-filled";
+    case Layout::fixedBytes:
+      return std::to_string(s.size) + " bytes";
+    case Layout::none:
+      break;
+  }
+  return "";
+}
+
+std::string arguments(const Routine &r) {
+  std::string out;
+  for (std::size_t i = 0; i < inputCount(r); ++i) {
+    if (i != 0) out += ", ";
+    out += std::string(r.inputs[i].name) + ": " + describe(r.inputs[i], false);
+  }
+  return out.empty() ? "none" : out;
+}
+
+std::string results(const Routine &r) {
+  std::string out;
+  for (std::size_t i = 0; i < resultCount(r); ++i) {
+    if (i != 0) out += ", ";
+    out += describe(r.results[i], true);
+  }
+  return out;
+}
+
+std::string codes(const Routine &r) { return *r.sysfunCodes != '\0' ? r.sysfunCodes : "none"; }
+
+constexpr const char *kIntroduction = R"(# Function reference
+
+Written from the library's catalogue by `tools/functions_md.cpp`
+(`cmake --build --preset release --target docs`); do not edit by hand.
+
+Every routine is an export of `liborvclifn.so` that an engine calls by
+name through the routine frame (see `src/frame/cliudf.h`). Strings are
+bytes: lengths and positions count bytes, positions count from 1.
+Terminated text is limited to 4000 bytes; `CLI_udfLob` strings, a 32-bit
+length followed by the data, to 1048576 bytes. A failure is reported as
+SQLSTATE 38552 with the message `SYSFUN:` and a two-digit code:
+
+| Code | Condition |
+|---|---|
+| 01 | an argument lies outside what the function accepts |
+| 02 | division by zero |
+| 03 | the result cannot be represented |
+| 04 | the date is not valid |
+| 05 | the time is not valid |
+| 06 | the time of a timestamp is not valid, or the text has no form that is taken |
+| 07 | a timestamp duration holds a character that is not allowed |
+| 08 | the interval code is not a known one |
+| 10 | a string would be longer than the function allows |
+| 11 | the text is not a number |
+
+## In SQLite
+
+The extension `orvclifn_sqlite` registers every routine of the library:
+
+- each SQL function as `sysfun_<name>`, for each number of arguments it has;
+- also under its plain name, where SQLite has no function of that name
+  taking that many arguments (checked on the connection when the extension
+  loads; the names below are those of SQLite )";
+
+constexpr const char *kPicking = R"();
+- each export also under `sysfun_` and its own name without `CLI_udf`
+  (`sysfun_left2`), which reaches that export and no other.
+
+Where a function has several exports with the same number of arguments, the
+extension picks one per call: integers go to the widest integer form, reals
+to the double form, text of up to 4000 bytes without NUL bytes to the
+terminated-text form, and longer text, text holding NUL bytes and BLOBs to
+the `CLI_udfLob` form, which returns a BLOB when its first string argument
+was one. Where no form takes a string, the call is an error. An integer
+outside the width of the export is an error, and so is a real that is not
+a whole number where an integer is wanted; nothing is cut to fit. A NULL
+argument gives NULL unless the routine handles NULL itself. A SYSFUN error
+becomes an SQLite error such as `LEFT: SQLSTATE 38552, SYSFUN:01: an argument
+lies outside what the function accepts`.
+
+The form follows the arguments, not the result: `REPEAT('ab', 3000)` reaches
+the terminated-text form, whose results stop at 4000 bytes, and fails with
+SYSFUN:10; `sysfun_repeat2` reaches the `CLI_udfLob` form, which builds up to
+1048576 bytes. `LEFT` and `RIGHT` are keywords of SQLite's grammar: call them
+quoted, as `"LEFT"(s, n)`, or as `sysfun_left` and `sysfun_right`.
+
+## Functions in this build
+)";
+
+}  // namespace
+
+int main(int argc, char **argv) {
+  sqlite3 *db = nullptr;
+  if (sqlite3_open(":memory:", &db) != SQLITE_OK) return 1;
+
+  std::ostringstream out;
+  out << kIntroduction << sqlite3_libversion() << kPicking;
+  const auto groups = orv::host::groups();
+  for (const auto &g : groups) {
+    if (g.plainName.empty()) continue;
+    const Routine &first = kRoutines[g.rows.front()];
+    out << "\n### " << g.label << " (" << g.argumentCount
+        << (g.argumentCount == 1 ? " argument" : " arguments") << ")\n\n"
+        << first.summary << "\n\nIn SQLite: `" << g.sysfunName << "`";
+    if (!orv::host::sqliteHasFunction(db, g.plainName.c_str(), g.argumentCount)) {
+      out << ", `" << g.label << "`";
+    }
+    out << "\n\n| Export | Own name | Arguments | Result | SYSFUN errors | What it gives |\n"
+        << "|---|---|---|---|---|---|\n";
+    for (std::size_t row : g.rows) {
+      const Routine &r = kRoutines[row];
+      out << "| `" << r.symbol << "` | `" << orv::host::exportName(r) << "` | " << arguments(r)
+          << " | " << results(r) << " | " << codes(r) << " | " << r.summary << " |\n";
+    }
+  }
+
+  out << "\n## Not yet in this build\n\n"
+      << "| Export | SQL name | Arguments | Result | SYSFUN errors | What it gives |\n"
+      << "|---|---|---|---|---|---|\n";
+  for (const Routine &r : kRoutines) {
+    if (r.built == cli::catalogue::Built::yes) continue;
+    out << "| `" << r.symbol << "` | " << r.sqlName << " | " << arguments(r) << " | " << results(r)
+        << " | " << codes(r) << " | " << r.summary << " |\n";
+  }
+  sqlite3_close(db);
+
+  if (argc < 2) {
+    std::cout << out.str();
+    return 0;
+  }
+  std::ofstream file(argv[1], std::ios::binary);
+  file << out.str();
+  return file ? 0 : 1;
+}
