@@ -20,6 +20,7 @@
 #ifndef ORVCLIFN_CLIUDF_H
 #define ORVCLIFN_CLIUDF_H
 
+/* NOLINTBEGIN(modernize-deprecated-headers, modernize-use-using): plain C */
 #include <stdint.h>
 #include <string.h>
 
@@ -117,4 +118,5 @@ extern const int32_t sqlzThisIsAORVLibrary;
 }
 #endif
 
+/* NOLINTEND(modernize-deprecated-headers, modernize-use-using) */
 #endif /* ORVCLIFN_CLIUDF_H */
