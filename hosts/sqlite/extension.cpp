@@ -207,7 +207,9 @@ struct Input<Layout::real, S> {
 // Terminated text, copied: the routines may write into their inputs.
 template <std::uint32_t S>
 struct Input<Layout::text, S> {
-  std::array<char, kTextLimit + 1> text{};
+  // Left uninitialised but for the terminator: a row costs what it copies.
+  Input() { text[0] = '\0'; }
+  std::array<char, kTextLimit + 1> text;
   bool load(const Call &c, std::size_t row, int i) {
     sqlite3_value *v = c.argv[i];
     const auto *bytes = sqlite3_value_text(v);
@@ -297,7 +299,8 @@ struct Result<Layout::real, S> {
 
 template <std::uint32_t Longest>
 struct Result<Layout::text, Longest> {
-  std::array<char, Longest + 1> text{};
+  Result() { text[Longest] = '\0'; }
+  std::array<char, Longest + 1> text;
   bool prepare(const Call &) { return true; }
   void *pointer() { return text.data(); }
   void deliver(const Call &c) {
