@@ -1,0 +1,160 @@
+#include "support/frame_call.hpp"
+
+#include <dlfcn.h>
+#include <gtest/gtest.h>
+
+#include <algorithm>
+#include <cstring>
+#include <utility>
+
+namespace orv::test {
+namespace {
+
+constexpr unsigned char kUnwritten = 0xCD;  // fills result areas before a call
+constexpr unsigned char kCanary = 0xA5;     // fills the bytes behind a result area
+constexpr std::size_t kCanaryBytes = 64;
+constexpr std::int16_t kIndicator = 0x5A5A;
+constexpr std::size_t kMessageBytes = 70;
+
+void *library() {
+  static void *handle = dlopen(ORV_LIBRARY_PATH, RTLD_NOW | RTLD_LOCAL);
+  return handle;
+}
+
+// Every frame argument is a pointer, so one pointer type per count serves.
+template <std::size_t... Is>
+void invoke(void *fn, void *const *args, std::index_sequence<Is...>) {
+  using Export = void (*)(decltype(Is, static_cast<void *>(nullptr))...);
+  reinterpret_cast<Export>(fn)(args[Is]...);
+}
+
+template <std::size_t... Ks>
+void invokeWith(void *fn, const std::vector<void *> &args, std::index_sequence<Ks...>) {
+  ((args.size() == Ks ? invoke(fn, args.data(), std::make_index_sequence<Ks>{}) : void()), ...);
+}
+
+std::vector<unsigned char> layOut(const Value &v) {
+  std::vector<unsigned char> out;
+  const auto append = [&](const void *p, std::size_t n) {
+    const auto *b = static_cast<const unsigned char *>(p);
+    out.insert(out.end(), b, b + n);
+  };
+  switch (v.layout) {
+    case Value::Layout::int32: {
+      const auto x = static_cast<std::int32_t>(v.number);
+      append(&x, sizeof x);
+      break;
+    }
+    case Value::Layout::text:
+      append(v.bytes.data(), v.bytes.size());
+      out.push_back(0);
+      break;
+    case Value::Layout::lob: {
+      const auto n = static_cast<std::uint32_t>(v.bytes.size());
+      append(&n, sizeof n);
+      append(v.bytes.data(), v.bytes.size());
+      break;
+    }
+  }
+  return out;
+}
+
+std::size_t areaSize(const Value &r) {
+  switch (r.layout) {
+    case Value::Layout::int32:
+      return 4;
+    case Value::Layout::text:
+      return r.size;
+    case Value::Layout::lob:
+      return 4 + std::size_t{r.size};
+  }
+  return 0;
+}
+
+}  // namespace
+
+void *exportAddress(const char *name) {
+  return library() == nullptr ? nullptr : dlsym(library(), name);
+}
+
+void PrintTo(const Outcome &o, std::ostream *os) {
+  if (!o.error.empty()) {
+    *os << "SYSFUN:" << o.error;
+  } else {
+    *os << ::testing::PrintToString(o.bytes) << " (" << o.bytes.size() << " bytes), " << o.number;
+  }
+}
+
+Outcome call(const char *name, const std::vector<Value> &inputs, const Value &result) {
+  void *fn = exportAddress(name);
+  EXPECT_NE(fn, nullptr) << name << " is not exported";
+  if (fn == nullptr) return fails("no export");
+
+  std::vector<std::vector<unsigned char>> in;
+  for (const Value &v : inputs) in.push_back(layOut(v));
+
+  const std::size_t area = areaSize(result);
+  std::vector<unsigned char> out(area + kCanaryBytes, kCanary);
+  std::fill_n(out.begin(), area, kUnwritten);
+  if (result.layout == Value::Layout::lob) std::memcpy(out.data(), &result.size, 4);
+  const std::vector<unsigned char> before = out;
+
+  std::vector<std::int16_t> indicators(inputs.size() + 1, kIndicator);
+  char sqlstate[6];
+  char message[kMessageBytes];
+  std::memset(sqlstate, 'S', sizeof sqlstate);
+  std::memset(message, 'M', sizeof message);
+
+  std::vector<void *> args;
+  for (auto &v : in) args.push_back(v.data());
+  args.push_back(out.data());
+  for (auto &i : indicators) args.push_back(&i);
+  args.push_back(sqlstate);
+  args.push_back(const_cast<char *>("FUNCTION"));
+  args.push_back(const_cast<char *>("SPECIFIC"));
+  args.push_back(message);
+  invokeWith(fn, args, std::index_sequence<8, 10, 12, 14>{});
+
+  EXPECT_TRUE(std::all_of(out.begin() + static_cast<std::ptrdiff_t>(area), out.end(),
+                          [](unsigned char b) { return b == kCanary; }))
+      << name << " wrote past its result area";
+  EXPECT_TRUE(std::all_of(indicators.begin(), indicators.end(),
+                          [](std::int16_t i) { return i == kIndicator; }))
+      << name << " touched a null indicator";
+
+  if (sqlstate[0] != 'S') {
+    EXPECT_EQ(std::string(sqlstate, 6), std::string("38552\0", 6)) << name;
+    EXPECT_EQ(std::string(message, 7), "SYSFUN:") << name;
+    EXPECT_EQ(message[9], '\0') << name;
+    EXPECT_TRUE(std::all_of(message + 10, message + kMessageBytes, [](char c) { return c == 'M'; }))
+        << name << " wrote past the message";
+    EXPECT_EQ(out, before) << name << " changed its result area although it failed";
+    return fails(std::string(message + 7, 2));
+  }
+  EXPECT_TRUE(std::all_of(sqlstate, sqlstate + 6, [](char c) { return c == 'S'; })) << name;
+  EXPECT_TRUE(std::all_of(message, message + kMessageBytes, [](char c) { return c == 'M'; }))
+      << name << " wrote a message on success";
+
+  switch (result.layout) {
+    case Value::Layout::int32: {
+      std::int32_t x = 0;
+      std::memcpy(&x, out.data(), 4);
+      return ok(std::int64_t{x});
+    }
+    case Value::Layout::text: {
+      const auto end = std::find(out.begin(), out.begin() + static_cast<std::ptrdiff_t>(area), 0);
+      EXPECT_NE(end, out.begin() + static_cast<std::ptrdiff_t>(area)) << name << ": no terminator";
+      return ok(std::string(out.begin(), end));
+    }
+    case Value::Layout::lob: {
+      std::uint32_t n = 0;
+      std::memcpy(&n, out.data(), 4);
+      EXPECT_LE(n, result.size) << name << ": length beyond the capacity";
+      n = std::min(n, result.size);
+      return ok(std::string(out.begin() + 4, out.begin() + 4 + n));
+    }
+  }
+  return {};
+}
+
+}  // namespace orv::test

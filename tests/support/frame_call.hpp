@@ -1,0 +1,56 @@
+// Calls an export of the built library the way an engine does: found by
+// name, given a frame of pointers to buffers that the caller owns.
+//
+// Every call is also checked for what the frame promises whatever the
+// routine: nothing written past the result area, null indicators never
+// touched, status buffers untouched on success, and on failure exactly
+// "38552" and "SYSFUN:NN" stored with the result area left as it was.
+#pragma once
+
+#include <cstdint>
+#include <ostream>
+#include <string>
+#include <vector>
+
+namespace orv::test {
+
+// An input or the shape of a result, in one of the frame's layouts.
+struct Value {
+  enum class Layout { int32, text, lob } layout;
+  std::int64_t number = 0;
+  std::string bytes;       // text without its terminator, or CLI_udfLob data
+  std::uint32_t size = 0;  // result area: text area bytes, or CLI_udfLob capacity
+};
+
+inline Value i32(std::int32_t v) { return {Value::Layout::int32, v, {}, 0}; }
+inline Value text(std::string s) { return {Value::Layout::text, 0, std::move(s), 0}; }
+inline Value lob(std::string s) { return {Value::Layout::lob, 0, std::move(s), 0}; }
+// Results: a terminated-text area of `area` bytes, a CLI_udfLob area whose
+// length word holds `capacity`, a 32-bit integer.
+inline Value textArea(std::uint32_t area = 4001) { return {Value::Layout::text, 0, {}, area}; }
+inline Value lobArea(std::uint32_t capacity = 1048576) {
+  return {Value::Layout::lob, 0, {}, capacity};
+}
+inline Value intArea() { return {Value::Layout::int32, 0, {}, 0}; }
+
+// What a call gave: a SYSFUN code, or the result.
+struct Outcome {
+  std::string error;  // two-digit SYSFUN code, empty on success
+  std::string bytes;  // a string result
+  std::int64_t number = 0;
+  bool operator==(const Outcome &) const = default;
+};
+
+inline Outcome ok(std::string bytes) { return {"", std::move(bytes), 0}; }
+inline Outcome ok(std::int64_t number) { return {"", "", number}; }
+inline Outcome fails(std::string code) { return {std::move(code), "", 0}; }
+
+void PrintTo(const Outcome &o, std::ostream *os);
+
+// Calls the export `name` with one result.
+Outcome call(const char *name, const std::vector<Value> &inputs, const Value &result);
+
+// The address of an export of the built library, or null.
+void *exportAddress(const char *name);
+
+}  // namespace orv::test

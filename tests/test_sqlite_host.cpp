@@ -1,0 +1,125 @@
+// The SQLite extension, driven through SQL as a user drives it.
+#include <gtest/gtest.h>
+#include <sqlite3.h>
+
+#include <string>
+
+namespace {
+
+class SqliteHost : public ::testing::Test {
+ protected:
+  void SetUp() override {
+    ASSERT_EQ(sqlite3_open(":memory:", &db_), SQLITE_OK);
+    sqlite3_enable_load_extension(db_, 1);
+    char *error = nullptr;
+    ASSERT_EQ(sqlite3_load_extension(db_, ORV_SQLITE_HOST_PATH, nullptr, &error), SQLITE_OK)
+        << (error != nullptr ? error : "");
+  }
+  void TearDown() override { sqlite3_close(db_); }
+
+  // The first column of the first row as text ("NULL" for NULL), or
+  // "error: " and SQLite's message.
+  std::string eval(const std::string &sql) {
+    sqlite3_stmt *statement = nullptr;
+    if (sqlite3_prepare_v2(db_, sql.c_str(), -1, &statement, nullptr) != SQLITE_OK) {
+      return "error: " + std::string(sqlite3_errmsg(db_));
+    }
+    std::string out;
+    if (sqlite3_step(statement) == SQLITE_ROW) {
+      const auto *text = sqlite3_column_text(statement, 0);
+      out = text == nullptr
+                ? "NULL"
+                : std::string(reinterpret_cast<const char *>(text),
+                              static_cast<std::size_t>(sqlite3_column_bytes(statement, 0)));
+    } else {
+      out = "error: " + std::string(sqlite3_errmsg(db_));
+    }
+    sqlite3_finalize(statement);
+    return out;
+  }
+
+  sqlite3 *db_ = nullptr;
+};
+
+struct Case {
+  const char *sql;
+  const char *expected;
+};
+
+TEST_F(SqliteHost, AnswersUnderSysfunAndPlainNames) {
+  const Case cases[] = {
+      {"SELECT sysfun_repeat('ab', 3) || SPACE(2) || 'x' || LCASE('ABC')", "ababab  xabc"},
+      {"SELECT \"LEFT\"('abcdef', 3) || \"RIGHT\"('abc', 5) || '|'", "abcabc  |"},
+      {"SELECT REPEAT('x', 2) || sysfun_space(1) || ASCII('A')", "xx 65"},
+      {"SELECT hex(sysfun_char(0) || sysfun_char(-1))", "20FF"},
+      // Each export by itself.
+      {"SELECT sysfun_left2('abc', 2) || sysfun_ascii3('B') || sysfun_lcase1('Q')", "ab66q"},
+      // SQLite's own functions of the same name stay SQLite's: its rtrim keeps a tab.
+      {"SELECT rtrim('a' || char(9)) = 'a' || char(9)", "1"},
+      {"SELECT sysfun_rtrim('a ' || char(9)) || '|' || sysfun_ltrim(char(9) || ' b')", "a|b"},
+      {"SELECT char(65, 66)", "AB"},
+  };
+  for (const Case &c : cases) EXPECT_EQ(eval(c.sql), c.expected) << c.sql;
+}
+
+TEST_F(SqliteHost, PicksTheFormByTheKindsOfTheArguments) {
+  const Case cases[] = {
+      // Text longer than 4000 bytes, BLOBs and text holding NUL go to the long form.
+      {"SELECT length(LCASE(printf('%5000c', 'A')))", "5000"},
+      {"SELECT typeof(LCASE(x'41')) || typeof(LCASE('A'))", "blobtext"},
+      {"SELECT hex(LCASE('A' || char(0) || 'B'))", "610062"},
+      {"SELECT length(sysfun_repeat2('ab', 524288))", "1048576"},
+      {"SELECT length(sysfun_left2('a', 1048575))", "1048575"},
+      {"SELECT ASCII(x'C4')", "196"},
+      // Integers are not cut, reals must be whole, text must be a number.
+      {"SELECT SPACE(2.0) || '|' || SPACE('1') || '|'", "  | |"},
+      {"SELECT sysfun_left('abc', 2147483648)",
+       "error: LEFT: argument 2 (n) is 2147483648, outside the 32-bit range of CLI_udfLEFT1"},
+      {"SELECT SPACE(2.5)",
+       "error: SPACE: argument 1 (count) is 2.5, not a whole number in the 32-bit range of "
+       "CLI_udfSPACE"},
+      {"SELECT SPACE('two')", "error: SPACE: argument 1 (count) is not a number"},
+      // No form for long strings.
+      {"SELECT sysfun_lcase1(x'41') IS NULL",
+       "error: sysfun_lcase1: a string argument is a BLOB, holds a NUL byte or is longer than "
+       "4000 bytes, and the function has no form for such strings"},
+      {"SELECT length(LCASE(zeroblob(1048577)))",
+       "error: LCASE: argument 1 (string) is 1048577 bytes long; strings are at most 1048576 "
+       "bytes"},
+      // NULL in gives NULL out.
+      {"SELECT sysfun_left(NULL, 2)", "NULL"},
+      {"SELECT REPEAT('a', NULL)", "NULL"},
+  };
+  for (const Case &c : cases) EXPECT_EQ(eval(c.sql), c.expected) << c.sql;
+}
+
+TEST_F(SqliteHost, ReportsSysfunErrorsWithSqlstateCodeAndWords) {
+  const Case cases[] = {
+      {"SELECT SPACE(4001)",
+       "error: SPACE: SQLSTATE 38552, SYSFUN:01: an argument lies outside what the function "
+       "accepts"},
+      {"SELECT sysfun_left2('abc', 1048576)",
+       "error: sysfun_left2: SQLSTATE 38552, SYSFUN:01: an argument lies outside what the "
+       "function accepts"},
+      {"SELECT REPEAT('ab', 2001)",
+       "error: REPEAT: SQLSTATE 38552, SYSFUN:10: a string would be longer than the function "
+       "allows"},
+      {"SELECT sysfun_left('abc', 2147483647)",
+       "error: LEFT: SQLSTATE 38552, SYSFUN:01: an argument lies outside what the function "
+       "accepts"},
+  };
+  for (const Case &c : cases) EXPECT_EQ(eval(c.sql), c.expected) << c.sql;
+}
+
+TEST_F(SqliteHost, RegistersDeterministicInnocuousFunctionsWithoutHidingBuiltIns) {
+  EXPECT_EQ(eval("SELECT count(*) FROM pragma_function_list WHERE name IN ('sysfun_space', "
+                 "'lcase', 'sysfun_ascii3') AND flags & 0x200800 = 0x200800"),
+            "3");
+  EXPECT_EQ(eval("SELECT group_concat(builtin) FROM pragma_function_list WHERE name = 'rtrim'"),
+            "1,1");
+  EXPECT_EQ(eval("SELECT count(*) FROM pragma_function_list WHERE name IN ('rtrim', 'ltrim', "
+                 "'char') AND builtin = 0"),
+            "0");
+}
+
+}  // namespace
