@@ -9,6 +9,7 @@
 #include <algorithm>
 #include <cctype>
 #include <cstddef>
+#include <cstdint>
 #include <cstring>
 
 #include "frame/frame.hpp"
@@ -18,11 +19,32 @@ namespace cli::str {
 // The blank set of RTRIM and LTRIM: space and tab, nothing else.
 constexpr bool isTrimBlank(Byte b) noexcept { return b == 0x20 || b == 0x09; }
 
-// Stores tolower of each byte, as the process's locale has it.
+// tolower of a byte in the calling thread's locale.  On glibc tolower is a
+// lookup in the locale's table, so the table is taken once per call
+// instead of calling through for every byte.
+class ByteLowering {
+ public:
+#if defined(__GLIBC__)
+  ByteLowering() noexcept : table_(*__ctype_tolower_loc()) {}
+  Byte operator()(Byte c) const noexcept { return static_cast<Byte>(table_[c]); }
+
+ private:
+  const std::int32_t *table_;
+#else
+  Byte operator()(Byte c) const noexcept { return static_cast<Byte>(std::tolower(c)); }
+#endif
+};
+
+// Stores the lowered bytes of `in`, eight at a time where it can.
 inline void lowerCase(Bytes in, Byte *out) noexcept {
-  for (std::size_t i = 0; i < in.size; ++i) {
-    out[i] = static_cast<Byte>(std::tolower(in.data[i]));
+  const ByteLowering lower;
+  std::size_t i = 0;
+  for (; i + 8 <= in.size; i += 8) {
+    Byte block[8];
+    for (std::size_t k = 0; k < 8; ++k) block[k] = lower(in.data[i + k]);
+    std::memcpy(out + i, block, 8);
   }
+  for (; i < in.size; ++i) out[i] = lower(in.data[i]);
 }
 
 // The input without its trailing blanks.

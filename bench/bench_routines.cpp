@@ -1,0 +1,150 @@
+// Cost of one call of each routine, called as an engine calls it: found by
+// name in the built library, handed a frame of pointers to ready buffers.
+//
+// Rows: <ROUTINE>/<input>.  String rows over 1 MiB report bytes per second.
+#include <benchmark/benchmark.h>
+#include <dlfcn.h>
+
+#include <algorithm>
+#include <cstdint>
+#include <cstdio>
+#include <cstdlib>
+#include <cstring>
+#include <string>
+#include <utility>
+#include <vector>
+
+namespace {
+
+void *exportNamed(const char *name) {
+  static void *library = dlopen(ORV_LIBRARY_PATH, RTLD_NOW | RTLD_LOCAL);
+  void *fn = library != nullptr ? dlsym(library, name) : nullptr;
+  if (fn == nullptr) {
+    std::fprintf(stderr, "no export %s in %s\n", name, ORV_LIBRARY_PATH);
+    std::exit(1);
+  }
+  return fn;
+}
+
+// A value laid out for the frame: terminated text, CLI_udfLob, or a 32-bit
+// integer; result areas are sized for the largest result.
+std::vector<unsigned char> text(const std::string &s) {
+  std::vector<unsigned char> v(s.begin(), s.end());
+  v.push_back(0);
+  return v;
+}
+std::vector<unsigned char> lob(const std::string &s) {
+  const auto n = static_cast<std::uint32_t>(s.size());
+  std::vector<unsigned char> v(4 + s.size());
+  for (std::size_t i = 0; i < 4; ++i) v[i] = reinterpret_cast<const unsigned char *>(&n)[i];
+  std::copy(s.begin(), s.end(), v.begin() + 4);
+  return v;
+}
+std::vector<unsigned char> int32(std::int32_t x) {
+  std::vector<unsigned char> v(4);
+  std::memcpy(v.data(), &x, 4);
+  return v;
+}
+std::vector<unsigned char> textArea() { return std::vector<unsigned char>(4001); }
+std::vector<unsigned char> lobArea(std::uint32_t capacity = 1048576) {
+  std::vector<unsigned char> v(4 + std::size_t{capacity});
+  std::memcpy(v.data(), &capacity, 4);
+  return v;
+}
+
+template <std::size_t... Is>
+void invoke(void *fn, void *const *args, std::index_sequence<Is...>) {
+  using Export = void (*)(decltype(Is, static_cast<void *>(nullptr))...);
+  reinterpret_cast<Export>(fn)(args[Is]...);
+}
+
+// Calls `name` with the inputs and one result in a loop.  A CLI_udfLob
+// result's length word is set to its capacity before each call, as an
+// engine hands it.
+void run(benchmark::State &state, const char *name, std::vector<std::vector<unsigned char>> inputs,
+         std::vector<unsigned char> result, std::int64_t bytesPerCall = 0) {
+  void *fn = exportNamed(name);
+  std::int16_t indicators[5] = {};
+  char sqlstate[6] = {};
+  char message[70] = {};
+  std::vector<void *> args;
+  for (auto &in : inputs) args.push_back(in.data());
+  args.push_back(result.data());
+  for (std::size_t i = 0; i <= inputs.size(); ++i) args.push_back(&indicators[i]);
+  args.insert(args.end(), {sqlstate, nullptr, nullptr, message});
+  // Text and integer areas start zeroed, so only a CLI_udfLob has one.
+  std::uint32_t capacity = 0;
+  std::memcpy(&capacity, result.data(), 4);
+  for (auto _ : state) {
+    if (capacity != 0) std::memcpy(result.data(), &capacity, 4);
+    if (args.size() == 8) {
+      invoke(fn, args.data(), std::make_index_sequence<8>{});
+    } else {
+      invoke(fn, args.data(), std::make_index_sequence<10>{});
+    }
+    benchmark::DoNotOptimize(result.data());
+    benchmark::ClobberMemory();
+  }
+  if (sqlstate[0] != '\0') state.SkipWithError("the routine reported a status");
+  if (bytesPerCall != 0) state.SetBytesProcessed(state.iterations() * bytesPerCall);
+}
+
+const std::string k20 = "  Mixed Case Text   ";  // 20 bytes, blanks at both ends
+const std::string kMiB(1 << 20, 'Q');
+
+void space(benchmark::State &s) { run(s, "CLI_udfSPACE", {int32(20)}, textArea()); }
+void lcase1(benchmark::State &s) { run(s, "CLI_udfLCASE1", {text(k20)}, textArea()); }
+void rtrim1(benchmark::State &s) { run(s, "CLI_udfRTRIM1", {text(k20)}, textArea()); }
+void ltrim1(benchmark::State &s) { run(s, "CLI_udfLTRIM1", {text(k20)}, textArea()); }
+void left1(benchmark::State &s) { run(s, "CLI_udfLEFT1", {text(k20), int32(10)}, textArea()); }
+void right1(benchmark::State &s) { run(s, "CLI_udfRIGHT1", {text(k20), int32(10)}, textArea()); }
+void lcase2(benchmark::State &s) { run(s, "CLI_udfLCASE2", {lob(k20)}, lobArea(64)); }
+void rtrim2(benchmark::State &s) { run(s, "CLI_udfRTRIM2", {lob(k20)}, lobArea(64)); }
+void charCode(benchmark::State &s) { run(s, "CLI_udfCHAR", {int32(65)}, textArea()); }
+void ascii1(benchmark::State &s) { run(s, "CLI_udfASCII1", {text(k20)}, int32(0)); }
+
+void lcase2MiB(benchmark::State &s) { run(s, "CLI_udfLCASE2", {lob(kMiB)}, lobArea(), 1 << 20); }
+void repeat2MiB(benchmark::State &s) {
+  run(s, "CLI_udfREPEAT2", {lob("0123456789abcdef"), int32(65536)}, lobArea(), 1 << 20);
+}
+void repeat2MiBOneByte(benchmark::State &s) {
+  run(s, "CLI_udfREPEAT2", {lob("z"), int32(1 << 20)}, lobArea(), 1 << 20);
+}
+void repeat1OneByte(benchmark::State &s) {
+  run(s, "CLI_udfREPEAT1", {text("z"), int32(4000)}, textArea(), 4000);
+}
+void repeat1ThreeBytes(benchmark::State &s) {
+  run(s, "CLI_udfREPEAT1", {text("abc"), int32(1333)}, textArea(), 3999);
+}
+// What REPEAT1 of 4000 bytes is measured against: copying 4000 bytes.
+void memcpy4000(benchmark::State &s) {
+  std::vector<char> from(4000, 'z');
+  std::vector<char> to(4001);
+  for (auto _ : s) {
+    std::memcpy(to.data(), from.data(), from.size());
+    benchmark::DoNotOptimize(to.data());
+    benchmark::ClobberMemory();
+  }
+  s.SetBytesProcessed(s.iterations() * 4000);
+}
+
+}  // namespace
+
+BENCHMARK(space)->Name("SPACE/20");
+BENCHMARK(lcase1)->Name("LCASE1/20-byte text");
+BENCHMARK(rtrim1)->Name("RTRIM1/20-byte text");
+BENCHMARK(ltrim1)->Name("LTRIM1/20-byte text");
+BENCHMARK(left1)->Name("LEFT1/20-byte text, 10");
+BENCHMARK(right1)->Name("RIGHT1/20-byte text, 10");
+BENCHMARK(lcase2)->Name("LCASE2/20 bytes");
+BENCHMARK(rtrim2)->Name("RTRIM2/20 bytes");
+BENCHMARK(charCode)->Name("CHAR/65");
+BENCHMARK(ascii1)->Name("ASCII1/20-byte text");
+BENCHMARK(lcase2MiB)->Name("LCASE2/1 MiB");
+BENCHMARK(repeat2MiB)->Name("REPEAT2/16 bytes x 65536 = 1 MiB");
+BENCHMARK(repeat2MiBOneByte)->Name("REPEAT2/1 byte x 1048576");
+BENCHMARK(repeat1OneByte)->Name("REPEAT1/1 byte x 4000");
+BENCHMARK(memcpy4000)->Name("memcpy/4000 bytes (reference for REPEAT1)");
+BENCHMARK(repeat1ThreeBytes)->Name("REPEAT1/3 bytes x 1333");
+
+BENCHMARK_MAIN();
