@@ -77,10 +77,21 @@ struct Function {
   std::array<int, 16> formFor;  // row to call for each KindMask
 };
 
+// One SQL argument as the dispatcher has read it, so that no value is asked
+// twice: its type (after numeric affinity, for a number argument) and, for
+// a string, its bytes and whether terminated text can carry them.
+struct Argument {
+  int type = SQLITE_NULL;
+  const unsigned char *bytes = nullptr;
+  std::size_t size = 0;
+  bool fitsText = false;
+};
+
 // Everything that one call of a row needs.
 struct Call {
   sqlite3_context *context;
   sqlite3_value **argv;
+  std::array<Argument, kMaxInputs> arguments;
   Connection &connection;
   const Function &function;
   bool blobResult;  // the first string argument was a BLOB
@@ -140,10 +151,10 @@ const char *argumentName(std::size_t row, int i) {
 template <typename T>
 bool loadInteger(const Call &c, std::size_t row, int i, T &out) {
   sqlite3_value *v = c.argv[i];
+  const int type = c.arguments[static_cast<std::size_t>(i)].type;
   constexpr auto lo = std::numeric_limits<T>::min();
   constexpr auto hi = std::numeric_limits<T>::max();
   constexpr int bits = std::numeric_limits<T>::digits + 1;
-  const int type = sqlite3_value_numeric_type(v);
   if (type == SQLITE_INTEGER) {
     const sqlite3_int64 x = sqlite3_value_int64(v);
     if (x >= lo && x <= hi) {
@@ -192,7 +203,7 @@ template <std::uint32_t S>
 struct Input<Layout::real, S> {
   double value = 0.0;
   bool load(const Call &c, std::size_t row, int i) {
-    const int type = sqlite3_value_numeric_type(c.argv[i]);
+    const int type = c.arguments[static_cast<std::size_t>(i)].type;
     if (type != SQLITE_INTEGER && type != SQLITE_FLOAT) {
       fail(c.context, "%s: argument %d (%s) is not a number", c.function.label.c_str(), i + 1,
            argumentName(row, i));
@@ -211,11 +222,8 @@ struct Input<Layout::text, S> {
   Input() { text[0] = '\0'; }
   std::array<char, kTextLimit + 1> text;
   bool load(const Call &c, std::size_t row, int i) {
-    sqlite3_value *v = c.argv[i];
-    const auto *bytes = sqlite3_value_text(v);
-    const auto size = static_cast<std::size_t>(sqlite3_value_bytes(v));
-    if (sqlite3_value_type(v) == SQLITE_BLOB || size > kTextLimit ||
-        (size != 0 && std::memchr(bytes, 0, size) != nullptr)) {
+    const Argument &a = c.arguments[static_cast<std::size_t>(i)];
+    if (!a.fitsText) {
       fail(c.context,
            "%s: argument %d (%s) is a BLOB, holds a NUL byte or is longer than %d bytes, "
            "which %s does not take",
@@ -223,8 +231,8 @@ struct Input<Layout::text, S> {
            kRoutines[row].symbol);
       return false;
     }
-    if (size != 0) std::memcpy(text.data(), bytes, size);
-    text[size] = '\0';
+    if (a.size != 0) std::memcpy(text.data(), a.bytes, a.size);
+    text[a.size] = '\0';
     return true;
   }
   void *pointer() { return text.data(); }
@@ -235,9 +243,8 @@ struct Input<Layout::lob, S> {
   unsigned char *value = empty.data();
   std::array<unsigned char, 4> empty{};  // a NULL handed to a routine that reads indicators
   bool load(const Call &c, std::size_t row, int i) {
-    sqlite3_value *v = c.argv[i];
-    const void *bytes = sqlite3_value_blob(v);
-    const auto size = static_cast<std::size_t>(sqlite3_value_bytes(v));
+    const Argument &a = c.arguments[static_cast<std::size_t>(i)];
+    const std::size_t size = a.size;
     if (size > kLobLimit) {
       fail(c.context, "%s: argument %d (%s) is %lld bytes long; strings are at most %d bytes",
            c.function.label.c_str(), i + 1, argumentName(row, i), static_cast<long long>(size),
@@ -247,7 +254,7 @@ struct Input<Layout::lob, S> {
     value = c.connection.lobInputs[static_cast<std::size_t>(i)].get(CLI_LOB_AREA_SIZE(size));
     const auto length = static_cast<std::uint32_t>(size);
     std::memcpy(value, &length, sizeof length);
-    if (size != 0) std::memcpy(value + CLI_LOB_DATA_OFFSET, bytes, size);
+    if (size != 0) std::memcpy(value + CLI_LOB_DATA_OFFSET, a.bytes, size);
     return true;
   }
   void *pointer() { return value; }
@@ -257,14 +264,13 @@ template <std::uint32_t Size>
 struct Input<Layout::fixedBytes, Size> {
   std::array<unsigned char, Size> value{};
   bool load(const Call &c, std::size_t row, int i) {
-    sqlite3_value *v = c.argv[i];
-    const void *bytes = sqlite3_value_blob(v);
-    if (static_cast<std::uint32_t>(sqlite3_value_bytes(v)) != Size) {
+    const Argument &a = c.arguments[static_cast<std::size_t>(i)];
+    if (a.size != Size) {
       fail(c.context, "%s: argument %d (%s) must be exactly %d bytes", c.function.label.c_str(),
            i + 1, argumentName(row, i), static_cast<int>(Size));
       return false;
     }
-    std::memcpy(value.data(), bytes, Size);
+    std::memcpy(value.data(), a.bytes, Size);
     return true;
   }
   void *pointer() { return value.data(); }
@@ -366,7 +372,7 @@ void callRow(const Call &c, std::index_sequence<Is...>) {
 
   // NULL reaches the routine only when it reads its indicators itself.
   const auto load = [&](auto &input, int i) {
-    if (sqlite3_value_type(c.argv[i]) == SQLITE_NULL) {
+    if (c.arguments[static_cast<std::size_t>(i)].type == SQLITE_NULL) {
       inputIndicators[static_cast<std::size_t>(i)] = -1;
       return true;
     }
@@ -415,30 +421,34 @@ constexpr auto kRowCalls = rowCalls(std::make_index_sequence<kRoutineCount>{});
 // calls it.
 void dispatch(sqlite3_context *context, int argc, sqlite3_value **argv) {
   const auto &f = *static_cast<const Function *>(sqlite3_user_data(context));
+  Call call{context, argv, {}, *f.connection, f, false};
   KindMask mask = 0;
-  bool blob = false;
   bool firstString = true;
   for (int i = 0; i < argc; ++i) {
     sqlite3_value *v = argv[i];
-    const int type = sqlite3_value_type(v);
+    Argument &a = call.arguments[static_cast<std::size_t>(i)];
+    a.type = sqlite3_value_type(v);
     const KindMask bit = 1u << i;
-    if (type == SQLITE_NULL) {
+    if (a.type == SQLITE_NULL) {
       if (!f.handlesNull) return sqlite3_result_null(context);
       continue;
     }
-    if ((f.stringArguments & bit) != 0) {
-      if (type == SQLITE_BLOB) {
-        mask |= bit;
-        blob = blob || firstString;
-      } else {
-        const auto *text = sqlite3_value_text(v);
-        const auto size = static_cast<std::size_t>(sqlite3_value_bytes(v));
-        if (size > kTextLimit || (size != 0 && std::memchr(text, 0, size) != nullptr)) mask |= bit;
-      }
-      firstString = false;
-    } else if (sqlite3_value_numeric_type(v) == SQLITE_FLOAT) {
-      mask |= bit;
+    if ((f.stringArguments & bit) == 0) {
+      a.type = sqlite3_value_numeric_type(v);
+      if (a.type == SQLITE_FLOAT) mask |= bit;
+      continue;
     }
+    if (a.type == SQLITE_BLOB) {
+      a.bytes = static_cast<const unsigned char *>(sqlite3_value_blob(v));
+      call.blobResult = call.blobResult || firstString;
+    } else {
+      a.bytes = sqlite3_value_text(v);
+    }
+    a.size = static_cast<std::size_t>(sqlite3_value_bytes(v));
+    a.fitsText = a.type != SQLITE_BLOB && a.size <= kTextLimit &&
+                 (a.size == 0 || std::memchr(a.bytes, 0, a.size) == nullptr);
+    if (!a.fitsText) mask |= bit;
+    firstString = false;
   }
   const int row = f.formFor[mask];
   if (row == orv::host::kNoForm) {
@@ -448,7 +458,7 @@ void dispatch(sqlite3_context *context, int argc, sqlite3_value **argv) {
                 f.label.c_str(), static_cast<int>(kTextLimit));
   }
   try {
-    kRowCalls[static_cast<std::size_t>(row)](Call{context, argv, *f.connection, f, blob});
+    kRowCalls[static_cast<std::size_t>(row)](call);
   } catch (const std::bad_alloc &) {
     sqlite3_result_error_nomem(context);
   }
