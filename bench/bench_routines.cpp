@@ -20,7 +20,7 @@ void *exportNamed(const char *name) {
   static void *library = dlopen(ORV_LIBRARY_PATH, RTLD_NOW | RTLD_LOCAL);
   void *fn = library != nullptr ? dlsym(library, name) : nullptr;
   if (fn == nullptr) {
-    std::fprintf(stderr, "no export %s in %s\n", name, ORV_LIBRARY_PATH);
+    static_cast<void>(std::fprintf(stderr, "no export %s in %s\n", name, ORV_LIBRARY_PATH));
     std::exit(1);
   }
   return fn;
@@ -68,6 +68,7 @@ void run(benchmark::State &state, const char *name, std::vector<std::vector<unsi
   char sqlstate[6] = {};
   char message[70] = {};
   std::vector<void *> args;
+  args.reserve(2 * inputs.size() + 6);
   for (auto &in : inputs) args.push_back(in.data());
   args.push_back(result.data());
   for (std::size_t i = 0; i <= inputs.size(); ++i) args.push_back(&indicators[i]);

@@ -37,7 +37,7 @@ constexpr Row kRows[] = {
 
 void check(sqlite3 *db, int rc, const char *what) {
   if (rc != SQLITE_OK && rc != SQLITE_DONE && rc != SQLITE_ROW) {
-    std::fprintf(stderr, "%s: %s\n", what, sqlite3_errmsg(db));
+    static_cast<void>(std::fprintf(stderr, "%s: %s\n", what, sqlite3_errmsg(db)));
     std::exit(1);
   }
 }
@@ -103,7 +103,7 @@ int main(int argc, char **argv) {
   sqlite3_enable_load_extension(db, 1);
   char *error = nullptr;
   if (sqlite3_load_extension(db, ORV_SQLITE_HOST_PATH, nullptr, &error) != SQLITE_OK) {
-    std::fprintf(stderr, "cannot load %s: %s\n", ORV_SQLITE_HOST_PATH, error);
+    static_cast<void>(std::fprintf(stderr, "cannot load %s: %s\n", ORV_SQLITE_HOST_PATH, error));
     return 1;
   }
   fill(db, rows);

@@ -104,7 +104,7 @@ TEST(Catalogue, NamesEachExportAfterItsSqlFunction) {
   std::set<std::string> seen;
   for (const auto &r : kRoutines) {
     EXPECT_TRUE(seen.insert(r.symbol).second) << r.symbol << " is listed twice";
-    if (mixedCase.count(r.symbol) != 0) continue;
+    if (mixedCase.contains(r.symbol)) continue;
     const std::string base = "CLI_udf" + std::string(r.sqlName);
     const std::string symbol = r.symbol;
     EXPECT_TRUE(symbol == base || (symbol.size() == base.size() + 1 && symbol.starts_with(base) &&

@@ -49,7 +49,7 @@ struct Case {
 TEST_F(SqliteHost, AnswersUnderSysfunAndPlainNames) {
   const Case cases[] = {
       {"SELECT sysfun_repeat('ab', 3) || SPACE(2) || 'x' || LCASE('ABC')", "ababab  xabc"},
-      {"SELECT \"LEFT\"('abcdef', 3) || \"RIGHT\"('abc', 5) || '|'", "abcabc  |"},
+      {R"(SELECT "LEFT"('abcdef', 3) || "RIGHT"('abc', 5) || '|')", "abcabc  |"},
       {"SELECT REPEAT('x', 2) || sysfun_space(1) || ASCII('A')", "xx 65"},
       {"SELECT hex(sysfun_char(0) || sysfun_char(-1))", "20FF"},
       // Each export by itself.

@@ -91,6 +91,7 @@ Outcome call(const char *name, const std::vector<Value> &inputs, const Value &re
   if (fn == nullptr) return fails("no export");
 
   std::vector<std::vector<unsigned char>> in;
+  in.reserve(inputs.size());
   for (const Value &v : inputs) in.push_back(layOut(v));
 
   const std::size_t area = areaSize(result);
@@ -106,6 +107,7 @@ Outcome call(const char *name, const std::vector<Value> &inputs, const Value &re
   std::memset(message, 'M', sizeof message);
 
   std::vector<void *> args;
+  args.reserve(2 * inputs.size() + 6);
   for (auto &v : in) args.push_back(v.data());
   args.push_back(out.data());
   for (auto &i : indicators) args.push_back(&i);
