@@ -143,8 +143,9 @@ constexpr int cost(Layout layout, bool numberArgument, bool maskBit) {
 
 // The export that serves a call with these kinds: integers go to the
 // widest integer form, reals to the double form, short text to the
-// terminated-text form and anything longer to the CLI_udfLob form.  Ties go
-// to the first row.  kNoForm when no form can take the arguments.
+// terminated-text form and anything longer to the CLI_udfLob form.  Of two
+// exports with the same layouts the one that reads more of its text wins.  kNoForm when no form can
+// take the arguments.
 inline int chooseForm(const Group &g, KindMask mask) {
   int best = kNoForm;
   int bestCost = 0;
@@ -156,6 +157,7 @@ inline int chooseForm(const Group &g, KindMask mask) {
       const int c = cost(l, isNumber(l), ((mask >> i) & 1u) != 0);
       total = c < 0 ? -1 : total + c;
     }
+    if (total >= 0 && (r.properties & cli::catalogue::kNarrowerForm) != 0) ++total;
     if (total >= 0 && (best == kNoForm || total < bestCost)) {
       best = static_cast<int>(row);
       bestCost = total;

@@ -57,6 +57,10 @@ enum : unsigned {
   kDeterministic = 1u,  // the same inputs always give the same result
   kInnocuous = 2u,      // no side effects and no access to outside state
   kHandlesNull = 4u,    // reads its input indicators itself
+  // Reads less of its text than the function's other export of the same
+  // layouts (the date at the head only, or a time only); hosts prefer the
+  // other one and reach this one by its own name.
+  kNarrowerForm = 8u,
 };
 inline constexpr unsigned kPure = kDeterministic | kInnocuous;
 
@@ -97,10 +101,10 @@ inline constexpr std::uint32_t kName = 101;     // a day or month name
 // clang-format off
 inline constexpr Routine kRoutines[] = {
   // Day and second counts
-  {"CLI_udfJULIAN_DAY1", Built::no, "JULIAN_DAY", Frame::plain, {text("date")}, {int32()}, kPure, "04", "Julian day number of the date at the head of the text; what stands behind the date is not read."},
-  {"CLI_udfJULIAN_DAY2", Built::no, "JULIAN_DAY", Frame::plain, {text("date")}, {int32()}, kPure, "04 06", "Julian day number of a date or timestamp, validated to its end."},
-  {"CLI_udfMIDNIGHT_SECONDS1", Built::no, "MIDNIGHT_SECONDS", Frame::plain, {text("time")}, {int32()}, kPure, "05", "Seconds since midnight of a time."},
-  {"CLI_udfMIDNIGHT_SECONDS2", Built::no, "MIDNIGHT_SECONDS", Frame::plain, {text("value")}, {int32()}, kPure, "04 05 06", "Seconds since midnight of a time, or of the time of day of a timestamp."},
+  {"CLI_udfJULIAN_DAY1", Built::yes, "JULIAN_DAY", Frame::plain, {text("date")}, {int32()}, kPure | kNarrowerForm, "04", "Julian day number of the date at the head of the text; what stands behind the date is not read."},
+  {"CLI_udfJULIAN_DAY2", Built::yes, "JULIAN_DAY", Frame::plain, {text("date")}, {int32()}, kPure, "04 06", "Julian day number of a date or timestamp, validated to its end."},
+  {"CLI_udfMIDNIGHT_SECONDS1", Built::yes, "MIDNIGHT_SECONDS", Frame::plain, {text("time")}, {int32()}, kPure | kNarrowerForm, "05", "Seconds since midnight of a time."},
+  {"CLI_udfMIDNIGHT_SECONDS2", Built::yes, "MIDNIGHT_SECONDS", Frame::plain, {text("value")}, {int32()}, kPure, "04 05 06", "Seconds since midnight of a time, or of the time of day of a timestamp."},
   // Timestamps
   {"CLI_udfTIMESTAMP", Built::no, "TIMESTAMP", Frame::plain, {text("value")}, {textOf(kStamp)}, kInnocuous, "04 05 06", "Timestamp text from a date, a time (on today's UTC date) or a timestamp."},
   {"CLI_udfTIMESTAMPDATE", Built::no, "TIMESTAMPDATE", Frame::plain, {text("date")}, {textOf(kStamp)}, kPure, "04", "Timestamp text of a date at midnight."},
@@ -108,23 +112,23 @@ inline constexpr Routine kRoutines[] = {
   // Timestamp durations
   {"CLI_udfTIMESTAMPDIFF", Built::no, "TIMESTAMPDIFF", Frame::plain, {int32("interval"), text("duration")}, {int32()}, kPure, "03 07 08 10", "A timestamp duration as a number of the unit that the interval code names."},
   // Weeks
-  {"CLI_udfWEEK1", Built::no, "WEEK", Frame::plain, {text("date")}, {int32()}, kPure, "04", "Week of the year, weeks starting on Sunday, of the date at the head of the text."},
-  {"CLI_udfWEEK2", Built::no, "WEEK", Frame::plain, {text("date")}, {int32()}, kPure, "04 06", "Week of the year, weeks starting on Sunday, of a date or timestamp."},
-  {"CLI_udfWEEK_ISO1", Built::no, "WEEK_ISO", Frame::plain, {text("date")}, {int32()}, kPure, "04", "ISO 8601 week number of the date at the head of the text."},
-  {"CLI_udfWEEK_ISO2", Built::no, "WEEK_ISO", Frame::plain, {text("date")}, {int32()}, kPure, "04 06", "ISO 8601 week number of a date or timestamp."},
+  {"CLI_udfWEEK1", Built::yes, "WEEK", Frame::plain, {text("date")}, {int32()}, kPure | kNarrowerForm, "04", "Week of the year, weeks starting on Sunday, of the date at the head of the text."},
+  {"CLI_udfWEEK2", Built::yes, "WEEK", Frame::plain, {text("date")}, {int32()}, kPure, "04 06", "Week of the year, weeks starting on Sunday, of a date or timestamp."},
+  {"CLI_udfWEEK_ISO1", Built::yes, "WEEK_ISO", Frame::plain, {text("date")}, {int32()}, kPure | kNarrowerForm, "04", "ISO 8601 week number of the date at the head of the text."},
+  {"CLI_udfWEEK_ISO2", Built::yes, "WEEK_ISO", Frame::plain, {text("date")}, {int32()}, kPure, "04 06", "ISO 8601 week number of a date or timestamp."},
   // Numbers in a date
-  {"CLI_udfQUARTER1", Built::no, "QUARTER", Frame::plain, {text("date")}, {int32()}, kPure, "04", "Quarter of the year of the date at the head of the text."},
-  {"CLI_udfQUARTER2", Built::no, "QUARTER", Frame::plain, {text("date")}, {int32()}, kPure, "04 06", "Quarter of the year of a date or timestamp."},
-  {"CLI_udfDAYOFYEAR1", Built::no, "DAYOFYEAR", Frame::plain, {text("date")}, {int32()}, kPure, "04", "Ordinal day in the year of the date at the head of the text."},
-  {"CLI_udfDAYOFYEAR2", Built::no, "DAYOFYEAR", Frame::plain, {text("date")}, {int32()}, kPure, "04 06", "Ordinal day in the year of a date or timestamp."},
-  {"CLI_udfDAYOFWEEK1", Built::no, "DAYOFWEEK", Frame::plain, {text("date")}, {int32()}, kPure, "04 06", "Day of the week, Sunday = 1, of a date or timestamp."},
-  {"CLI_udfDAYOFWEEK2", Built::no, "DAYOFWEEK", Frame::plain, {text("date")}, {int32()}, kPure, "04", "Day of the week, Sunday = 1, of the date at the head of the text."},
-  {"CLI_udfDAYOFWEEK_ISO1", Built::no, "DAYOFWEEK_ISO", Frame::plain, {text("date")}, {int32()}, kPure, "04 06", "Day of the week, Monday = 1, of a date or timestamp."},
-  {"CLI_udfDAYOFWEEK_ISO2", Built::no, "DAYOFWEEK_ISO", Frame::plain, {text("date")}, {int32()}, kPure, "04", "Day of the week, Monday = 1, of the date at the head of the text."},
+  {"CLI_udfQUARTER1", Built::yes, "QUARTER", Frame::plain, {text("date")}, {int32()}, kPure | kNarrowerForm, "04", "Quarter of the year of the date at the head of the text."},
+  {"CLI_udfQUARTER2", Built::yes, "QUARTER", Frame::plain, {text("date")}, {int32()}, kPure, "04 06", "Quarter of the year of a date or timestamp."},
+  {"CLI_udfDAYOFYEAR1", Built::yes, "DAYOFYEAR", Frame::plain, {text("date")}, {int32()}, kPure | kNarrowerForm, "04", "Ordinal day in the year of the date at the head of the text."},
+  {"CLI_udfDAYOFYEAR2", Built::yes, "DAYOFYEAR", Frame::plain, {text("date")}, {int32()}, kPure, "04 06", "Ordinal day in the year of a date or timestamp."},
+  {"CLI_udfDAYOFWEEK1", Built::yes, "DAYOFWEEK", Frame::plain, {text("date")}, {int32()}, kPure, "04 06", "Day of the week, Sunday = 1, of a date or timestamp."},
+  {"CLI_udfDAYOFWEEK2", Built::yes, "DAYOFWEEK", Frame::plain, {text("date")}, {int32()}, kPure | kNarrowerForm, "04", "Day of the week, Sunday = 1, of the date at the head of the text."},
+  {"CLI_udfDAYOFWEEK_ISO1", Built::yes, "DAYOFWEEK_ISO", Frame::plain, {text("date")}, {int32()}, kPure, "04 06", "Day of the week, Monday = 1, of a date or timestamp."},
+  {"CLI_udfDAYOFWEEK_ISO2", Built::yes, "DAYOFWEEK_ISO", Frame::plain, {text("date")}, {int32()}, kPure | kNarrowerForm, "04", "Day of the week, Monday = 1, of the date at the head of the text."},
   // Names in a date
   {"CLI_udfDAYNAME1", Built::no, "DAYNAME", Frame::dbinfo, {text("date")}, {textOf(kName)}, kInnocuous, "03 04 06", "Name of the day of the week of a date or timestamp, in the server's language."},
-  {"CLI_udfDAYNAME2", Built::no, "DAYNAME", Frame::dbinfo, {text("date")}, {textOf(kName)}, kInnocuous, "03 04", "Name of the day of the week of the date at the head of the text."},
-  {"CLI_udfMONTHNAME1", Built::no, "MONTHNAME", Frame::dbinfo, {text("date")}, {textOf(kName)}, kInnocuous, "03 04", "Name of the month of the date at the head of the text, in the server's language."},
+  {"CLI_udfDAYNAME2", Built::no, "DAYNAME", Frame::dbinfo, {text("date")}, {textOf(kName)}, kInnocuous | kNarrowerForm, "03 04", "Name of the day of the week of the date at the head of the text."},
+  {"CLI_udfMONTHNAME1", Built::no, "MONTHNAME", Frame::dbinfo, {text("date")}, {textOf(kName)}, kInnocuous | kNarrowerForm, "03 04", "Name of the month of the date at the head of the text, in the server's language."},
   {"CLI_udfMONTHNAME2", Built::no, "MONTHNAME", Frame::dbinfo, {text("date")}, {textOf(kName)}, kInnocuous, "03 04 06", "Name of the month of a date or timestamp."},
   // Integer and sign
   {"CLI_udfABS1", Built::no, "ABS", Frame::plain, {real("x")}, {real()}, kPure, "", "Absolute value of a double: its sign bit cleared."},
