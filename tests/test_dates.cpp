@@ -1,0 +1,228 @@
+// Date and time routines: every date of the calendar against an oracle
+// built on <chrono>, and the grammar of date, time and timestamp text.
+#include <gtest/gtest.h>
+
+#include <array>
+#include <chrono>
+#include <cstdint>
+#include <cstring>
+#include <string>
+
+#include "support/frame_call.hpp"
+
+namespace {
+
+using namespace orv::test;
+using namespace std::chrono;
+
+using DateExport = void (*)(char *, std::int32_t *, std::int16_t *, std::int16_t *, char *,
+                            const char *, const char *, char *);
+
+// The numbers a date gives, from <chrono> alone.
+struct Oracle {
+  std::int32_t julian, week, isoWeek, quarter, ordinal, dayOfWeek, isoDayOfWeek;
+};
+
+Oracle oracle(sys_days day) {
+  const year_month_day ymd{day};
+  const weekday wd{day};
+  const sys_days newYear{ymd.year() / January / 1};
+  const auto ordinal = static_cast<std::int32_t>((day - newYear).count()) + 1;
+  const auto jan1 = static_cast<std::int32_t>(weekday{newYear}.c_encoding());
+  // ISO weeks belong to the year of their Thursday.
+  const sys_days thursday = day - days{wd.iso_encoding() - 1} + days{3};
+  const sys_days isoNewYear{year_month_day{thursday}.year() / January / 1};
+  return {static_cast<std::int32_t>(day.time_since_epoch().count()) + 2440588,
+          (ordinal + jan1 - 1) / 7 + 1,
+          static_cast<std::int32_t>((thursday - isoNewYear).count() / 7) + 1,
+          static_cast<std::int32_t>((static_cast<unsigned>(ymd.month()) - 1) / 3 + 1),
+          ordinal,
+          static_cast<std::int32_t>(wd.c_encoding()) + 1,
+          static_cast<std::int32_t>(wd.iso_encoding())};
+}
+
+// Writes the date as text: full width, or month and day without leading
+// zeros, optionally with a time of day behind it.
+std::size_t spell(char *out, const year_month_day &ymd, bool shortFields, const char *time) {
+  const auto two = [&](std::size_t at, unsigned v) {
+    if (shortFields && v < 10) {
+      out[at] = static_cast<char>('0' + v);
+      return at + 1;
+    }
+    out[at] = static_cast<char>('0' + v / 10);
+    out[at + 1] = static_cast<char>('0' + v % 10);
+    return at + 2;
+  };
+  const auto y = static_cast<unsigned>(static_cast<int>(ymd.year()));
+  for (int i = 3, v = static_cast<int>(y); i >= 0; --i, v /= 10)
+    out[i] = static_cast<char>('0' + v % 10);
+  out[4] = '-';
+  std::size_t at = two(5, static_cast<unsigned>(ymd.month()));
+  out[at++] = '-';
+  at = two(at, static_cast<unsigned>(ymd.day()));
+  std::strcpy(out + at, time);
+  return at;
+}
+
+TEST(DateNumbers, AgreeWithChronoOnEveryDateOfTheCalendar) {
+  struct Routine {
+    const char *text;  // validates a time behind the date
+    const char *part;  // reads only the date
+    std::int32_t Oracle::*expected;
+  };
+  const Routine routines[] = {
+      {"CLI_udfJULIAN_DAY2", "CLI_udfJULIAN_DAY1", &Oracle::julian},
+      {"CLI_udfWEEK2", "CLI_udfWEEK1", &Oracle::week},
+      {"CLI_udfWEEK_ISO2", "CLI_udfWEEK_ISO1", &Oracle::isoWeek},
+      {"CLI_udfQUARTER2", "CLI_udfQUARTER1", &Oracle::quarter},
+      {"CLI_udfDAYOFYEAR2", "CLI_udfDAYOFYEAR1", &Oracle::ordinal},
+      {"CLI_udfDAYOFWEEK1", "CLI_udfDAYOFWEEK2", &Oracle::dayOfWeek},
+      {"CLI_udfDAYOFWEEK_ISO1", "CLI_udfDAYOFWEEK_ISO2", &Oracle::isoDayOfWeek},
+  };
+  std::array<std::array<DateExport, 2>, std::size(routines)> fns{};
+  for (std::size_t r = 0; r < std::size(routines); ++r) {
+    fns[r] = {reinterpret_cast<DateExport>(exportAddress(routines[r].text)),
+              reinterpret_cast<DateExport>(exportAddress(routines[r].part))};
+    ASSERT_TRUE(fns[r][0] != nullptr && fns[r][1] != nullptr);
+  }
+  // Each date in full width, in short fields and with a time of day behind
+  // it; trailing blanks on some.  The time must not change the number.
+  const char *times[] = {"", "-23.59.59.999999", " 12:30:15", "   "};
+  int failures = 0;
+  std::int16_t ind[2] = {};
+  for (sys_days day = sys_days{year{1} / January / 1}; day <= sys_days{year{9999} / December / 31};
+       day += days{1}) {
+    const Oracle want = oracle(day);
+    const year_month_day ymd{day};
+    const auto n = static_cast<unsigned>(day.time_since_epoch().count());
+    for (std::size_t r = 0; r < std::size(routines); ++r) {
+      for (int form = 0; form < 2; ++form) {
+        char text[40];
+        char sqlstate[6] = {};
+        char message[16] = {};
+        spell(text, ymd, ((n + r) & 1) != 0, times[(n + r + static_cast<unsigned>(form)) % 4]);
+        std::int32_t got = -1;
+        fns[r][static_cast<std::size_t>(form)](text, &got, &ind[0], &ind[1], sqlstate, "", "",
+                                               message);
+        if ((got != want.*routines[r].expected || sqlstate[0] != 0) && ++failures <= 10) {
+          ADD_FAILURE() << routines[r].part << "/" << form << " on " << text << ": " << got
+                        << ", want " << want.*routines[r].expected << " " << sqlstate;
+        }
+      }
+    }
+  }
+  EXPECT_EQ(failures, 0);
+}
+
+// Grammar, through JULIAN_DAY: the form that validates the whole text
+// gives 04 or 06, the form that reads only the date 04 or the number.
+TEST(DateGrammar, AcceptsAndRefusesByPosition) {
+  struct Case {
+    const char *text;
+    const char *whole;  // "" when valid, else the code of JULIAN_DAY2
+    const char *head;   // the same for JULIAN_DAY1
+  };
+  const Case cases[] = {
+      {"2000-01-01", "", ""},
+      {"2001-1-5", "", ""},
+      {"2001-01-5", "", ""},
+      {"2001-1-05", "", ""},
+      {"2001-01-0000000005", "", ""},
+      {"2000-01-01    ", "", ""},
+      {"2000-02-29", "", ""},
+      {"2004-02-29", "", ""},
+      {"1900-02-29", "04", "04"},
+      {"2100-02-29", "04", "04"},
+      {"0001-01-01", "", ""},
+      {"9999-12-31", "", ""},
+      {"0000-01-01", "04", "04"},
+      {" 2000-01-01", "04", "04"},
+      {"2000-1-1-1", "06", ""},
+      {"2000-00-10", "04", "04"},
+      {"2000-13-10", "04", "04"},
+      {"2000-01-32", "04", "04"},
+      {"2000-04-31", "04", "04"},
+      {"2000-01-00", "04", "04"},
+      {"2000/01/01", "04", "04"},
+      {"20000-1-01", "04", "04"},
+      {"2000-100-1", "04", "04"},
+      {"2000-1--01", "04", "04"},
+      {"2000-01-01-", "06", ""},
+      {"2000-01-01 ", "", ""},
+      {"2000-01-01-24.00.00", "", ""},
+      {"2000-01-01-24.00.01", "06", ""},
+      {"2000-01-01 13.30.15", "06", ""},
+      {"2000-01-01-13:30:15", "06", ""},
+      {"2000-01-01 13:30:15.5", "", ""},
+      {"2000-01-01-13.30.15.123456789012", "", ""},
+      {"2000-01-01-13.30.15.1234567890123", "04", "04"},  // 33 bytes
+      {"2000-01-01-25.00.00", "06", ""},
+      {"2000-13-01-25.00.00", "04", "04"},
+      {"2000-01-01xjunk", "04", "04"},
+      {"2000-01-01 junk", "06", ""},
+      {"2001-01-4294967301", "04", "04"},  // a day that wraps to 5 in 32 bits
+      {"2001-01- 12.30.00", "04", "04"},   // an empty day before a blank
+      {"2001-01--12.30.00", "04", "04"},
+      {"", "04", "04"},
+      {"        ", "04", "04"},
+      {"2000-1-1", "", ""},
+  };
+  for (const Case &c : cases) {
+    for (const auto &[routine, code] :
+         {std::pair{"CLI_udfJULIAN_DAY2", c.whole}, std::pair{"CLI_udfJULIAN_DAY1", c.head}}) {
+      const Outcome got = call(routine, {text(c.text)}, intArea());
+      EXPECT_EQ(got.error, code) << routine << " on '" << c.text << "'";
+    }
+  }
+}
+
+TEST(TimeGrammar, ReadsHoursMinutesSecondsInTimeMode) {
+  struct Case {
+    const char *text;
+    std::int64_t seconds;  // -5 when refused
+  };
+  const Case cases[] = {
+      {"00.00.00", 0},     {"23.59.59", 86399},
+      {"24.00.00", 86400}, {"12.30", 45000},
+      {"12:30:15", 45015}, {"12.30.15", 45015},
+      {"0012.30", 45000},  {".30.00", 1800},
+      {"1.30", 5400},      {"12.30.15          ", 45015},
+      {"24.00.01", -5},    {"24.01.00", -5},
+      {"25.00.00", -5},    {"12.60.00", -5},
+      {"12.00.60", -5},    {"1:2:3", -5},
+      {"12.30:15", -5},    {"12:30.15", -5},
+      {"12.345", -5},      {"12.30.15.5", -5},
+      {"123", -5},         {"123456789", -5},
+      {"12-30-15", -5},    {"", -5},
+  };
+  for (const Case &c : cases) {
+    const Outcome want = c.seconds < 0 ? fails("05") : ok(c.seconds);
+    EXPECT_EQ(call("CLI_udfMIDNIGHT_SECONDS1", {text(c.text)}, intArea()), want) << c.text;
+  }
+  // Nine bytes or more are a date or timestamp to the second form.
+  EXPECT_EQ(call("CLI_udfMIDNIGHT_SECONDS2", {text("2001-01-05-13.30.15.5")}, intArea()),
+            ok(std::int64_t{48615}));
+  EXPECT_EQ(call("CLI_udfMIDNIGHT_SECONDS2", {text("2001-01-05 ")}, intArea()),
+            ok(std::int64_t{0}));
+  EXPECT_EQ(call("CLI_udfMIDNIGHT_SECONDS2", {text("2001-1-5")}, intArea()), fails("05"));
+  EXPECT_EQ(call("CLI_udfMIDNIGHT_SECONDS2", {text("12.30.15.5")}, intArea()), fails("04"));
+  EXPECT_EQ(call("CLI_udfMIDNIGHT_SECONDS2", {text("2001-01-05-13.30")}, intArea()), fails("06"));
+}
+
+// The date routines cut trailing blanks in the caller's buffer.
+TEST(DateText, IsTrimmedInTheCallersBuffer) {
+  auto fn = reinterpret_cast<DateExport>(exportAddress("CLI_udfWEEK2"));
+  ASSERT_NE(fn, nullptr);
+  for (const char *input : {"2001-12-31  ", "2001-13-31  "}) {
+    char buffer[16] = {};
+    std::strcpy(buffer, input);
+    std::int32_t result = 0;
+    std::int16_t ind[2] = {};
+    char sqlstate[6] = {};
+    char message[16] = {};
+    fn(buffer, &result, &ind[0], &ind[1], sqlstate, "", "", message);
+    EXPECT_EQ(std::string(buffer, 12), std::string(input, 10) + std::string("\0 ", 2)) << input;
+  }
+}
+
+}  // namespace
