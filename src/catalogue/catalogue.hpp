@@ -106,11 +106,11 @@ inline constexpr Routine kRoutines[] = {
   {"CLI_udfMIDNIGHT_SECONDS1", Built::yes, "MIDNIGHT_SECONDS", Frame::plain, {text("time")}, {int32()}, kPure | kNarrowerForm, "05", "Seconds since midnight of a time."},
   {"CLI_udfMIDNIGHT_SECONDS2", Built::yes, "MIDNIGHT_SECONDS", Frame::plain, {text("value")}, {int32()}, kPure, "04 05 06", "Seconds since midnight of a time, or of the time of day of a timestamp."},
   // Timestamps
-  {"CLI_udfTIMESTAMP", Built::no, "TIMESTAMP", Frame::plain, {text("value")}, {textOf(kStamp)}, kInnocuous, "04 05 06", "Timestamp text from a date, a time (on today's UTC date) or a timestamp."},
-  {"CLI_udfTIMESTAMPDATE", Built::no, "TIMESTAMPDATE", Frame::plain, {text("date")}, {textOf(kStamp)}, kPure, "04", "Timestamp text of a date at midnight."},
-  {"CLI_udfTIMESTAMPTIME", Built::no, "TIMESTAMPTIME", Frame::plain, {text("time")}, {textOf(kStamp)}, kInnocuous, "05", "Timestamp text of a time on today's UTC date."},
+  {"CLI_udfTIMESTAMP", Built::yes, "TIMESTAMP", Frame::plain, {text("value")}, {textOf(kStamp)}, kInnocuous, "04 05 06", "Timestamp text from a date, a time (on today's UTC date) or a timestamp."},
+  {"CLI_udfTIMESTAMPDATE", Built::yes, "TIMESTAMPDATE", Frame::plain, {text("date")}, {textOf(kStamp)}, kPure, "04", "Timestamp text of a date at midnight."},
+  {"CLI_udfTIMESTAMPTIME", Built::yes, "TIMESTAMPTIME", Frame::plain, {text("time")}, {textOf(kStamp)}, kInnocuous, "05", "Timestamp text of a time on today's UTC date."},
   // Timestamp durations
-  {"CLI_udfTIMESTAMPDIFF", Built::no, "TIMESTAMPDIFF", Frame::plain, {int32("interval"), text("duration")}, {int32()}, kPure, "03 07 08 10", "A timestamp duration as a number of the unit that the interval code names."},
+  {"CLI_udfTIMESTAMPDIFF", Built::yes, "TIMESTAMPDIFF", Frame::plain, {int32("interval"), text("duration")}, {int32()}, kPure, "03 07 08 10", "A timestamp duration as a number of the unit that the interval code names."},
   // Weeks
   {"CLI_udfWEEK1", Built::yes, "WEEK", Frame::plain, {text("date")}, {int32()}, kPure | kNarrowerForm, "04", "Week of the year, weeks starting on Sunday, of the date at the head of the text."},
   {"CLI_udfWEEK2", Built::yes, "WEEK", Frame::plain, {text("date")}, {int32()}, kPure, "04 06", "Week of the year, weeks starting on Sunday, of a date or timestamp."},
