@@ -6,6 +6,7 @@
 #include <chrono>
 #include <cstdint>
 #include <cstring>
+#include <random>
 #include <string>
 
 #include "support/frame_call.hpp"
@@ -222,6 +223,154 @@ TEST(DateText, IsTrimmedInTheCallersBuffer) {
     char message[16] = {};
     fn(buffer, &result, &ind[0], &ind[1], sqlstate, "", "", message);
     EXPECT_EQ(std::string(buffer, 12), std::string(input, 10) + std::string("\0 ", 2)) << input;
+  }
+}
+
+TEST(Timestamp, JoinsTheTextAsWrittenWithMidnightOrToday) {
+  const year_month_day today{floor<days>(system_clock::now())};
+  char stamp[12];
+  spell(stamp, today, false, "-");
+  const std::string t = stamp;
+  const struct {
+    const char *routine, *input;
+    Outcome expected;
+  } cases[] = {
+      {"CLI_udfTIMESTAMP", "2001-01-05", ok("2001-01-05-00.00.00.000000")},
+      {"CLI_udfTIMESTAMP", "2001-1-5  ", ok("2001-1-5-00.00.00.000000")},
+      {"CLI_udfTIMESTAMP", "13.30.15", ok(t + "13.30.15.000000")},
+      {"CLI_udfTIMESTAMP", "13:30:15", ok(t + "13:30:15.000000")},
+      {"CLI_udfTIMESTAMP", "2001-01-05 13:30:15", ok("2001-01-05 13:30:15")},
+      {"CLI_udfTIMESTAMP", "2001-01-05-13.30.15.123456789", ok("2001-01-05-13.30.15.123456")},
+      {"CLI_udfTIMESTAMP", "2001-1-5-1", ok("2001-1-5-1-00.00.00.000000")},
+      {"CLI_udfTIMESTAMP", "12.30", fails("06")},
+      {"CLI_udfTIMESTAMP", "1234567890", fails("06")},
+      {"CLI_udfTIMESTAMP", "   ", fails("06")},
+      {"CLI_udfTIMESTAMP", "25.00.00", fails("05")},
+      {"CLI_udfTIMESTAMP", "2001-13-5", fails("04")},
+      {"CLI_udfTIMESTAMP", "2001-01-05-25.00.00", fails("06")},
+      {"CLI_udfTIMESTAMP", "2001-02-30-12.00.00", fails("04")},
+      {"CLI_udfTIMESTAMPTIME", "1.30", ok(t + "1.30.000000")},
+      {"CLI_udfTIMESTAMPTIME", "24.00.00 ", ok(t + "24.00.00.000000")},
+      {"CLI_udfTIMESTAMPTIME", "2001-01-05", fails("05")},
+      {"CLI_udfTIMESTAMPDATE", "2001-01-05 ", ok("2001-01-05-00.00.00.000000")},
+      {"CLI_udfTIMESTAMPDATE", "13.30.15", fails("04")},
+      // A date text that passes the parser but would not fit the result.
+      {"CLI_udfTIMESTAMPDATE", "2001-01-05-13.30.15.123456789012", fails("04")},
+      {"CLI_udfTIMESTAMPDATE", "2001-01-0000000000000000000005", fails("04")},
+  };
+  for (const auto &c : cases) {
+    EXPECT_EQ(call(c.routine, {text(c.input)}, textArea(27)), c.expected)
+        << c.routine << " on '" << c.input << "'";
+  }
+}
+
+// TIMESTAMPDIFF computed again with exact integers from the text's fields.
+Outcome durationModel(std::int32_t code, const std::string &text) {
+  std::string s = text;
+  while (s.size() > 1 && s.back() == ' ') s.pop_back();
+  const bool negative = !s.empty() && s[0] == '-';
+  if (!s.empty() && (s[0] == '-' || s[0] == '+')) s.erase(0, 1);
+  const auto point = s.find('.');
+  const std::string whole = s.substr(0, point);
+  const std::string fraction = point == std::string::npos ? "" : s.substr(point + 1);
+  for (const std::string &part : {whole, fraction}) {
+    if (part.find_first_not_of("0123456789") != std::string::npos) return fails("07");
+  }
+  if (whole.size() > 14 || fraction.size() > 6) return fails("10");
+  const std::string digits = std::string(14 - whole.size(), '0') + whole;
+  const auto at = [&](std::size_t from, std::size_t n) {
+    return std::stoll(digits.substr(from, n));
+  };
+  const long long y = at(0, 4), mo = at(4, 2), d = at(6, 2), h = at(8, 2), mi = at(10, 2),
+                  sec = at(12, 2), f = std::stoll((fraction + "000000").substr(0, 6));
+  const long long minutes = ((y * 365 + mo * 30 + d) * 24 + h) * 60 + mi;
+  long long value = 0;
+  switch (code) {
+    case 1:
+      value = (minutes * 60 + sec) * 1000000 + f;
+      break;
+    case 2:
+      value = minutes * 60 + sec;
+      break;
+    case 4:
+      value = minutes;
+      break;
+    case 8:
+      value = (y * 365 + mo * 30 + d) * 24 + h;
+      break;
+    case 16:
+      value = y * 365 + mo * 30 + d;
+      break;
+    case 32:
+      value = y * 52 + (mo * 30 + d) / 7;
+      break;
+    case 64:
+      value = y * 12 + mo;
+      break;
+    case 128:
+      value = y * 4 + mo / 3;
+      break;
+    case 256:
+      value = y;
+      break;
+    default:
+      return fails("08");
+  }
+  if (value > 2147483647) return fails("03");
+  return ok(std::int64_t{negative ? -value : value});
+}
+
+TEST(TimestampDiff, ConvertsDurationsByFixedRatios) {
+  const struct {
+    std::int32_t code;
+    const char *duration;
+    Outcome expected;
+  } cases[] = {
+      {8, "10000", ok(std::int64_t{1})},
+      {4, "10000", ok(std::int64_t{60})},
+      {16, "10000", ok(std::int64_t{0})},
+      {2, "1000000", ok(std::int64_t{86400})},
+      {1, "1000000", fails("03")},
+      {32, "100000000", ok(std::int64_t{4})},
+      {128, "100000000", ok(std::int64_t{0})},
+      {16, "1200000000", ok(std::int64_t{360})},
+      {16, "10000000000", ok(std::int64_t{365})},
+      {1, "1.5", ok(std::int64_t{1500000})},
+      {2, "-100", ok(std::int64_t{-60})},
+      {2, "+100", ok(std::int64_t{60})},
+      {1, "3547.483647", ok(std::int64_t{2147483647})},
+      {1, "3547.483648", fails("03")},
+      {2, "680105031407", ok(std::int64_t{2147483647})},
+      {2, "680105031408", fails("03")},
+      {2, "", ok(std::int64_t{0})},
+      {3, "", fails("08")},
+      {2, "   ", fails("07")},
+      {2, "-", ok(std::int64_t{0})},
+      {2, "+.", ok(std::int64_t{0})},
+      {2, "1.5 ", ok(std::int64_t{1})},
+      {2, "1 5", fails("07")},
+      {2, "1-5", fails("07")},
+      {2, "12345678901234.123456", fails("03")},
+      {2, "123456789012345", fails("10")},
+      {2, "-1.1234567", fails("10")},
+      {3, "1x", fails("07")},
+      {4, "40850000000000", ok(std::int64_t{2147076000})},
+      {4, "40860000000000", fails("03")},
+  };
+  for (const auto &c : cases) {
+    EXPECT_EQ(call("CLI_udfTIMESTAMPDIFF", {i32(c.code), text(c.duration)}, intArea()), c.expected)
+        << c.code << " '" << c.duration << "'";
+    EXPECT_EQ(durationModel(c.code, c.duration), c.expected) << "model on '" << c.duration << "'";
+  }
+  // Random durations near and past the limits of every code.
+  std::mt19937 random(1122);
+  const std::string alphabet = "0123456789000000009.+- ";
+  for (int round = 0; round < 20000; ++round) {
+    std::string d(std::uniform_int_distribution<std::size_t>(0, 22)(random), '0');
+    for (char &c : d) c = alphabet[std::uniform_int_distribution<std::size_t>(0, 22)(random)];
+    const std::int32_t code = 1 << std::uniform_int_distribution<int>(0, 9)(random);
+    const Outcome got = call("CLI_udfTIMESTAMPDIFF", {i32(code), text(d)}, intArea());
+    ASSERT_EQ(got, durationModel(code, d)) << code << " '" << d << "'";
   }
 }
 
