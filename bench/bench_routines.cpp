@@ -129,7 +129,63 @@ void memcpy4000(benchmark::State &s) {
   s.SetBytesProcessed(s.iterations() * 4000);
 }
 
+void timestampRow(benchmark::State &s) {
+  run(s, "CLI_udfTIMESTAMP", {text("2001-09-27-13.30.15.123456")}, textArea());
+}
+void timestampDiffRow(benchmark::State &s) {
+  run(s, "CLI_udfTIMESTAMPDIFF", {int32(2), text("00000123123030.123456")}, int32(0));
+}
+
+// Date routines trim their input in place, so each call gets a fresh copy
+// of the text, as an engine hands each row's value.
+void dateRoutine(benchmark::State &state, const char *name, const char *value) {
+  void *fn = exportNamed(name);
+  const std::size_t size = std::strlen(value) + 1;
+  char text[40];
+  std::int32_t result = 0;
+  std::int16_t indicators[2] = {};
+  char sqlstate[6] = {};
+  char message[70] = {};
+  void *args[] = {text,     &result, &indicators[0], &indicators[1],
+                  sqlstate, nullptr, nullptr,        message};
+  for (auto _ : state) {
+    std::memcpy(text, value, size);
+    invoke(fn, args, std::make_index_sequence<8>{});
+    benchmark::DoNotOptimize(result);
+  }
+  if (sqlstate[0] != '\0') state.SkipWithError("the routine reported a status");
+}
+
+constexpr const char *kDate = "2001-09-27";
+constexpr const char *kTimestamp = "2001-09-27-13.30.15.123456";
+
 }  // namespace
+
+BENCHMARK_CAPTURE(dateRoutine, julianDay2Date, "CLI_udfJULIAN_DAY2", kDate)
+    ->Name("JULIAN_DAY2/10-byte date");
+BENCHMARK_CAPTURE(dateRoutine, julianDay2Stamp, "CLI_udfJULIAN_DAY2", kTimestamp)
+    ->Name("JULIAN_DAY2/26-byte timestamp");
+BENCHMARK_CAPTURE(dateRoutine, julianDay1Stamp, "CLI_udfJULIAN_DAY1", kTimestamp)
+    ->Name("JULIAN_DAY1/26-byte timestamp");
+BENCHMARK_CAPTURE(dateRoutine, week2, "CLI_udfWEEK2", kTimestamp)->Name("WEEK2/26-byte timestamp");
+BENCHMARK_CAPTURE(dateRoutine, weekIso2Date, "CLI_udfWEEK_ISO2", kDate)
+    ->Name("WEEK_ISO2/10-byte date");
+BENCHMARK_CAPTURE(dateRoutine, weekIso2, "CLI_udfWEEK_ISO2", kTimestamp)
+    ->Name("WEEK_ISO2/26-byte timestamp");
+BENCHMARK_CAPTURE(dateRoutine, quarter2, "CLI_udfQUARTER2", kTimestamp)
+    ->Name("QUARTER2/26-byte timestamp");
+BENCHMARK_CAPTURE(dateRoutine, dayOfYear2Date, "CLI_udfDAYOFYEAR2", kDate)
+    ->Name("DAYOFYEAR2/10-byte date");
+BENCHMARK_CAPTURE(dateRoutine, dayOfWeek1, "CLI_udfDAYOFWEEK1", kTimestamp)
+    ->Name("DAYOFWEEK1/26-byte timestamp");
+BENCHMARK_CAPTURE(dateRoutine, dayOfWeekIso1Date, "CLI_udfDAYOFWEEK_ISO1", kDate)
+    ->Name("DAYOFWEEK_ISO1/10-byte date");
+BENCHMARK_CAPTURE(dateRoutine, midnight1, "CLI_udfMIDNIGHT_SECONDS1", "13.30.15")
+    ->Name("MIDNIGHT_SECONDS1/8-byte time");
+BENCHMARK_CAPTURE(dateRoutine, midnight2, "CLI_udfMIDNIGHT_SECONDS2", kTimestamp)
+    ->Name("MIDNIGHT_SECONDS2/26-byte timestamp");
+BENCHMARK(timestampRow)->Name("TIMESTAMP/26-byte timestamp");
+BENCHMARK(timestampDiffRow)->Name("TIMESTAMPDIFF/2, 20-byte duration");
 
 BENCHMARK(space)->Name("SPACE/20");
 BENCHMARK(lcase1)->Name("LCASE1/20-byte text");
