@@ -1,5 +1,4 @@
-// The library's export surface, read from the built file as an engine's
-// loader sees it: the dynamic symbol table must hold exactly the routines
+// The export surface as an engine's loader sees it: exactly the routines
 // that the catalogue marks as built, and the data export.
 #include <elf.h>
 #include <gtest/gtest.h>

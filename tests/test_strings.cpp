@@ -41,30 +41,21 @@ std::string times(const std::string &s, std::int32_t count) {
 TEST(CaseAndTrim, WorkOnBytesAndOnlySpaceAndTabAreBlanks) {
   check({
       {"CLI_udfLCASE1", {text("ABC xyz \xC4")}, textArea(), ok("abc xyz \xC4")},
-      {"CLI_udfLCASE1", {text("")}, textArea(), ok("")},
       {"CLI_udfLCASE2", {lob("A\0B"s)}, lobArea(), ok("a\0b"s)},
-      {"CLI_udfLCASE2", {lob("")}, lobArea(), ok("")},
       {"CLI_udfRTRIM1", {text(" a b \t \t")}, textArea(), ok(" a b")},
       {"CLI_udfRTRIM1", {text(" \t ")}, textArea(), ok("")},
-      {"CLI_udfRTRIM1", {text("x")}, textArea(), ok("x")},
       {"CLI_udfRTRIM1", {text("a\n\r\v\f")}, textArea(), ok("a\n\r\v\f")},
       {"CLI_udfRTRIM2", {lob("a\0 \t"s)}, lobArea(), ok("a\0"s)},
       {"CLI_udfRTRIM2", {lob("\0"s)}, lobArea(), ok("\0"s)},
-      {"CLI_udfRTRIM2", {lob(" \t")}, lobArea(), ok("")},
-      {"CLI_udfRTRIM2", {lob("")}, lobArea(), ok("")},
       {"CLI_udfLTRIM1", {text(" \ta \t")}, textArea(), ok("a \t")},
       {"CLI_udfLTRIM1", {text("\r a")}, textArea(), ok("\r a")},
-      {"CLI_udfLTRIM1", {text("   ")}, textArea(), ok("")},
       {"CLI_udfLTRIM2", {lob(" \0 a"s)}, lobArea(), ok("\0 a"s)},
-      {"CLI_udfLTRIM2", {lob("\t")}, lobArea(), ok("")},
   });
 }
 
 TEST(LeftAndRight, GiveExactlyNBytesWithBlanksBehindAndCheckTheirLimits) {
   check({
-      {"CLI_udfLEFT1", {text("abc"), i32(2)}, textArea(), ok("ab")},
       {"CLI_udfLEFT1", {text("abc"), i32(5)}, textArea(), ok("abc  ")},
-      {"CLI_udfLEFT1", {text("abc"), i32(0)}, textArea(), ok("")},
       {"CLI_udfLEFT1", {text("abc"), i32(4000)}, textArea(), ok("abc" + std::string(3997, ' '))},
       {"CLI_udfLEFT1", {text("abc"), i32(4001)}, textArea(), fails("01")},
       {"CLI_udfLEFT1", {text("abc"), i32(-1)}, textArea(), fails("01")},
@@ -73,9 +64,7 @@ TEST(LeftAndRight, GiveExactlyNBytesWithBlanksBehindAndCheckTheirLimits) {
       {"CLI_udfLEFT2", {lob("abc"), i32(10)}, lobArea(10), fails("01")},
       {"CLI_udfLEFT2", {lob("abc"), i32(0)}, lobArea(0), fails("01")},
       {"CLI_udfLEFT2", {lob("abc"), i32(-1)}, lobArea(10), fails("01")},
-      {"CLI_udfRIGHT1", {text("abcdef"), i32(2)}, textArea(), ok("ef")},
       {"CLI_udfRIGHT1", {text("abc"), i32(5)}, textArea(), ok("abc  ")},
-      {"CLI_udfRIGHT1", {text("abc"), i32(0)}, textArea(), ok("")},
       {"CLI_udfRIGHT1", {text(k4000), i32(4000)}, textArea(), ok(k4000)},
       {"CLI_udfRIGHT1", {text("abc"), i32(4001)}, textArea(), fails("01")},
       {"CLI_udfRIGHT1", {text("abc"), i32(-1)}, textArea(), fails("01")},
@@ -91,7 +80,6 @@ TEST(LeftAndRight, GiveExactlyNBytesWithBlanksBehindAndCheckTheirLimits) {
 TEST(Repeat, BuildsUpToItsLimitAndIgnoresTheCountOfEmptyInput) {
   check({
       {"CLI_udfREPEAT1", {text("ab"), i32(3)}, textArea(), ok("ababab")},
-      {"CLI_udfREPEAT1", {text("ab"), i32(0)}, textArea(), ok("")},
       {"CLI_udfREPEAT1", {text("abc"), i32(1333)}, textArea(), ok(times("abc", 1333))},
       {"CLI_udfREPEAT1", {text("abc"), i32(1334)}, textArea(), fails("10")},
       {"CLI_udfREPEAT1", {text(k4000), i32(1)}, textArea(), ok(k4000)},
