@@ -97,12 +97,15 @@ TEST(Exports, AreExactlyTheBuiltRoutinesAndTheDataExport) {
   EXPECT_EQ(*mark, 0);
 }
 
-TEST(Catalogue, NamesEachExportAfterItsSqlFunction) {
+TEST(Catalogue, NamesEachExportOnceAfterItsSqlFunctionAndFindsTheBuiltOnes) {
   const std::set<std::string> mixedCase = {"CLI_udfFmpThreads", "CLI_udfFmpRows",
                                            "SQLCACHE_SNAPSHOT"};
   std::set<std::string> seen;
   for (const auto &r : kRoutines) {
     EXPECT_TRUE(seen.insert(r.symbol).second) << r.symbol << " is listed twice";
+    if (r.built == Built::yes) {
+      EXPECT_NE(orv::test::exportAddress(r.symbol), nullptr) << r.symbol << " is not found";
+    }
     if (mixedCase.contains(r.symbol)) continue;
     const std::string base = "CLI_udf" + std::string(r.sqlName);
     const std::string symbol = r.symbol;

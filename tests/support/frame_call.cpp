@@ -4,6 +4,7 @@
 #include <gtest/gtest.h>
 
 #include <algorithm>
+#include <cctype>
 #include <cstring>
 #include <utility>
 
@@ -17,58 +18,54 @@ constexpr std::int16_t kIndicator = 0x5A5A;
 constexpr std::size_t kMessageBytes = 70;
 
 void *library() {
-  static void *handle = dlopen(ORV_LIBRARY_PATH, RTLD_NOW | RTLD_LOCAL);
+  static void *handle = [] {
+    void *h = dlopen(ORV_LIBRARY_PATH, RTLD_NOW | RTLD_LOCAL);
+    if (h == nullptr) ADD_FAILURE() << dlerror();
+    return h;
+  }();
   return handle;
 }
 
-// Every frame argument is a pointer, so one pointer type per count serves.
+// Every frame argument is a pointer, so a pointer type taking K void *
+// parameters serves for any routine with a frame of K arguments.
 template <std::size_t... Is>
-void invoke(void *fn, void *const *args, std::index_sequence<Is...>) {
+bool invoke(void *fn, void *const *args, std::index_sequence<Is...>) {
   using Export = void (*)(decltype(Is, static_cast<void *>(nullptr))...);
   reinterpret_cast<Export>(fn)(args[Is]...);
+  return true;
 }
 
-template <std::size_t... Ks>
-void invokeWith(void *fn, const std::vector<void *> &args, std::index_sequence<Ks...>) {
-  ((args.size() == Ks ? invoke(fn, args.data(), std::make_index_sequence<Ks>{}) : void()), ...);
+// Calls `fn` with the K = 2N + 2M + 4 arguments of a plain frame.
+bool invokeFrame(void *fn, const std::vector<void *> &args) {
+  switch (args.size()) {
+    case 8:
+      return invoke(fn, args.data(), std::make_index_sequence<8>{});
+    case 10:
+      return invoke(fn, args.data(), std::make_index_sequence<10>{});
+    case 12:
+      return invoke(fn, args.data(), std::make_index_sequence<12>{});
+    case 14:
+      return invoke(fn, args.data(), std::make_index_sequence<14>{});
+    default:
+      ADD_FAILURE() << "no frame of " << args.size() << " arguments";
+      return false;
+  }
 }
 
+// A 32-bit integer is its word; terminated text its bytes and a NUL; a
+// CLI_udfLob its length word and its data.
 std::vector<unsigned char> layOut(const Value &v) {
-  std::vector<unsigned char> out;
-  const auto append = [&](const void *p, std::size_t n) {
-    const auto *b = static_cast<const unsigned char *>(p);
-    out.insert(out.end(), b, b + n);
-  };
-  switch (v.layout) {
-    case Value::Layout::int32: {
-      const auto x = static_cast<std::int32_t>(v.number);
-      append(&x, sizeof x);
-      break;
-    }
-    case Value::Layout::text:
-      append(v.bytes.data(), v.bytes.size());
-      out.push_back(0);
-      break;
-    case Value::Layout::lob: {
-      const auto n = static_cast<std::uint32_t>(v.bytes.size());
-      append(&n, sizeof n);
-      append(v.bytes.data(), v.bytes.size());
-      break;
-    }
+  std::vector<unsigned char> out(v.bytes.begin(), v.bytes.end());
+  if (v.layout == Value::Layout::text) {
+    out.push_back(0);
+  } else {
+    const auto word = static_cast<std::uint32_t>(
+        v.layout == Value::Layout::int32 ? v.number : std::ssize(v.bytes));
+    unsigned char head[4];
+    std::memcpy(head, &word, sizeof word);
+    out.insert(out.begin(), head, head + 4);
   }
   return out;
-}
-
-std::size_t areaSize(const Value &r) {
-  switch (r.layout) {
-    case Value::Layout::int32:
-      return 4;
-    case Value::Layout::text:
-      return r.size;
-    case Value::Layout::lob:
-      return 4 + std::size_t{r.size};
-  }
-  return 0;
 }
 
 }  // namespace
@@ -94,7 +91,9 @@ Outcome call(const char *name, const std::vector<Value> &inputs, const Value &re
   in.reserve(inputs.size());
   for (const Value &v : inputs) in.push_back(layOut(v));
 
-  const std::size_t area = areaSize(result);
+  const std::size_t area = result.layout == Value::Layout::int32  ? 4
+                           : result.layout == Value::Layout::text ? result.size
+                                                                  : 4 + std::size_t{result.size};
   std::vector<unsigned char> out(area + kCanaryBytes, kCanary);
   std::fill_n(out.begin(), area, kUnwritten);
   if (result.layout == Value::Layout::lob) std::memcpy(out.data(), &result.size, 4);
@@ -115,7 +114,7 @@ Outcome call(const char *name, const std::vector<Value> &inputs, const Value &re
   args.push_back(const_cast<char *>("FUNCTION"));
   args.push_back(const_cast<char *>("SPECIFIC"));
   args.push_back(message);
-  invokeWith(fn, args, std::index_sequence<8, 10, 12, 14>{});
+  if (!invokeFrame(fn, args)) return fails("no frame");
 
   EXPECT_TRUE(std::all_of(out.begin() + static_cast<std::ptrdiff_t>(area), out.end(),
                           [](unsigned char b) { return b == kCanary; }))
@@ -127,6 +126,9 @@ Outcome call(const char *name, const std::vector<Value> &inputs, const Value &re
   if (sqlstate[0] != 'S') {
     EXPECT_EQ(std::string(sqlstate, 6), std::string("38552\0", 6)) << name;
     EXPECT_EQ(std::string(message, 7), "SYSFUN:") << name;
+    EXPECT_TRUE(std::isdigit(static_cast<unsigned char>(message[7])) &&
+                std::isdigit(static_cast<unsigned char>(message[8])))
+        << name << ": the code is not two digits";
     EXPECT_EQ(message[9], '\0') << name;
     EXPECT_TRUE(std::all_of(message + 10, message + kMessageBytes, [](char c) { return c == 'M'; }))
         << name << " wrote past the message";
