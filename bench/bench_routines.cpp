@@ -159,31 +159,34 @@ void dateRoutine(benchmark::State &state, const char *name, const char *value) {
 constexpr const char *kDate = "2001-09-27";
 constexpr const char *kTimestamp = "2001-09-27-13.30.15.123456";
 
+// Date rows: name, export, text.
+struct DateRow {
+  const char *name, *routine, *value;
+};
+constexpr DateRow kDateRows[] = {
+    {"JULIAN_DAY2/10-byte date", "CLI_udfJULIAN_DAY2", kDate},
+    {"JULIAN_DAY2/26-byte timestamp", "CLI_udfJULIAN_DAY2", kTimestamp},
+    {"JULIAN_DAY1/26-byte timestamp", "CLI_udfJULIAN_DAY1", kTimestamp},
+    {"WEEK2/26-byte timestamp", "CLI_udfWEEK2", kTimestamp},
+    {"WEEK_ISO2/10-byte date", "CLI_udfWEEK_ISO2", kDate},
+    {"WEEK_ISO2/26-byte timestamp", "CLI_udfWEEK_ISO2", kTimestamp},
+    {"QUARTER2/26-byte timestamp", "CLI_udfQUARTER2", kTimestamp},
+    {"DAYOFYEAR2/10-byte date", "CLI_udfDAYOFYEAR2", kDate},
+    {"DAYOFWEEK1/26-byte timestamp", "CLI_udfDAYOFWEEK1", kTimestamp},
+    {"DAYOFWEEK_ISO1/10-byte date", "CLI_udfDAYOFWEEK_ISO1", kDate},
+    {"MIDNIGHT_SECONDS1/8-byte time", "CLI_udfMIDNIGHT_SECONDS1", "13.30.15"},
+    {"MIDNIGHT_SECONDS2/26-byte timestamp", "CLI_udfMIDNIGHT_SECONDS2", kTimestamp},
+};
+
+const bool kDateRowsRegistered = [] {
+  for (const DateRow &r : kDateRows) {
+    benchmark::RegisterBenchmark(r.name, dateRoutine, r.routine, r.value);
+  }
+  return true;
+}();
+
 }  // namespace
 
-BENCHMARK_CAPTURE(dateRoutine, julianDay2Date, "CLI_udfJULIAN_DAY2", kDate)
-    ->Name("JULIAN_DAY2/10-byte date");
-BENCHMARK_CAPTURE(dateRoutine, julianDay2Stamp, "CLI_udfJULIAN_DAY2", kTimestamp)
-    ->Name("JULIAN_DAY2/26-byte timestamp");
-BENCHMARK_CAPTURE(dateRoutine, julianDay1Stamp, "CLI_udfJULIAN_DAY1", kTimestamp)
-    ->Name("JULIAN_DAY1/26-byte timestamp");
-BENCHMARK_CAPTURE(dateRoutine, week2, "CLI_udfWEEK2", kTimestamp)->Name("WEEK2/26-byte timestamp");
-BENCHMARK_CAPTURE(dateRoutine, weekIso2Date, "CLI_udfWEEK_ISO2", kDate)
-    ->Name("WEEK_ISO2/10-byte date");
-BENCHMARK_CAPTURE(dateRoutine, weekIso2, "CLI_udfWEEK_ISO2", kTimestamp)
-    ->Name("WEEK_ISO2/26-byte timestamp");
-BENCHMARK_CAPTURE(dateRoutine, quarter2, "CLI_udfQUARTER2", kTimestamp)
-    ->Name("QUARTER2/26-byte timestamp");
-BENCHMARK_CAPTURE(dateRoutine, dayOfYear2Date, "CLI_udfDAYOFYEAR2", kDate)
-    ->Name("DAYOFYEAR2/10-byte date");
-BENCHMARK_CAPTURE(dateRoutine, dayOfWeek1, "CLI_udfDAYOFWEEK1", kTimestamp)
-    ->Name("DAYOFWEEK1/26-byte timestamp");
-BENCHMARK_CAPTURE(dateRoutine, dayOfWeekIso1Date, "CLI_udfDAYOFWEEK_ISO1", kDate)
-    ->Name("DAYOFWEEK_ISO1/10-byte date");
-BENCHMARK_CAPTURE(dateRoutine, midnight1, "CLI_udfMIDNIGHT_SECONDS1", "13.30.15")
-    ->Name("MIDNIGHT_SECONDS1/8-byte time");
-BENCHMARK_CAPTURE(dateRoutine, midnight2, "CLI_udfMIDNIGHT_SECONDS2", kTimestamp)
-    ->Name("MIDNIGHT_SECONDS2/26-byte timestamp");
 BENCHMARK(timestampRow)->Name("TIMESTAMP/26-byte timestamp");
 BENCHMARK(timestampDiffRow)->Name("TIMESTAMPDIFF/2, 20-byte duration");
 
