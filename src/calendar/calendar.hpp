@@ -61,17 +61,28 @@ constexpr std::int32_t CLI_isLeapYear(std::int32_t year) {
   return (year % 4 == 0 && year % 100 != 0) || year % 400 == 0 ? 1 : 0;
 }
 
-// Days from the start of year 1 to the start of `year`, counted in whole
-// blocks: 400 years have 146097 days, 100 years ending in a common century
-// year 36524, 4 years ending in a leap year 1461.  Years left over after
-// the last block of 4 are common years.
+// Days from the start of year 1 to the start of `year` (1 or later): 365
+// for each year gone by and one more for each leap year among them.  The
+// three divisions are independent of each other, so they run side by side.
 constexpr std::int32_t CLI_daysBeforeYear(std::int32_t year) {
-  const std::int32_t y = year - 1;
-  const std::int32_t q = y / 400, r = y % 400;
-  const std::int32_t c = r / 100, s = r % 100;
-  const std::int32_t f = s / 4, t = s % 4;
-  return q * 146097 + c * 36524 + f * 1461 + t * 365;
+  const auto y = static_cast<std::uint32_t>(year - 1);
+  return static_cast<std::int32_t>(y * 365 + y / 4 - y / 100 + y / 400);
 }
+
+// The same count in whole blocks: 400 years have 146097 days, 100 years
+// ending in a common century year 36524, 4 years ending in a leap year
+// 1461.  Years left over after the last block of 4 are common years.
+consteval bool daysBeforeYearCountsBlocks() {
+  for (std::int32_t year = 1; year <= 10000; ++year) {
+    const std::int32_t y = year - 1;
+    const std::int32_t q = y / 400, r = y % 400;
+    const std::int32_t c = r / 100, s = r % 100;
+    const std::int32_t f = s / 4, t = s % 4;
+    if (CLI_daysBeforeYear(year) != q * 146097 + c * 36524 + f * 1461 + t * 365) return false;
+  }
+  return true;
+}
+static_assert(daysBeforeYearCountsBlocks());
 
 // Ordinal day in the year, 1 to 366.
 constexpr std::int32_t CLI_dayOfYear(std::int32_t year, std::int32_t month, std::int32_t day) {

@@ -47,7 +47,7 @@ constexpr std::int32_t secondsOf(std::int32_t h, std::int32_t m, std::int32_t s)
 #define CLI_DATE_EXPORT(name, reader, compute)                                              \
   CLI_EXPORT void name(char *text, std::int32_t *result, Ind, Ind, char *sqlstate, NameArg, \
                        NameArg, char *message) noexcept {                                   \
-    reader<compute>(text, result, Status{sqlstate, message});                               \
+    reader<compute>(text, result, Status{sqlstate, message}); /* NOLINT */                  \
   }
 
 CLI_DATE_EXPORT(CLI_udfJULIAN_DAY1, fromDatePart, cli::CLI_julianDay)

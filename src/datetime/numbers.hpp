@@ -28,8 +28,6 @@ constexpr std::int32_t CLI_isoDayOfWeek(std::int32_t y, std::int32_t m, std::int
   return r == 0 ? 7 : r;  // Monday = 1
 }
 
-constexpr std::int32_t yearLength(std::int32_t y) { return 365 + CLI_isLeapYear(y); }
-
 // Weeks from Sunday to Saturday; week 1 runs from 1 January to the first
 // Saturday, so the number never belongs to a neighbouring year (1 to 54).
 constexpr std::int32_t CLI_weekOfYear(std::int32_t y, std::int32_t m, std::int32_t d) {
@@ -39,21 +37,25 @@ constexpr std::int32_t CLI_weekOfYear(std::int32_t y, std::int32_t m, std::int32
 }
 
 // ISO 8601 weeks: from Monday to Sunday, week 1 holding the year's first
-// Thursday.  `before` mod 7 counts 1 January's weekday from Monday = 0.
+// Thursday.  A year has 53 weeks when it starts on a Thursday, or on a
+// Wednesday in a leap year; `first` counts 1 January's weekday from
+// Monday = 0 (day number 1 is a Monday).
+constexpr std::int32_t isoWeeksIn(std::int32_t first, std::int32_t leap) {
+  return first == 3 || (leap == 1 && first == 2) ? 53 : 52;
+}
+
 constexpr std::int32_t CLI_isoWeekOfYear(std::int32_t y, std::int32_t m, std::int32_t d) {
-  const auto firstSunday = [](std::int32_t year) { return 7 - CLI_daysBeforeYear(year) % 7; };
-  // Days up to the first Sunday: 4 or more make them week 1 of this year.
-  const auto base = [&](std::int32_t year) { return firstSunday(year) >= 4 ? 2 : 1; };
+  const std::int32_t before = CLI_daysBeforeYear(y);
   const std::int32_t ordinal = CLI_dayOfYear(y, m, d);
-  if (ordinal <= firstSunday(y)) {
-    if (base(y) == 2) return 1;
-    // 1 to 3 January in the last week of the year before: its 31 December.
-    return (yearLength(y - 1) - firstSunday(y - 1) - 1) / 7 + base(y - 1);
+  const std::int32_t first = before % 7;
+  const std::int32_t weekday = (first + ordinal - 1) % 7 + 1;  // Monday = 1
+  const std::int32_t week = (ordinal - weekday + 10) / 7;
+  if (week == 0) {
+    // 1 to 3 January in the last week of the year before.
+    const std::int32_t leapBefore = CLI_isLeapYear(y - 1);
+    return isoWeeksIn((first + 6 - leapBefore) % 7, leapBefore);
   }
-  // The year's last `tail` days share a week with the next 1 January.
-  const std::int32_t tail = (CLI_daysBeforeYear(y) + yearLength(y)) % 7;
-  if (tail >= 1 && tail <= 3 && yearLength(y) - ordinal < tail) return 1;
-  return (ordinal - firstSunday(y) - 1) / 7 + base(y);
+  return week == 53 && isoWeeksIn(first, CLI_isLeapYear(y)) == 52 ? 1 : week;
 }
 
 static_assert(CLI_weekOfYear(2000, 12, 31) == 54 && CLI_isoWeekOfYear(2000, 12, 31) == 52);
