@@ -1,5 +1,6 @@
 // Our SQL functions next to SQLite's built-ins that do the same job, over
-// one generated table, in one process.  Usage: bench_sql [rows]
+// one generated table, in one process.  Usage: bench_sql [rows [label]],
+// where only the rows whose label holds `label` are run.
 //
 // For each row of kRows, both expressions are first checked to agree on
 // every row of the table, then each is timed in a full scan (best of three)
@@ -11,6 +12,7 @@
 #include <cstdint>
 #include <cstdio>
 #include <cstdlib>
+#include <cstring>
 #include <string>
 
 namespace {
@@ -118,7 +120,9 @@ int main(int argc, char **argv) {
               sqlite3_libversion());
   std::printf("%-26s %10s %12s %8s  %s\n", "function", "ours ms", "built-in ms", "ratio",
               "same results");
+  const char *only = argc > 2 ? argv[2] : "";
   for (const Row &r : kRows) {
+    if (std::strstr(r.label, only) == nullptr) continue;
     const std::int64_t differing = scalar(db, std::string("SELECT count(*) FROM t WHERE (") +
                                                   r.ours + ") IS NOT (" + r.builtin + ")");
     const double ours = timeScan(db, r.ours);

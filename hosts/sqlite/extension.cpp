@@ -80,22 +80,62 @@ struct Function {
 // One SQL argument as the dispatcher has read it, so that no value is asked
 // twice: its type (after numeric affinity, for a number argument) and, for
 // a string, its bytes and whether terminated text can carry them.
+// Only the arguments that a call has are set, and only what their kind
+// uses: a row costs what it reads.
 struct Argument {
-  int type = SQLITE_NULL;
-  const unsigned char *bytes = nullptr;
-  std::size_t size = 0;
-  bool fitsText = false;
+  int type;
+  const unsigned char *bytes;
+  std::size_t size;
+  bool fitsText;
 };
 
 // Everything that one call of a row needs.
 struct Call {
+  Call(sqlite3_context *c, sqlite3_value **v, Connection &n, const Function &f)
+      : context(c), argv(v), connection(n), function(f) {}
   sqlite3_context *context;
   sqlite3_value **argv;
-  std::array<Argument, kMaxInputs> arguments;
+  std::array<Argument, kMaxInputs> arguments;  // the first argc are set
   Connection &connection;
   const Function &function;
-  bool blobResult;  // the first string argument was a BLOB
+  bool blobResult = false;  // the first string argument was a BLOB
 };
+
+// Most SQL strings are short: these read and write them in at most two
+// overlapping words each way, never outside [from, from + size), and call
+// the C library only for long ones.
+std::uint64_t word(const unsigned char *p) {
+  std::uint64_t w = 0;
+  std::memcpy(&w, p, sizeof w);
+  return w;
+}
+std::uint32_t halfWord(const unsigned char *p) {
+  std::uint32_t w = 0;
+  std::memcpy(&w, p, sizeof w);
+  return w;
+}
+constexpr bool hasZeroByte(std::uint64_t w) {
+  return ((w - 0x0101010101010101u) & ~w & 0x8080808080808080u) != 0;
+}
+
+bool holdsNul(const unsigned char *p, std::size_t size) {
+  if (size >= 8 && size <= 16) return hasZeroByte(word(p)) || hasZeroByte(word(p + size - 8));
+  if (size >= 4 && size < 8) {
+    return hasZeroByte(halfWord(p) | (std::uint64_t{0xFFFFFFFF} << 32)) ||
+           hasZeroByte(halfWord(p + size - 4) | (std::uint64_t{0xFFFFFFFF} << 32));
+  }
+  return size != 0 && std::memchr(p, 0, size) != nullptr;
+}
+
+void copyShort(char *to, const unsigned char *from, std::size_t size) {
+  if (size >= 8 && size <= 16) {
+    const std::uint64_t head = word(from), tail = word(from + size - 8);
+    std::memcpy(to, &head, 8);
+    std::memcpy(to + size - 8, &tail, 8);
+  } else if (size != 0) {
+    std::memcpy(to, from, size);
+  }
+}
 
 template <typename... Args>
 void fail(sqlite3_context *context, const char *format, Args... args) {
@@ -231,7 +271,7 @@ struct Input<Layout::text, S> {
            kRoutines[row].symbol);
       return false;
     }
-    if (a.size != 0) std::memcpy(text.data(), a.bytes, a.size);
+    copyShort(text.data(), a.bytes, a.size);
     text[a.size] = '\0';
     return true;
   }
@@ -421,7 +461,7 @@ constexpr auto kRowCalls = rowCalls(std::make_index_sequence<kRoutineCount>{});
 // calls it.
 void dispatch(sqlite3_context *context, int argc, sqlite3_value **argv) {
   const auto &f = *static_cast<const Function *>(sqlite3_user_data(context));
-  Call call{context, argv, {}, *f.connection, f, false};
+  Call call(context, argv, *f.connection, f);
   KindMask mask = 0;
   bool firstString = true;
   for (int i = 0; i < argc; ++i) {
@@ -445,8 +485,7 @@ void dispatch(sqlite3_context *context, int argc, sqlite3_value **argv) {
       a.bytes = sqlite3_value_text(v);
     }
     a.size = static_cast<std::size_t>(sqlite3_value_bytes(v));
-    a.fitsText = a.type != SQLITE_BLOB && a.size <= kTextLimit &&
-                 (a.size == 0 || std::memchr(a.bytes, 0, a.size) == nullptr);
+    a.fitsText = a.type != SQLITE_BLOB && a.size <= kTextLimit && !holdsNul(a.bytes, a.size);
     if (!a.fitsText) mask |= bit;
     firstString = false;
   }

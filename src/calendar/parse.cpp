@@ -88,88 +88,6 @@ std::int32_t scanDate(char *text, std::int32_t *year, std::int32_t *month, std::
   return d >= 1 && d <= CLI_monthLengthTable[CLI_isLeapYear(*year)][*month] ? 1 : 0;
 }
 
-// The common shapes, read without measuring or trimming: "yyyy-mm-dd"
-// and the 26-byte timestamp "yyyy-mm-dd-hh.mm.ss.ffffff" or
-// "yyyy-mm-dd hh:mm:ss.ffffff", with nothing behind them.  The bytes are
-// tested in order, so the terminator stops the test before anything past
-// it is read.  They accept only what the general scans accept, with the
-// same fields; anything else, a failure included, goes to the general scan,
-// which also writes the failure's fields and trims as it always does.
-constexpr std::uint32_t digitAt(const char *t, std::size_t i) noexcept {
-  return static_cast<std::uint32_t>(static_cast<unsigned char>(t[i]) - unsigned{'0'});
-}
-
-constexpr bool digitsAt(const char *t, std::size_t from, std::size_t to) noexcept {
-  for (std::size_t i = from; i < to; ++i) {
-    if (digitAt(t, i) > 9) return false;
-  }
-  return true;
-}
-
-struct Fields {
-  std::int32_t year, month, day;
-};
-
-// The ten bytes of a date at the head of the text, valid as a date.
-bool headDate(const char *t, Fields &f) noexcept {
-  if (!digitsAt(t, 0, 4) || t[4] != '-' || !digitsAt(t, 5, 7) || t[7] != '-' ||
-      !digitsAt(t, 8, 10)) {
-    return false;
-  }
-  const auto two = [t](std::size_t i) { return digitAt(t, i) * 10 + digitAt(t, i + 1); };
-  const std::uint32_t year = two(0) * 100 + two(2), month = two(5), day = two(8);
-  if (year == 0 || month - 1 > 11) return false;
-  if (day == 0 ||
-      day > static_cast<std::uint32_t>(
-                CLI_monthLengthTable[CLI_isLeapYear(static_cast<std::int32_t>(year))][month])) {
-    return false;
-  }
-  f = {static_cast<std::int32_t>(year), static_cast<std::int32_t>(month),
-       static_cast<std::int32_t>(day)};
-  return true;
-}
-
-struct Clock {
-  std::int32_t hour, minute, second;
-};
-
-// The 15 bytes "hh.mm.ss.ffffff" behind a date's separator, the points
-// after a hyphen or the colons after a blank, and then the terminator.
-bool tailTime(const char *t, Clock &c) noexcept {
-  const char separator = t[-1] == '-' ? '.' : t[-1] == ' ' ? ':' : '\0';
-  if (separator == '\0' || !digitsAt(t, 0, 2) || t[2] != separator || !digitsAt(t, 3, 5) ||
-      t[5] != separator || !digitsAt(t, 6, 8) || t[8] != '.' || !digitsAt(t, 9, 15) ||
-      t[15] != '\0') {
-    return false;
-  }
-  const auto two = [t](std::size_t i) {
-    return static_cast<std::int32_t>(digitAt(t, i) * 10 + digitAt(t, i + 1));
-  };
-  c = {two(0), two(3), two(6)};
-  if (c.hour > 24 || c.minute > 59 || c.second > 59) return false;
-  if (c.hour == 24 && (c.minute != 0 || c.second != 0 || std::memcmp(t + 9, "000000", 6) != 0)) {
-    return false;
-  }
-  return true;
-}
-
-// Whether the general scan would end the date after its ten bytes without
-// trimming anything: at the terminator, or at a separator in a text of at
-// most 32 bytes that does not end in a blank.  What follows is not read.
-bool dateEnds(const char *t) noexcept {
-  if (t[10] == '\0') return true;
-  if (t[10] != '-' && t[10] != ' ') return false;
-  const std::size_t length = 11 + std::strlen(t + 11);
-  return length <= 32 && t[length - 1] != ' ';
-}
-
-void storeDate(const Fields &f, std::int32_t *year, std::int32_t *month,
-               std::int32_t *day) noexcept {
-  *year = f.year;
-  *month = f.month;
-  *day = f.day;
-}
-
 }  // namespace
 
 std::size_t CLI_trimBlanks(char *text) noexcept {
@@ -180,29 +98,15 @@ std::size_t CLI_trimBlanks(char *text) noexcept {
   return length;
 }
 
-std::int32_t CLI_parseDatePart(char *text, std::int32_t *year, std::int32_t *month,
-                               std::int32_t *day) noexcept {
-  Fields f{};
-  if (headDate(text, f) && dateEnds(text)) {
-    storeDate(f, year, month, day);
-    return 1;
-  }
+std::int32_t detail::scanDatePart(char *text, std::int32_t *year, std::int32_t *month,
+                                  std::int32_t *day) noexcept {
   DateScan scan;
   return scanDate(text, year, month, day, scan);
 }
 
-std::int32_t CLI_parseDateText(char *text, std::int32_t *year, std::int32_t *month,
-                               std::int32_t *day, std::int32_t *hour, std::int32_t *minute,
-                               std::int32_t *second, char *code) noexcept {
-  Fields f{};
-  Clock c{0, 0, 0};
-  if (headDate(text, f) && (text[10] == '\0' || tailTime(text + 11, c))) {
-    storeDate(f, year, month, day);
-    store(hour, c.hour);
-    store(minute, c.minute);
-    store(second, c.second);
-    return 1;
-  }
+std::int32_t detail::scanDateText(char *text, std::int32_t *year, std::int32_t *month,
+                                  std::int32_t *day, std::int32_t *hour, std::int32_t *minute,
+                                  std::int32_t *second, char *code) noexcept {
   DateScan scan;
   if (scanDate(text, year, month, day, scan) == 0) return fail(code, "04");
   if (scan.end == scan.length) {
