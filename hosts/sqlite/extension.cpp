@@ -12,6 +12,7 @@ SQLITE_EXTENSION_INIT1
 
 #include <dlfcn.h>
 
+#include <algorithm>
 #include <array>
 #include <cmath>
 #include <cstdint>
@@ -30,6 +31,7 @@ SQLITE_EXTENSION_INIT1
 
 namespace {
 
+using cli::catalogue::Frame;
 using cli::catalogue::kMaxInputs;
 using cli::catalogue::kRoutineCount;
 using cli::catalogue::kRoutines;
@@ -393,6 +395,23 @@ struct Result<Layout::fixedText, Size> {
   }
 };
 
+// The scratchpad of a statement: zero-filled before its first call and
+// handed back unchanged on each later one.  SQLite keeps per-statement data
+// only as auxiliary data of an argument, and keeps it across rows only
+// while that argument is a constant; with a varying argument each row gets
+// a fresh scratchpad.
+constexpr std::size_t kScratchpadSize = 4 + 100;
+
+unsigned char *statementScratchpad(sqlite3_context *context) {
+  if (auto *kept = static_cast<unsigned char *>(sqlite3_get_auxdata(context, 0))) return kept;
+  auto *fresh = static_cast<unsigned char *>(sqlite3_malloc(kScratchpadSize));
+  if (fresh == nullptr) return nullptr;
+  std::memset(fresh, 0, kScratchpadSize);
+  sqlite3_set_auxdata(context, 0, fresh, sqlite3_free);
+  // set_auxdata frees the block at once when it cannot keep it; ask again.
+  return static_cast<unsigned char *>(sqlite3_get_auxdata(context, 0));
+}
+
 // Calls an export that takes sizeof...(Is) pointers.  Every argument of the
 // frame is a pointer, so one pointer type serves every signature.
 template <std::size_t... Is>
@@ -411,7 +430,7 @@ void callRow(const Call &c, std::index_sequence<Is...>) {
   std::int16_t resultIndicator = 0;
 
   // NULL reaches the routine only when it reads its indicators itself.
-  const auto load = [&](auto &input, int i) {
+  [[maybe_unused]] const auto load = [&](auto &input, int i) {
     if (c.arguments[static_cast<std::size_t>(i)].type == SQLITE_NULL) {
       inputIndicators[static_cast<std::size_t>(i)] = -1;
       return true;
@@ -431,7 +450,17 @@ void callRow(const Call &c, std::index_sequence<Is...>) {
                   const_cast<char *>(r.sqlName),
                   const_cast<char *>(r.symbol),
                   message};
-  invoke(c.connection.exports[Row], args, std::make_index_sequence<std::size(args)>{});
+  if constexpr (r.frame == Frame::scratchpad) {
+    unsigned char *scratchpad = statementScratchpad(c.context);
+    if (scratchpad == nullptr) return sqlite3_result_error_nomem(c.context);
+    void *withScratchpad[std::size(args) + 1];
+    std::copy(std::begin(args), std::end(args), withScratchpad);
+    withScratchpad[std::size(args)] = scratchpad;
+    invoke(c.connection.exports[Row], withScratchpad,
+           std::make_index_sequence<std::size(withScratchpad)>{});
+  } else {
+    invoke(c.connection.exports[Row], args, std::make_index_sequence<std::size(args)>{});
+  }
 
   if (sqlstate[0] != '\0') {
     reportStatus(c, sqlstate, message);

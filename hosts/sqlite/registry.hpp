@@ -32,7 +32,10 @@ using cli::catalogue::Routine;
 
 // Frames that the host knows how to call.
 constexpr bool hostable(const Routine &r) {
-  return r.built == Built::yes && r.frame == Frame::plain && resultCount(r) == 1;
+  // A scratchpad is kept as auxiliary data of the first argument.
+  const bool frameKnown =
+      r.frame == Frame::plain || (r.frame == Frame::scratchpad && inputCount(r) >= 1);
+  return r.built == Built::yes && frameKnown && resultCount(r) == 1;
 }
 
 constexpr bool isNumber(Layout l) {

@@ -4,8 +4,10 @@
 #include <gtest/gtest.h>
 
 #include <algorithm>
+#include <bit>
 #include <cctype>
 #include <cstring>
+#include <iomanip>
 #include <utility>
 
 namespace orv::test {
@@ -38,6 +40,8 @@ bool invoke(void *fn, void *const *args, std::index_sequence<Is...>) {
 // Calls `fn` with the K = 2N + 2M + 4 arguments of a plain frame.
 bool invokeFrame(void *fn, const std::vector<void *> &args) {
   switch (args.size()) {
+    case 6:
+      return invoke(fn, args.data(), std::make_index_sequence<6>{});
     case 8:
       return invoke(fn, args.data(), std::make_index_sequence<8>{});
     case 10:
@@ -52,20 +56,65 @@ bool invokeFrame(void *fn, const std::vector<void *> &args) {
   }
 }
 
-// A 32-bit integer is its word; terminated text its bytes and a NUL; a
-// CLI_udfLob its length word and its data.
+std::size_t widthOf(Value::Layout layout) {
+  switch (layout) {
+    case Value::Layout::int16:
+      return 2;
+    case Value::Layout::int32:
+      return 4;
+    default:
+      return 8;
+  }
+}
+
+bool isNumber(Value::Layout layout) {
+  return layout != Value::Layout::text && layout != Value::Layout::lob;
+}
+
+// A number is its bytes in the machine's order; terminated text its bytes
+// and a NUL; a CLI_udfLob its length word and its data.
 std::vector<unsigned char> layOut(const Value &v) {
+  if (isNumber(v.layout)) {
+    unsigned char raw[8];
+    const auto n16 = static_cast<std::int16_t>(v.number);
+    const auto n32 = static_cast<std::int32_t>(v.number);
+    const void *from = v.layout == Value::Layout::int16   ? static_cast<const void *>(&n16)
+                       : v.layout == Value::Layout::int32 ? static_cast<const void *>(&n32)
+                                                          : static_cast<const void *>(&v.number);
+    std::memcpy(raw, from, widthOf(v.layout));
+    return {raw, raw + widthOf(v.layout)};
+  }
   std::vector<unsigned char> out(v.bytes.begin(), v.bytes.end());
   if (v.layout == Value::Layout::text) {
     out.push_back(0);
   } else {
-    const auto word = static_cast<std::uint32_t>(
-        v.layout == Value::Layout::int32 ? v.number : std::ssize(v.bytes));
+    const auto word = static_cast<std::uint32_t>(std::ssize(v.bytes));
     unsigned char head[4];
     std::memcpy(head, &word, sizeof word);
     out.insert(out.begin(), head, head + 4);
   }
   return out;
+}
+
+// A number read back from its area, sign-extended; a double as its bits.
+std::int64_t numberIn(const unsigned char *area, Value::Layout layout) {
+  switch (layout) {
+    case Value::Layout::int16: {
+      std::int16_t x = 0;
+      std::memcpy(&x, area, 2);
+      return x;
+    }
+    case Value::Layout::int32: {
+      std::int32_t x = 0;
+      std::memcpy(&x, area, 4);
+      return x;
+    }
+    default: {
+      std::int64_t x = 0;
+      std::memcpy(&x, area, 8);
+      return x;
+    }
+  }
 }
 
 }  // namespace
@@ -80,6 +129,8 @@ void PrintTo(const Outcome &o, std::ostream *os) {
   } else {
     *os << ::testing::PrintToString(o.bytes) << " (" << o.bytes.size() << " bytes), " << o.number;
   }
+  if (o.real) *os << " = " << std::setprecision(17) << std::bit_cast<double>(o.number);
+  if (o.stored) *os << ", stored";
 }
 
 Outcome call(const char *name, const std::vector<Value> &inputs, const Value &result) {
@@ -91,7 +142,7 @@ Outcome call(const char *name, const std::vector<Value> &inputs, const Value &re
   in.reserve(inputs.size());
   for (const Value &v : inputs) in.push_back(layOut(v));
 
-  const std::size_t area = result.layout == Value::Layout::int32  ? 4
+  const std::size_t area = isNumber(result.layout)                ? widthOf(result.layout)
                            : result.layout == Value::Layout::text ? result.size
                                                                   : 4 + std::size_t{result.size};
   std::vector<unsigned char> out(area + kCanaryBytes, kCanary);
@@ -132,18 +183,28 @@ Outcome call(const char *name, const std::vector<Value> &inputs, const Value &re
     EXPECT_EQ(message[9], '\0') << name;
     EXPECT_TRUE(std::all_of(message + 10, message + kMessageBytes, [](char c) { return c == 'M'; }))
         << name << " wrote past the message";
-    EXPECT_EQ(out, before) << name << " changed its result area although it failed";
-    return fails(std::string(message + 7, 2));
+    Outcome failed = fails(std::string(message + 7, 2));
+    if (out != before) {
+      EXPECT_TRUE(isNumber(result.layout)) << name << " changed its result area although it failed";
+      failed.stored = true;
+      failed.real = result.layout == Value::Layout::real;
+      failed.number = numberIn(out.data(), result.layout);
+    }
+    return failed;
   }
   EXPECT_TRUE(std::all_of(sqlstate, sqlstate + 6, [](char c) { return c == 'S'; })) << name;
   EXPECT_TRUE(std::all_of(message, message + kMessageBytes, [](char c) { return c == 'M'; }))
       << name << " wrote a message on success";
 
   switch (result.layout) {
-    case Value::Layout::int32: {
-      std::int32_t x = 0;
-      std::memcpy(&x, out.data(), 4);
-      return ok(std::int64_t{x});
+    case Value::Layout::int16:
+    case Value::Layout::int32:
+    case Value::Layout::int64:
+      return ok(numberIn(out.data(), result.layout));
+    case Value::Layout::real: {
+      Outcome o = ok(numberIn(out.data(), result.layout));
+      o.real = true;
+      return o;
     }
     case Value::Layout::text: {
       const auto end = std::find(out.begin(), out.begin() + static_cast<std::ptrdiff_t>(area), 0);

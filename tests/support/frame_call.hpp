@@ -7,6 +7,7 @@
 // "38552" and "SYSFUN:NN" stored with the result area left as it was.
 #pragma once
 
+#include <bit>
 #include <cstdint>
 #include <ostream>
 #include <string>
@@ -16,34 +17,52 @@ namespace orv::test {
 
 // An input or the shape of a result, in one of the frame's layouts.
 struct Value {
-  enum class Layout { int32, text, lob } layout;
-  std::int64_t number = 0;
-  std::string bytes;       // text without its terminator, or CLI_udfLob data
-  std::uint32_t size = 0;  // result area: text area bytes, or CLI_udfLob capacity
+  enum class Layout { int16, int32, int64, real, text, lob } layout;
+  std::int64_t number = 0;  // an integer, or the bits of a double
+  std::string bytes;        // text without its terminator, or CLI_udfLob data
+  std::uint32_t size = 0;   // result area: text area bytes, or CLI_udfLob capacity
 };
 
+inline std::uint64_t bitsOf(double d) { return std::bit_cast<std::uint64_t>(d); }
+
+inline Value i16(std::int16_t v) { return {Value::Layout::int16, v, {}, 0}; }
 inline Value i32(std::int32_t v) { return {Value::Layout::int32, v, {}, 0}; }
+inline Value i64(std::int64_t v) { return {Value::Layout::int64, v, {}, 0}; }
+inline Value f64(double v) {
+  return {Value::Layout::real, static_cast<std::int64_t>(bitsOf(v)), {}, 0};
+}
 inline Value text(std::string s) { return {Value::Layout::text, 0, std::move(s), 0}; }
 inline Value lob(std::string s) { return {Value::Layout::lob, 0, std::move(s), 0}; }
 // Results: a terminated-text area of `area` bytes, a CLI_udfLob area whose
-// length word holds `capacity`, a 32-bit integer.
+// length word holds `capacity`, a number of the given layout.
 inline Value textArea(std::uint32_t area = 4001) { return {Value::Layout::text, 0, {}, area}; }
 inline Value lobArea(std::uint32_t capacity = 1048576) {
   return {Value::Layout::lob, 0, {}, capacity};
 }
 inline Value intArea() { return {Value::Layout::int32, 0, {}, 0}; }
+inline Value numberArea(Value::Layout layout) { return {layout, 0, {}, 0}; }
 
-// What a call gave: a SYSFUN code, or the result.
+// What a call gave: a SYSFUN code, or the result.  A double result is
+// held as its bits, so that zeros of both signs and NaNs compare exactly.
 struct Outcome {
   std::string error;  // two-digit SYSFUN code, empty on success
   std::string bytes;  // a string result
   std::int64_t number = 0;
+  bool stored = false;  // a failure that left a value in the result area
+  bool real = false;    // `number` holds the bits of a double
   bool operator==(const Outcome &) const = default;
 };
 
 inline Outcome ok(std::string bytes) { return {"", std::move(bytes), 0}; }
 inline Outcome ok(std::int64_t number) { return {"", "", number}; }
+inline Outcome okReal(double d) {
+  return {"", "", static_cast<std::int64_t>(bitsOf(d)), false, true};
+}
 inline Outcome fails(std::string code) { return {std::move(code), "", 0}; }
+// A failure that stored its value before it tested it.
+inline Outcome failsStoring(std::string code, double d) {
+  return {std::move(code), "", static_cast<std::int64_t>(bitsOf(d)), true, true};
+}
 
 void PrintTo(const Outcome &o, std::ostream *os);
 

@@ -1,0 +1,53 @@
+// RAND: a pseudo-random double from 0.0 to 1.0, both ends included.
+//
+// The routines own no generator: they scale what the C library's rand
+// delivers, and RAND2 seeds that same generator with srand once per
+// statement.  The generator's state is the C library's, shared as it
+// shares it; glibc guards it with a lock, so calls from many threads are
+// safe but interleave their sequences.
+#include <cstdint>
+#include <cstdlib>
+
+#include "frame/frame.hpp"
+
+namespace {
+
+using cli::Ind;
+using cli::NameArg;
+
+// rand's values reduced to 0..32767.  Where RAND_MAX is larger, as on
+// glibc (2^31 - 1), the top 15 bits are kept: RAND_MAX + 1 is a power of
+// two on the platforms we build for, so every value stays equally likely.
+constexpr int kRandomBits = [] {
+  int bits = 0;
+  for (unsigned long long m = RAND_MAX; m != 0; m >>= 1) ++bits;
+  return bits;
+}();
+static_assert(kRandomBits >= 15 && (RAND_MAX & (RAND_MAX + 1ULL)) == 0,
+              "rand must give a whole number of random bits, at least 15");
+
+double next() noexcept {
+  const int r = std::rand() >> (kRandomBits - 15);
+  // A division by 32767.0, not a multiplication by its inverse: 32767
+  // gives exactly 1.0.
+  return static_cast<double>(r) / 32767.0;
+}
+
+}  // namespace
+
+CLI_EXPORT void CLI_udfRAND1(double *result, Ind, char *, NameArg, NameArg, char *) noexcept {
+  *result = next();
+}
+
+// The scratchpad's data holds the seeded flag, one byte that the engine
+// zero-fills for each statement; only the first call of a statement reads
+// the seed.
+CLI_EXPORT void CLI_udfRAND2(const std::int32_t *seed, double *result, Ind, Ind, char *, NameArg,
+                             NameArg, char *, unsigned char *scratchpad) noexcept {
+  unsigned char &seeded = scratchpad[CLI_SCRATCHPAD_DATA_OFFSET];
+  if (seeded == 0) {
+    seeded = 1;
+    std::srand(static_cast<unsigned>(*seed));
+  }
+  *result = next();
+}

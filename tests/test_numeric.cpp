@@ -1,0 +1,412 @@
+// Numeric routines: the edge cases of each family as tables, the 64-bit
+// forms against exact 128-bit arithmetic, the double forms against their
+// formulas written out here in the same grouping, and RAND's sequence.
+#include <gtest/gtest.h>
+
+#include <array>
+#include <bit>
+#include <cmath>
+#include <cstdint>
+#include <limits>
+#include <random>
+#include <vector>
+
+#include "frame/cliudf.h"
+#include "support/frame_call.hpp"
+
+namespace {
+
+using namespace orv::test;
+using L = Value::Layout;
+__extension__ using i128 = __int128;  // exact arithmetic for the 64-bit models
+
+constexpr std::int64_t kMin64 = std::numeric_limits<std::int64_t>::min();
+constexpr std::int64_t kMax64 = std::numeric_limits<std::int64_t>::max();
+constexpr std::int32_t kMin32 = std::numeric_limits<std::int32_t>::min();
+constexpr std::int32_t kMax32 = std::numeric_limits<std::int32_t>::max();
+const double kInf = HUGE_VAL;
+const double kNaN = std::numeric_limits<double>::quiet_NaN();
+const double kTiny = std::numeric_limits<double>::denorm_min();
+
+struct Case {
+  const char *routine;
+  std::vector<Value> in;
+  L result;
+  Outcome want;
+};
+
+bool isNaN(const Outcome &o) { return o.real && std::isnan(std::bit_cast<double>(o.number)); }
+
+// A NaN expected from a maths function matches any NaN: its sign and
+// payload are the C library's business.  The routines' own bits are
+// compared exactly (ABS1's cleared sign bit has its own test).
+void runCases(const std::vector<Case> &cases) {
+  for (const Case &c : cases) {
+    const Outcome got = call(c.routine, c.in, numberArea(c.result));
+    if (isNaN(c.want) && isNaN(got) && c.want.error == got.error) continue;
+    EXPECT_EQ(got, c.want) << c.routine;
+  }
+}
+
+Outcome okInt(std::int64_t v) { return ok(v); }
+
+TEST(IntegerFamilies, KeepTheirEdges) {
+  runCases({
+      {"CLI_udfABS4", {i64(-kMax64)}, L::int64, okInt(kMax64)},
+      {"CLI_udfABS4", {i64(kMin64)}, L::int64, fails("01")},
+      {"CLI_udfABS2", {i32(kMin32)}, L::int32, fails("01")},
+      {"CLI_udfABS2", {i32(-kMax32)}, L::int32, okInt(kMax32)},
+      {"CLI_udfABS3", {i16(-32768)}, L::int16, fails("01")},
+      {"CLI_udfABS3", {i16(-32767)}, L::int16, okInt(32767)},
+      {"CLI_udfABS1", {f64(-0.0)}, L::real, okReal(0.0)},
+      {"CLI_udfABS1", {f64(-kInf)}, L::real, okReal(kInf)},
+      {"CLI_udfSIGN1", {f64(-0.0)}, L::real, okReal(0.0)},
+      {"CLI_udfSIGN1", {f64(kNaN)}, L::real, okReal(1.0)},
+      {"CLI_udfSIGN1", {f64(-kInf)}, L::real, okReal(-1.0)},
+      {"CLI_udfSIGN1", {f64(kTiny)}, L::real, okReal(1.0)},
+      {"CLI_udfSIGN2", {i32(kMin32)}, L::int32, okInt(-1)},
+      {"CLI_udfSIGN3", {i16(-32768)}, L::int16, okInt(-1)},
+      {"CLI_udfSIGN4", {i64(0)}, L::int64, okInt(0)},
+      {"CLI_udfSIGN4", {i64(kMax64)}, L::int64, okInt(1)},
+      {"CLI_udfMOD3", {i64(kMin64), i64(-1)}, L::int64, okInt(0)},
+      {"CLI_udfMOD1", {i32(kMin32), i32(-1)}, L::int32, okInt(0)},
+      {"CLI_udfMOD2", {i16(-32768), i16(-1)}, L::int16, okInt(0)},
+      {"CLI_udfMOD1", {i32(7), i32(0)}, L::int32, fails("02")},
+      {"CLI_udfMOD2", {i16(7), i16(0)}, L::int16, fails("03")},
+      {"CLI_udfMOD3", {i64(7), i64(0)}, L::int64, fails("03")},
+      {"CLI_udfMOD2", {i16(-7), i16(3)}, L::int16, okInt(-1)},
+      {"CLI_udfMOD1", {i32(7), i32(-3)}, L::int32, okInt(1)},
+      {"CLI_udfMOD2", {i16(-32768), i16(32767)}, L::int16, okInt(-1)},
+      {"CLI_udfFLOOR1", {f64(-0.5)}, L::real, okReal(-1.0)},
+      {"CLI_udfCEILING1", {f64(-0.5)}, L::real, okReal(-0.0)},
+      {"CLI_udfCEILING1", {f64(kNaN)}, L::real, okReal(kNaN)},
+      {"CLI_udfFLOOR1", {f64(-kInf)}, L::real, okReal(-kInf)},
+      {"CLI_udfFLOOR4", {i64(9007199254740993)}, L::int64, okInt(9007199254740993)},
+      {"CLI_udfCEILING4", {i64(kMin64)}, L::int64, okInt(kMin64)},
+      {"CLI_udfCEILING2", {i32(kMin32)}, L::int32, okInt(kMin32)},
+      {"CLI_udfFLOOR2", {i32(kMax32)}, L::int32, okInt(kMax32)},
+      {"CLI_udfCEILING3", {i16(-32768)}, L::int16, okInt(-32768)},
+      {"CLI_udfFLOOR3", {i16(32767)}, L::int16, okInt(32767)},
+  });
+}
+
+TEST(IntegerFamilies, AbsClearsTheSignBitOfANaN) {
+  const Outcome got = call("CLI_udfABS1", {f64(-kNaN)}, numberArea(L::real));
+  EXPECT_TRUE(isNaN(got) && !std::signbit(std::bit_cast<double>(got.number)));
+}
+
+TEST(RoundAndTruncate, KeepTheirEdges) {
+  runCases({
+      {"CLI_udfROUND1", {f64(1234.5678), i32(-2)}, L::real, okReal(1200.0)},
+      {"CLI_udfROUND1", {f64(1250.0), i32(-2)}, L::real, okReal(1300.0)},
+      {"CLI_udfROUND1", {f64(-0.5), i32(0)}, L::real, okReal(-1.0)},
+      {"CLI_udfROUND1", {f64(0.125), i32(2)}, L::real, okReal(0.12)},
+      {"CLI_udfROUND1", {f64(1.0), i32(323)}, L::real, okReal(1.0)},
+      {"CLI_udfROUND1", {f64(1.0), i32(324)}, L::real, fails("03")},
+      {"CLI_udfROUND1", {f64(1.0), i32(-308)}, L::real, okReal(0.0)},
+      {"CLI_udfROUND1", {f64(1.0), i32(-309)}, L::real, fails("03")},
+      {"CLI_udfROUND1", {f64(1.0), i32(kMin32)}, L::real, fails("03")},
+      {"CLI_udfROUND1", {f64(1.7976931348623157e308), i32(-308)}, L::real, okReal(kInf)},
+      {"CLI_udfROUND1", {f64(kInf), i32(0)}, L::real, okReal(kNaN)},
+      {"CLI_udfTRUNCATE1", {f64(-1.29), i32(1)}, L::real, okReal(-1.2)},
+      {"CLI_udfTRUNCATE1", {f64(-1234.5), i32(-2)}, L::real, okReal(-1200.0)},
+      {"CLI_udfTRUNCATE1", {f64(-0.4), i32(0)}, L::real, okReal(-0.0)},
+      {"CLI_udfTRUNCATE1", {f64(-1.5), i32(-1)}, L::real, okReal(-0.0)},
+      {"CLI_udfTRUNCATE1", {f64(2.0), i32(308)}, L::real, okReal(kInf)},
+      {"CLI_udfTRUNCATE1", {f64(1.5), i32(309)}, L::real, fails("03")},
+      {"CLI_udfTRUNCATE1", {f64(-kInf), i32(3)}, L::real, okReal(-kInf)},
+      {"CLI_udfROUND2", {i32(15), i32(-1)}, L::int32, okInt(20)},
+      {"CLI_udfROUND2", {i32(-5), i32(-1)}, L::int32, okInt(-10)},
+      {"CLI_udfROUND2", {i32(kMax32), i32(-2)}, L::int32, okInt(2147483600)},
+      {"CLI_udfROUND2", {i32(7), i32(-308)}, L::int32, okInt(0)},
+      {"CLI_udfROUND2", {i32(7), i32(-309)}, L::int32, fails("03")},
+      {"CLI_udfROUND2", {i32(kMax32), i32(-1)}, L::int32, fails("03")},
+      {"CLI_udfROUND2", {i32(kMin32), i32(-3)}, L::int32, fails("03")},
+      {"CLI_udfTRUNCATE2", {i32(kMin32), i32(-1)}, L::int32, okInt(-2147483640)},
+      {"CLI_udfTRUNCATE2", {i32(kMax32), i32(-10)}, L::int32, okInt(0)},
+      {"CLI_udfTRUNCATE2", {i32(5), i32(-309)}, L::int32, fails("03")},
+      {"CLI_udfROUND5", {i64(1449), i32(-2)}, L::int64, okInt(1400)},
+      {"CLI_udfROUND5", {i64(kMax64), i32(-1)}, L::int64, fails("03")},
+      {"CLI_udfROUND5", {i64(kMax64), i32(-2)}, L::int64, okInt(9223372036854775800)},
+      {"CLI_udfROUND5", {i64(kMax64), i32(-18)}, L::int64, okInt(9000000000000000000)},
+      {"CLI_udfROUND5", {i64(kMax64), i32(-19)}, L::int64, fails("03")},
+      {"CLI_udfROUND5", {i64(kMin64), i32(-2)}, L::int64, okInt(-9223372036854775800)},
+      {"CLI_udfROUND5", {i64(4999999999999999999), i32(-19)}, L::int64, okInt(0)},
+      {"CLI_udfROUND5", {i64(kMax64), i32(-20)}, L::int64, okInt(0)},
+      {"CLI_udfTRUNCATE5", {i64(kMin64), i32(-18)}, L::int64, okInt(-9000000000000000000)},
+      {"CLI_udfTRUNCATE5", {i64(kMax64), i32(-19)}, L::int64, okInt(0)},
+  });
+}
+
+TEST(Power, KeepsEachFormsEdges) {
+  runCases({
+      {"CLI_udfPOWER1", {f64(0.0), f64(0.0)}, L::real, okReal(1.0)},
+      {"CLI_udfPOWER1", {f64(kNaN), f64(0.0)}, L::real, okReal(1.0)},
+      {"CLI_udfPOWER1", {f64(-0.0), f64(-1.0)}, L::real, fails("01")},
+      {"CLI_udfPOWER1", {f64(-8.0), f64(0.5)}, L::real, fails("01")},
+      {"CLI_udfPOWER1", {f64(-2.0), f64(kNaN)}, L::real, fails("01")},
+      {"CLI_udfPOWER1", {f64(-10.0), f64(309.0)}, L::real, failsStoring("03", -kInf)},
+      {"CLI_udfPOWER1", {f64(10.0), f64(-400.0)}, L::real, failsStoring("03", 0.0)},
+      {"CLI_udfPOWER1", {f64(2.0), f64(-1074.0)}, L::real, okReal(kTiny)},
+      {"CLI_udfPOWER1", {f64(kInf), f64(-1.0)}, L::real, failsStoring("03", 0.0)},
+      {"CLI_udfPOWER1", {f64(-1.0), f64(kInf)}, L::real, okReal(1.0)},
+      {"CLI_udfPOWER2", {f64(-8.0), i32(3)}, L::real, okReal(-512.0)},
+      {"CLI_udfPOWER2", {f64(0.0), i32(-1)}, L::real, fails("01")},
+      {"CLI_udfPOWER2", {f64(10.0), i32(kMin32)}, L::real, failsStoring("03", 0.0)},
+      {"CLI_udfPOWER3", {i32(2), i32(31)}, L::int32, fails("03")},
+      {"CLI_udfPOWER3", {i32(-2), i32(31)}, L::int32, fails("03")},
+      {"CLI_udfPOWER3", {i32(46340), i32(2)}, L::int32, okInt(2147395600)},
+      {"CLI_udfPOWER3", {i32(kMax32), i32(1)}, L::int32, fails("03")},
+      {"CLI_udfPOWER3", {i32(-kMax32), i32(1)}, L::int32, okInt(-kMax32)},
+      {"CLI_udfPOWER3", {i32(2), i32(-1)}, L::int32, okInt(1)},
+      {"CLI_udfPOWER3", {i32(-2), i32(-1)}, L::int32, okInt(-1)},
+      {"CLI_udfPOWER3", {i32(0), i32(0)}, L::int32, okInt(1)},
+      {"CLI_udfPOWER3", {i32(0), i32(-1)}, L::int32, fails("01")},
+      {"CLI_udfPOWER3", {i32(10), i32(-300)}, L::int32, okInt(0)},
+      {"CLI_udfPOWER3", {i32(10), i32(-400)}, L::int32, fails("03")},
+      {"CLI_udfPOWER4", {i64(0), i64(0)}, L::int64, fails("01")},
+      {"CLI_udfPOWER4", {i64(1), i64(-7)}, L::int64, okInt(1)},
+      {"CLI_udfPOWER4", {i64(-1), i64(-1)}, L::int64, okInt(0)},
+      {"CLI_udfPOWER4", {i64(-2), i64(63)}, L::int64, okInt(kMin64)},
+      {"CLI_udfPOWER4", {i64(2), i64(63)}, L::int64, fails("03")},
+      {"CLI_udfPOWER4", {i64(3), i64(39)}, L::int64, okInt(4052555153018976267)},
+      {"CLI_udfPOWER4", {i64(kMin64), i64(2)}, L::int64, fails("03")},
+      {"CLI_udfPOWER4", {i64(-1), i64(kMax64)}, L::int64, okInt(-1)},
+      {"CLI_udfPOWER4", {i64(-1), i64(kMax64 - 1)}, L::int64, okInt(1)},
+  });
+}
+
+TEST(ElementaryFunctions, TestWhereAndWhatEachOneSays) {
+  runCases({
+      {"CLI_udfSQRT", {f64(-0.0)}, L::real, okReal(-0.0)},
+      {"CLI_udfSQRT", {f64(-kTiny)}, L::real, fails("01")},
+      {"CLI_udfSQRT", {f64(kNaN)}, L::real, okReal(kNaN)},
+      {"CLI_udfLOG", {f64(-0.0)}, L::real, fails("01")},
+      {"CLI_udfLOG10", {f64(0.0)}, L::real, fails("01")},
+      {"CLI_udfLOG", {f64(kInf)}, L::real, okReal(kInf)},
+      {"CLI_udfLOG10", {f64(1000.0)}, L::real, okReal(3.0)},
+      {"CLI_udfASIN", {f64(-1.0)}, L::real, okReal(-std::asin(1.0))},
+      {"CLI_udfACOS", {f64(1.0)}, L::real, okReal(0.0)},
+      {"CLI_udfACOS", {f64(1.0000000000000002)}, L::real, fails("01")},
+      {"CLI_udfASIN", {f64(-1.0000000000000002)}, L::real, fails("01")},
+      {"CLI_udfEXP", {f64(710.0)}, L::real, failsStoring("03", kInf)},
+      {"CLI_udfEXP", {f64(-746.0)}, L::real, failsStoring("03", 0.0)},
+      {"CLI_udfEXP", {f64(-745.13)}, L::real, okReal(kTiny)},
+      {"CLI_udfEXP", {f64(-kInf)}, L::real, failsStoring("03", 0.0)},
+      {"CLI_udfEXP", {f64(kNaN)}, L::real, okReal(kNaN)},
+      {"CLI_udfTAN", {f64(kInf)}, L::real, okReal(std::tan(kInf))},
+      {"CLI_udfTAN", {f64(1.5707963267948966)}, L::real, okReal(1.633123935319537e16)},
+      {"CLI_udfCOT", {f64(-0.0)}, L::real, fails("02")},
+      {"CLI_udfCOT", {f64(1e-310)}, L::real, okReal(kInf)},
+      {"CLI_udfATAN2", {f64(-0.0), f64(0.0)}, L::real, fails("02")},
+      {"CLI_udfATAN2", {f64(0.0), f64(kNaN)}, L::real, okReal(kNaN)},
+      {"CLI_udfATAN2", {f64(-1.0), f64(0.0)}, L::real, okReal(3.141592653589793)},
+      {"CLI_udfATAN2", {f64(0.0), f64(-1.0)}, L::real, okReal(-1.5707963267948966)},
+      {"CLI_udfATAN", {f64(-kInf)}, L::real, okReal(-1.5707963267948966)},
+      {"CLI_udfSIN", {f64(kInf)}, L::real, okReal(std::sin(kInf))},
+      {"CLI_udfDEGREES1", {f64(3.141592653589793)}, L::real, okReal(180.0)},
+      {"CLI_udfRADIANS1", {f64(180.0)}, L::real, okReal(3.141592653589793)},
+      {"CLI_udfRADIANS1", {f64(3.0)}, L::real, okReal(0.05235987755982988)},
+      {"CLI_udfDEGREES1", {f64(3e306)}, L::real, okReal(kInf)},
+  });
+}
+
+// ---- Random differential tests -------------------------------------------
+
+i128 tenTo(int k) {
+  i128 p = 1;
+  while (k-- > 0) p *= 10;
+  return p;
+}
+bool fits64(i128 v) { return v >= kMin64 && v <= kMax64; }
+
+// ROUND and TRUNCATE of 64-bit integers in closed form: keep the digits
+// above place -n, and round on the single digit just below them.
+Outcome roundModel(std::int64_t x, std::int32_t n) {
+  if (n >= 0) return ok(x);
+  if (n < -19) return ok(std::int64_t{0});
+  const int k = -n;
+  const i128 magnitude = x < 0 ? -i128{x} : i128{x};
+  if (magnitude < tenTo(k - 1) || x == 0) return ok(std::int64_t{0});
+  const int digit = static_cast<int>((magnitude / tenTo(k - 1)) % 10);
+  const i128 kept = i128{x} / tenTo(k);
+  if (digit < 5) return ok(static_cast<std::int64_t>(kept * tenTo(k)));
+  if (k == 19) return fails("03");
+  const i128 v = (kept + (x < 0 ? -1 : 1)) * tenTo(k);
+  return fits64(v) ? ok(static_cast<std::int64_t>(v)) : fails("03");
+}
+
+Outcome truncateModel(std::int64_t x, std::int32_t n) {
+  if (n >= 0) return ok(x);
+  if (n <= -19) return ok(std::int64_t{0});
+  return ok(static_cast<std::int64_t>(i128{x} / tenTo(-n) * tenTo(-n)));
+}
+
+Outcome powerModel(std::int64_t x, std::int64_t y) {
+  if (x == 0) return y > 0 ? ok(std::int64_t{0}) : fails("01");
+  if (y == 0 || x == 1) return ok(std::int64_t{1});
+  if (y < 0) return ok(std::int64_t{0});
+  i128 acc = 1;
+  for (std::int64_t i = 0; i < y; ++i) {
+    acc *= x;
+    if (!fits64(acc)) return fails("03");
+  }
+  return ok(static_cast<std::int64_t>(acc));
+}
+
+Outcome modModel(std::int64_t x, std::int64_t y) {
+  if (y == 0) return fails("03");
+  return ok(static_cast<std::int64_t>(i128{x} - i128{x} / y * y));
+}
+
+// Integers with every count of digits, the limits and their neighbours.
+std::int64_t anyInt64(std::mt19937_64 &rng) {
+  switch (rng() % 4) {
+    case 0:
+      return static_cast<std::int64_t>(rng());
+    case 1: {
+      const std::int64_t edges[] = {kMin64, kMin64 + 1, kMax64, kMax64 - 1, 0, 1, -1, 5, -5};
+      return edges[rng() % std::size(edges)];
+    }
+    default: {
+      const auto digits = static_cast<int>(rng() % 19);
+      const auto v = static_cast<std::int64_t>(rng() % static_cast<std::uint64_t>(tenTo(digits)));
+      return rng() % 2 ? v : -v;
+    }
+  }
+}
+
+TEST(SixtyFourBitForms, AgreeWithExactArithmetic) {
+  std::mt19937_64 rng(4242);
+  for (int i = 0; i < 20000; ++i) {
+    const std::int64_t x = anyInt64(rng);
+    const auto n = static_cast<std::int32_t>(static_cast<int>(rng() % 25) - 21);
+    EXPECT_EQ(call("CLI_udfROUND5", {i64(x), i32(n)}, numberArea(L::int64)), roundModel(x, n))
+        << x << " at " << n;
+    EXPECT_EQ(call("CLI_udfTRUNCATE5", {i64(x), i32(n)}, numberArea(L::int64)), truncateModel(x, n))
+        << x << " at " << n;
+    const std::int64_t y = rng() % 3 ? static_cast<std::int64_t>(rng() % 80) - 5 : anyInt64(rng);
+    const std::int64_t base = rng() % 2 ? x : static_cast<std::int64_t>(rng() % 21) - 10;
+    if (base != -1 && y < 1000) {
+      EXPECT_EQ(call("CLI_udfPOWER4", {i64(base), i64(y)}, numberArea(L::int64)),
+                powerModel(base, y))
+          << base << " ** " << y;
+    }
+    EXPECT_EQ(call("CLI_udfMOD3", {i64(x), i64(y)}, numberArea(L::int64)), modModel(x, y));
+  }
+}
+
+// The double and 32-bit forms against their formulas as written in the
+// contract, grouping included; pow, fmod and floor are the C library's.
+TEST(DoubleForms, FollowTheirFormulasToTheBit) {
+  std::mt19937_64 rng(777);
+  std::uniform_real_distribution<double> mantissa(-10.0, 10.0);
+  for (int i = 0; i < 20000; ++i) {
+    const double x = mantissa(rng) * std::pow(10.0, static_cast<double>(rng() % 30) - 12.0);
+    const auto n = static_cast<std::int32_t>(static_cast<int>(rng() % 31) - 15);
+
+    const double p = std::pow(10.0, -static_cast<double>(n));
+    const double m = std::fmod(x, p);
+    const double q = std::fabs(m / p);
+    const double rounded = q >= 0.5 ? (m > 0 ? (p + x) - m : (x - p) - m) : x - m;
+    EXPECT_EQ(call("CLI_udfROUND1", {f64(x), i32(n)}, numberArea(L::real)), okReal(rounded))
+        << x << " at " << n;
+
+    const double s = 0.0 > x ? -1.0 : 1.0;
+    const double a = std::fabs(x);
+    const double t = std::pow(10.0, std::fabs(static_cast<double>(n)));
+    const double truncated = n >= 0 ? s * (std::floor(a * t) / t) : (std::floor(a / t) * t) * s;
+    EXPECT_EQ(call("CLI_udfTRUNCATE1", {f64(x), i32(n)}, numberArea(L::real)), okReal(truncated))
+        << x << " at " << n;
+
+    const auto xi = static_cast<std::int32_t>(rng());
+    const double ai = std::fabs(static_cast<double>(xi));
+    const double si = 0.0 > static_cast<double>(xi) ? -1.0 : 1.0;
+    const double v = n >= 0 ? xi : (std::floor(ai / t + 0.5) * t) * si;
+    const Outcome want = v > 2147483647.0 || v < -2147483648.0
+                             ? fails("03")
+                             : ok(std::int64_t{static_cast<std::int32_t>(v)});
+    EXPECT_EQ(call("CLI_udfROUND2", {i32(xi), i32(n)}, numberArea(L::int32)), want)
+        << xi << " at " << n;
+
+    const double y = mantissa(rng);
+    const double r = std::pow(x, y);
+    const Outcome power = 0.0 > x                               ? fails("01")
+                          : r == kInf || (r == 0.0 && x != 0.0) ? failsStoring("03", r)
+                                                                : okReal(r);
+    EXPECT_EQ(call("CLI_udfPOWER1", {f64(x), f64(y)}, numberArea(L::real)), power)
+        << x << " ** " << y;
+  }
+}
+
+// With contraction a * b + c would be computed with one rounding; these
+// values tell the two apart.  The build must round every operation.
+TEST(FloatingPoint, IsNotContracted) {
+  volatile double a = 1.0 + std::ldexp(1.0, -30), b = 1.0 - std::ldexp(1.0, -30), c = -1.0;
+  const double separate = a * b + c;
+  EXPECT_EQ(separate, 0.0) << "a multiply and an add were fused";
+  EXPECT_EQ(std::fma(a, b, c), -std::ldexp(1.0, -60));
+}
+
+// ---- RAND -------------------------------------------------------------------
+
+using Rand1 = void (*)(double *, std::int16_t *, char *, const char *, const char *, char *);
+using Rand2 = void (*)(const std::int32_t *, double *, std::int16_t *, std::int16_t *, char *,
+                       const char *, const char *, char *, unsigned char *);
+
+struct RandomCalls {
+  Rand1 rand1 = reinterpret_cast<Rand1>(exportAddress("CLI_udfRAND1"));
+  Rand2 rand2 = reinterpret_cast<Rand2>(exportAddress("CLI_udfRAND2"));
+  std::int16_t ind[2] = {};
+  char sqlstate[6] = {};
+  char message[70] = {};
+
+  double one() {
+    double r = -1;
+    rand1(&r, &ind[0], sqlstate, "", "", message);
+    return r;
+  }
+  double seeded(std::int32_t seed, unsigned char *scratchpad) {
+    double r = -1;
+    rand2(&seed, &r, &ind[0], &ind[1], sqlstate, "", "", message, scratchpad);
+    return r;
+  }
+};
+
+TEST(Rand, RepeatsPerSeedAndSeedsOncePerStatement) {
+  RandomCalls c;
+  ASSERT_TRUE(c.rand1 != nullptr && c.rand2 != nullptr);
+  const auto sequence = [&](std::int32_t seed, std::int32_t later) {
+    std::array<unsigned char, 16> scratchpad{};
+    std::vector<double> out{c.seeded(seed, scratchpad.data())};
+    for (int i = 0; i < 5; ++i) out.push_back(c.seeded(later, scratchpad.data()));
+    out.push_back(c.one());
+    EXPECT_EQ(scratchpad[CLI_SCRATCHPAD_DATA_OFFSET], 1);
+    return out;
+  };
+  // Later seeds are ignored; RAND1 goes on with the same sequence.
+  EXPECT_EQ(sequence(12345, 12345), sequence(12345, 999));
+  EXPECT_NE(sequence(0, 0), sequence(-1, -1));
+  EXPECT_EQ(sequence(0, 0), sequence(0, 7));
+  EXPECT_EQ(c.sqlstate[0], '\0');
+}
+
+TEST(Rand, GivesMultiplesOfOneOver32767InTheClosedRangeEvenly) {
+  RandomCalls c;
+  ASSERT_TRUE(c.rand1 != nullptr);
+  std::array<int, 16> buckets{};
+  bool sawZero = false, sawOne = false;
+  constexpr int kDraws = 400000;
+  for (int i = 0; i < kDraws; ++i) {
+    const double r = c.one();
+    const double steps = r * 32767.0;
+    ASSERT_TRUE(r >= 0.0 && r <= 1.0 && steps == std::round(steps)) << r;
+    sawZero = sawZero || r == 0.0;
+    sawOne = sawOne || r == 1.0;
+    ++buckets[std::min<std::size_t>(15, static_cast<std::size_t>(r * 16))];
+  }
+  EXPECT_TRUE(sawZero && sawOne);
+  for (int b : buckets) EXPECT_NEAR(b, kDraws / 16, kDraws / 16 / 20);  // within 5 %
+}
+
+}  // namespace
