@@ -111,6 +111,47 @@ TEST_F(SqliteHost, ReportsSysfunErrorsWithSqlstateCodeAndWords) {
   for (const Case &c : cases) EXPECT_EQ(eval(c.sql), c.expected) << c.sql;
 }
 
+TEST_F(SqliteHost, CallsDateAndNumberRoutines) {
+  const Case cases[] = {
+      // The plain name validates the time; the narrower export reads only the date.
+      {"SELECT JULIAN_DAY('2001-09-27') || ' ' || sysfun_julian_day1('2001-09-27-99.99.99')",
+       "2452180 2452180"},
+      {"SELECT JULIAN_DAY('2001-09-27-99.99.99')",
+       "error: JULIAN_DAY: SQLSTATE 38552, SYSFUN:06: the time of the timestamp is not valid, or "
+       "the text has no form that is taken"},
+      // SQLite's log is base 10; ours stays reachable under its own name.
+      {"SELECT sysfun_log(1) || ' ' || log(100)", "0.0 2.0"},
+      // Integers reach the 64-bit form, reals the double form, by each argument.
+      {"SELECT typeof(sysfun_power(2, 10)) || sysfun_power(2, 10)", "integer1024"},
+      {"SELECT sysfun_power(2.0, 3) || ' ' || sysfun_power(4, 0.5)", "8.0 2.0"},
+      {"SELECT sysfun_round(1449, -2) || ' ' || sysfun_round(1250.0, -2)", "1400 1300.0"},
+      {"SELECT TRUNCATE(-1.29, 1) || ' ' || sysfun_mod(-7, 3)", "-1.2 -1"},
+      {"SELECT sysfun_abs(-9223372036854775808)",
+       "error: ABS: SQLSTATE 38552, SYSFUN:01: an argument lies outside what the function "
+       "accepts"},
+      {"SELECT sysfun_mod(1, 0.5)",
+       "error: MOD: argument 2 (y) is 0.5, not a whole number in the 64-bit range of CLI_udfMOD3"},
+  };
+  for (const Case &c : cases) EXPECT_EQ(eval(c.sql), c.expected) << c.sql;
+}
+
+// A constant seed seeds once per statement: each statement repeats the
+// same sequence, which goes on from row to row.
+TEST_F(SqliteHost, SeedsRandOncePerStatement) {
+  const auto draws = [&](int seed) {
+    return eval(
+        "WITH RECURSIVE r(i) AS (SELECT 1 UNION ALL SELECT i + 1 FROM r WHERE i < 4) "
+        "SELECT group_concat(RAND(" +
+        std::to_string(seed) + "), ' ') FROM r");
+  };
+  const std::string first = draws(42);
+  EXPECT_EQ(first, draws(42));
+  EXPECT_NE(first, draws(43));
+  EXPECT_EQ(first.find("error"), std::string::npos) << first;
+  const auto space = first.find(' ');
+  EXPECT_NE(first.substr(0, space), first.substr(space + 1, space));
+}
+
 TEST_F(SqliteHost, RegistersDeterministicInnocuousFunctionsWithoutHidingBuiltIns) {
   EXPECT_EQ(eval("SELECT count(*) FROM pragma_function_list WHERE name IN ('sysfun_space', "
                  "'lcase', 'sysfun_ascii3') AND flags & 0x200800 = 0x200800"),
