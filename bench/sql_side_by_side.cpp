@@ -25,7 +25,7 @@ struct Row {
 
 // Columns: s, about 20 bytes of ASCII letters in mixed case with blanks at
 // both ends; n, an integer from 1 to 127; d, a date from 1900 to 2099 as
-// yyyy-mm-dd.  Later families add their rows.
+// yyyy-mm-dd; x, a double from 0 to 1000 with three decimal places.
 constexpr Row kRows[] = {
     {"LCASE vs lower", "LCASE(s)", "lower(s)"},
     {"RTRIM vs rtrim", "sysfun_rtrim(s)", "rtrim(s)"},
@@ -39,6 +39,10 @@ constexpr Row kRows[] = {
     {"DAYOFYEAR vs strftime %j", "DAYOFYEAR(d)", "CAST(strftime('%j', d) AS INTEGER)"},
     {"DAYOFWEEK vs strftime %w", "DAYOFWEEK(d)", "CAST(strftime('%w', d) AS INTEGER) + 1"},
     {"JULIAN_DAY vs julianday", "JULIAN_DAY(d)", "CAST(julianday(d) + 0.5 AS INTEGER)"},
+    {"ABS vs abs", "sysfun_abs(n - 64)", "abs(n - 64)"},
+    {"ROUND vs round", "sysfun_round(x, 2)", "round(x, 2)"},
+    {"POWER vs power", "sysfun_power(x, 1.5)", "power(x, 1.5)"},
+    {"SQRT vs sqrt", "sysfun_sqrt(x)", "sqrt(x)"},
 };
 
 void check(sqlite3 *db, int rc, const char *what) {
@@ -73,11 +77,13 @@ double timeScan(sqlite3 *db, const char *expression) {
 
 void fill(sqlite3 *db, long rows) {
   check(db,
-        sqlite3_exec(db, "CREATE TABLE t(s TEXT, n INTEGER, d TEXT)", nullptr, nullptr, nullptr),
+        sqlite3_exec(db, "CREATE TABLE t(s TEXT, n INTEGER, d TEXT, x REAL)", nullptr, nullptr,
+                     nullptr),
         "create");
   check(db, sqlite3_exec(db, "BEGIN", nullptr, nullptr, nullptr), "begin");
   sqlite3_stmt *insert = nullptr;
-  check(db, sqlite3_prepare_v2(db, "INSERT INTO t VALUES (?1, ?2, date(?3))", -1, &insert, nullptr),
+  check(db,
+        sqlite3_prepare_v2(db, "INSERT INTO t VALUES (?1, ?2, date(?3), ?4)", -1, &insert, nullptr),
         "insert");
   std::uint64_t state = 20261122;  // a fixed seed: the same table every run
   const auto next = [&] {
@@ -95,6 +101,7 @@ void fill(sqlite3 *db, long rows) {
     sqlite3_bind_text(insert, 1, s.data(), static_cast<int>(s.size()), SQLITE_TRANSIENT);
     sqlite3_bind_int(insert, 2, static_cast<int>(1 + next() % 127));
     sqlite3_bind_double(insert, 3, 2415020.5 + static_cast<double>(next() % 73049));
+    sqlite3_bind_double(insert, 4, static_cast<double>(next() % 1000000) / 1000.0);
     check(db, sqlite3_step(insert), "insert");
     sqlite3_reset(insert);
   }

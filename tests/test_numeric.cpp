@@ -220,26 +220,34 @@ i128 tenTo(int k) {
 }
 bool fits64(i128 v) { return v >= kMin64 && v <= kMax64; }
 
-// ROUND and TRUNCATE of 64-bit integers in closed form: keep the digits
-// above place -n, and round on the single digit just below them.
+// ROUND and TRUNCATE of 64-bit integers as the contract tells them: strip
+// one digit at a time, then round on the digit stripped last.
 Outcome roundModel(std::int64_t x, std::int32_t n) {
   if (n >= 0) return ok(x);
   if (n < -19) return ok(std::int64_t{0});
-  const int k = -n;
-  const i128 magnitude = x < 0 ? -i128{x} : i128{x};
-  if (magnitude < tenTo(k - 1) || x == 0) return ok(std::int64_t{0});
-  const int digit = static_cast<int>((magnitude / tenTo(k - 1)) % 10);
-  const i128 kept = i128{x} / tenTo(k);
-  if (digit < 5) return ok(static_cast<std::int64_t>(kept * tenTo(k)));
-  if (k == 19) return fails("03");
-  const i128 v = (kept + (x < 0 ? -1 : 1)) * tenTo(k);
-  return fits64(v) ? ok(static_cast<std::int64_t>(v)) : fails("03");
+  i128 v = x, scale = 1, last = 0;
+  std::int32_t i = 0;
+  for (; v != 0 && i > n; --i) {
+    last = v % 10;
+    v /= 10;
+    scale *= 10;
+  }
+  if (i != n) return ok(std::int64_t{0});
+  if (last < 5 && last > -5) return ok(static_cast<std::int64_t>(n == -19 ? 0 : scale * v));
+  if (n == -19) return fails("03");
+  const i128 r = scale * (v + (x < 0 ? -1 : 1));
+  return fits64(r) ? ok(static_cast<std::int64_t>(r)) : fails("03");
 }
 
 Outcome truncateModel(std::int64_t x, std::int32_t n) {
   if (n >= 0) return ok(x);
   if (n <= -19) return ok(std::int64_t{0});
-  return ok(static_cast<std::int64_t>(i128{x} / tenTo(-n) * tenTo(-n)));
+  i128 v = x, scale = 1;
+  for (std::int32_t i = 0; i > n && v != 0; --i) {
+    v /= 10;
+    scale *= 10;
+  }
+  return ok(static_cast<std::int64_t>(v * scale));
 }
 
 Outcome powerModel(std::int64_t x, std::int64_t y) {
@@ -287,7 +295,7 @@ TEST(SixtyFourBitForms, AgreeWithExactArithmetic) {
         << x << " at " << n;
     const std::int64_t y = rng() % 3 ? static_cast<std::int64_t>(rng() % 80) - 5 : anyInt64(rng);
     const std::int64_t base = rng() % 2 ? x : static_cast<std::int64_t>(rng() % 21) - 10;
-    if (base != -1 && y < 1000) {
+    if (base != -1 || y < 1000) {
       EXPECT_EQ(call("CLI_udfPOWER4", {i64(base), i64(y)}, numberArea(L::int64)),
                 powerModel(base, y))
           << base << " ** " << y;

@@ -46,21 +46,35 @@ Answer<std::int32_t> powerOfInt32(std::int32_t x, std::int32_t y) {
   return success(static_cast<std::int32_t>(v));
 }
 
-// Exact: every product is tested before it is kept.  The loop ends after at
-// most 63 multiplications, by reaching y or by overflow, except for x = -1,
-// whose products never overflow; its sign alternates, so its result is
-// known without the loop.
-Answer<std::int64_t> powerOfInt64(std::int64_t x, std::int64_t y) {
+// Exact, and the same as multiplying by x y - 1 times with each product
+// tested: for |x| >= 2 every partial product is smaller in magnitude than
+// the last, so one overflows exactly when x^y does not fit.  That lets the
+// power be formed by squaring, in at most 6 squarings and 6 products, each
+// tested.  x = -1 never overflows; its sign follows the parity of y.
+constexpr Answer<std::int64_t> powerOfInt64(std::int64_t x, std::int64_t y) {
   if (x == 0) return y > 0 ? success(std::int64_t{0}) : failure<std::int64_t>(Sysfun::outOfRange);
   if (y == 0 || x == 1) return success(std::int64_t{1});
   if (y < 0) return success(std::int64_t{0});
   if (x == -1) return success(std::int64_t{y % 2 == 0 ? 1 : -1});
-  std::int64_t acc = x;
-  for (std::int64_t i = 1; i < y; ++i) {
-    if (__builtin_mul_overflow(x, acc, &acc)) return failure<std::int64_t>(Sysfun::overflow);
+  if (y >= 64) return failure<std::int64_t>(Sysfun::overflow);  // |x|^64 >= 2^64
+  std::int64_t result = 1;
+  std::int64_t square = x;
+  for (;;) {
+    if ((y & 1) != 0 && __builtin_mul_overflow(result, square, &result)) {
+      return failure<std::int64_t>(Sysfun::overflow);
+    }
+    y >>= 1;
+    if (y == 0) return success(result);
+    if (__builtin_mul_overflow(square, square, &square)) {
+      return failure<std::int64_t>(Sysfun::overflow);
+    }
   }
-  return success(acc);
 }
+
+static_assert(powerOfInt64(-2, 63).value == -9223372036854775807 - 1);
+static_assert(powerOfInt64(2, 63).code == Sysfun::overflow);
+static_assert(powerOfInt64(3, 39).value == 4052555153018976267);
+static_assert(powerOfInt64(3, 40).code == Sysfun::overflow);
 
 }  // namespace
 

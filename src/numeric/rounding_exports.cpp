@@ -5,9 +5,10 @@
 // product and quotient in the grouping written here, which decides the last
 // bits.  Negative values go through their magnitude and a sign factor, so
 // that floor serves both signs.  The 64-bit forms use no floating point and
-// strip decimal digits one at a time.
+// strip decimal digits with integer divisions.
 #include <cmath>
 #include <cstdint>
+#include <utility>
 
 #include "numeric/answer.hpp"
 
@@ -64,46 +65,82 @@ Answer<std::int32_t> cutInt32(std::int32_t x, std::int32_t n) {
   return success(static_cast<std::int32_t>(v));
 }
 
-// Strips -n digits; only the digit removed last decides the rounding, with
-// no carry from the digits below it (1449 at n = -2 gives 1400).
-Answer<std::int64_t> roundInt64(std::int64_t x, std::int32_t n) {
-  if (n >= 0) return success(x);
-  if (n < -19) return success(std::int64_t{0});
-  // scale wraps harmlessly at the nineteenth digit: n = -19 never uses it.
-  std::uint64_t scale = 1;
-  std::int32_t i = 0;
-  const std::int64_t g = x < 0 ? -1 : 1;
-  std::int64_t d = 0;
-  while (x != 0 && i > n) {
-    d = x % 10;
-    x /= 10;
-    scale *= 10;
-    --i;
-  }
-  if (i != n) return success(std::int64_t{0});
-  if (d >= 5 || d <= -5) {
-    if (n == -19) return failure<std::int64_t>(Sysfun::overflow);
-    x += g;
-    std::int64_t product = 0;
-    if (__builtin_mul_overflow(static_cast<std::int64_t>(scale), x, &product)) {
-      return failure<std::int64_t>(Sysfun::overflow);
-    }
-    return success(product);
-  }
-  if (n == -19) return success(std::int64_t{0});
-  return success(static_cast<std::int64_t>(scale) * x);
+// The 64-bit forms strip -n decimal digits.  Stripping them one at a time
+// leaves x / 10^k, and the digit removed last is the one at place k; so
+// each is found by one division by a power of ten, a constant for each k,
+// which the compiler turns into a multiplication.
+constexpr std::int64_t kPowersOfTen[19] = {1,
+                                           10,
+                                           100,
+                                           1000,
+                                           10000,
+                                           100000,
+                                           1000000,
+                                           10000000,
+                                           100000000,
+                                           1000000000,
+                                           10000000000,
+                                           100000000000,
+                                           1000000000000,
+                                           10000000000000,
+                                           100000000000000,
+                                           1000000000000000,
+                                           10000000000000000,
+                                           100000000000000000,
+                                           1000000000000000000};
+
+// x / 10^k for k from 0 to 18, truncated towards zero.
+template <int... K>
+constexpr std::int64_t divide(std::int64_t x, int k, std::integer_sequence<int, K...>) {
+  std::int64_t q = x;
+  static_cast<void>(((k == K ? (q = x / kPowersOfTen[K], true) : false) || ...));
+  return q;
+}
+constexpr std::int64_t dropDigits(std::int64_t x, int k) {
+  return divide(x, k, std::make_integer_sequence<int, 19>{});
 }
 
-Answer<std::int64_t> truncateInt64(std::int64_t x, std::int32_t n) {
+// Whether x has fewer than `digits` (0 to 18) decimal digits, so that
+// stripping runs out before it has removed them all.
+constexpr bool shorterThan(std::int64_t x, int digits) {
+  const std::uint64_t magnitude =
+      x < 0 ? 0 - static_cast<std::uint64_t>(x) : static_cast<std::uint64_t>(x);
+  return magnitude < static_cast<std::uint64_t>(kPowersOfTen[digits]);
+}
+
+// Only the digit removed last decides the rounding, with no carry from the
+// digits below it (1449 at n = -2 gives 1400).  At n = -19 no 64-bit value
+// keeps a digit, and one that would round up does not fit.
+constexpr Answer<std::int64_t> roundInt64(std::int64_t x, std::int32_t n) {
+  if (n >= 0) return success(x);
+  if (n < -19) return success(std::int64_t{0});
+  const int k = -n;
+  if (shorterThan(x, k - 1)) return success(std::int64_t{0});
+  const std::int64_t head = dropDigits(x, k - 1);
+  const std::int64_t last = head % 10;  // with the sign of x
+  if (k == 19) {
+    return last >= 5 || last <= -5 ? failure<std::int64_t>(Sysfun::overflow)
+                                   : success(std::int64_t{0});
+  }
+  std::int64_t kept = head / 10;
+  if (last >= 5 || last <= -5) kept += x < 0 ? -1 : 1;
+  std::int64_t product = 0;
+  if (__builtin_mul_overflow(kept, kPowersOfTen[k], &product)) {
+    return failure<std::int64_t>(Sysfun::overflow);
+  }
+  return success(product);
+}
+
+constexpr Answer<std::int64_t> truncateInt64(std::int64_t x, std::int32_t n) {
   if (n >= 0) return success(x);
   if (n <= -19) return success(std::int64_t{0});
-  std::int64_t scale = 1;
-  for (std::int32_t i = 0; i > n && x != 0; --i) {
-    x /= 10;
-    scale *= 10;
-  }
-  return success(x * scale);
+  return success(dropDigits(x, -n) * kPowersOfTen[-n]);
 }
+
+static_assert(roundInt64(1449, -2).value == 1400 && roundInt64(-1450, -2).value == -1500);
+static_assert(roundInt64(7, -2).value == 0 && roundInt64(50, -2).value == 100);
+static_assert(roundInt64(5000000000000000000, -19).code == Sysfun::overflow);
+static_assert(truncateInt64(-9223372036854775807 - 1, -18).value == -9000000000000000000);
 
 }  // namespace
 
