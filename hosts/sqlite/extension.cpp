@@ -503,7 +503,8 @@ void dispatch(sqlite3_context *context, int argc, sqlite3_value **argv) {
       continue;
     }
     if ((f.stringArguments & bit) == 0) {
-      a.type = sqlite3_value_numeric_type(v);
+      // Only text and BLOBs need converting to find their number type.
+      if (a.type == SQLITE_TEXT || a.type == SQLITE_BLOB) a.type = sqlite3_value_numeric_type(v);
       if (a.type == SQLITE_FLOAT) mask |= bit;
       continue;
     }
