@@ -202,18 +202,18 @@ inline constexpr Routine kRoutines[] = {
   {"CLI_udfASCII2", Built::yes, "ASCII", Frame::plain, {text("string")}, {int32()}, kPure, "", "The first byte as a number 0 to 255; 0 for empty text."},
   {"CLI_udfASCII3", Built::yes, "ASCII", Frame::plain, {lob("string")}, {int32()}, kPure, "", "The first byte as a number 0 to 255; 0 for an empty string."},
   // Searching
-  {"CLI_udfLOCATE1", Built::no, "LOCATE", Frame::plain, {text("search"), text("string"), int32("start")}, {int32()}, kPure, "01", "Position of the first match at or after start, counted from 1; 0 for none."},
-  {"CLI_udfLOCATE2", Built::no, "LOCATE", Frame::plain, {lob("search"), lob("string"), int32("start")}, {int32()}, kPure, "01", "Position of the first match at or after start, counted from 1; 0 for none."},
-  {"CLI_udfLOCATE3", Built::no, "LOCATE", Frame::plain, {text("search"), text("string")}, {int32()}, kPure, "", "Position of the first match, counted from 1; 0 for none."},
-  {"CLI_udfLOCATE4", Built::no, "LOCATE", Frame::plain, {lob("search"), lob("string")}, {int32()}, kPure, "", "Position of the first match, counted from 1; 0 for none."},
+  {"CLI_udfLOCATE1", Built::yes, "LOCATE", Frame::plain, {text("search"), text("string"), int32("start")}, {int32()}, kPure, "01", "Position of the first match at or after start, counted from 1; 0 for none."},
+  {"CLI_udfLOCATE2", Built::yes, "LOCATE", Frame::plain, {lob("search"), lob("string"), int32("start")}, {int32()}, kPure, "01", "Position of the first match at or after start, counted from 1; 0 for none."},
+  {"CLI_udfLOCATE3", Built::yes, "LOCATE", Frame::plain, {text("search"), text("string")}, {int32()}, kPure, "", "Position of the first match, counted from 1; 0 for none."},
+  {"CLI_udfLOCATE4", Built::yes, "LOCATE", Frame::plain, {lob("search"), lob("string")}, {int32()}, kPure, "", "Position of the first match, counted from 1; 0 for none."},
   // Rebuilding
-  {"CLI_udfREPLACE1", Built::no, "REPLACE", Frame::plain, {text("source"), text("search"), text("replacement")}, {textOf(kText)}, kPure, "10", "The source with every match of search, left to right, replaced."},
-  {"CLI_udfREPLACE2", Built::no, "REPLACE", Frame::plain, {lob("source"), lob("search"), lob("replacement")}, {lobOf(kLob)}, kPure, "10", "The source with every match of search, left to right, replaced."},
-  {"CLI_udfINSERT1", Built::no, "INSERT", Frame::plain, {text("source"), int32("start"), int32("length"), text("insert")}, {textOf(kText)}, kPure, "01 10", "The source with length bytes from start replaced by the new string."},
-  {"CLI_udfINSERT2", Built::no, "INSERT", Frame::plain, {lob("source"), int32("start"), int32("length"), lob("insert")}, {lobOf(kLob)}, kPure, "01 10", "The source with length bytes from start replaced by the new string."},
+  {"CLI_udfREPLACE1", Built::yes, "REPLACE", Frame::plain, {text("source"), text("search"), text("replacement")}, {textOf(kText)}, kPure, "10", "The source with every match of search, left to right, replaced."},
+  {"CLI_udfREPLACE2", Built::yes, "REPLACE", Frame::plain, {lob("source"), lob("search"), lob("replacement")}, {lobOf(kLob)}, kPure, "10", "The source with every match of search, left to right, replaced."},
+  {"CLI_udfINSERT1", Built::yes, "INSERT", Frame::plain, {text("source"), int32("start"), int32("length"), text("insert")}, {textOf(kText)}, kPure, "01 10", "The source with length bytes from start replaced by the new string."},
+  {"CLI_udfINSERT2", Built::yes, "INSERT", Frame::plain, {lob("source"), int32("start"), int32("length"), lob("insert")}, {lobOf(kLob)}, kPure, "01 10", "The source with length bytes from start replaced by the new string."},
   // Phonetic
-  {"CLI_udfSOUNDEX", Built::no, "SOUNDEX", Frame::plain, {text("string")}, {textOf(4)}, kPure, "", "Four-character Soundex code; Z000 for a text without a letter."},
-  {"CLI_udfDIFFERENCE", Built::no, "DIFFERENCE", Frame::plain, {text("a"), text("b")}, {int32()}, kPure, "", "How many of the four Soundex positions agree, 0 to 4."},
+  {"CLI_udfSOUNDEX", Built::yes, "SOUNDEX", Frame::plain, {text("string")}, {textOf(4)}, kPure, "", "Four-character Soundex code; Z000 for a text without a letter."},
+  {"CLI_udfDIFFERENCE", Built::yes, "DIFFERENCE", Frame::plain, {text("a"), text("b")}, {int32()}, kPure, "", "How many of the four Soundex positions agree, 0 to 4."},
   // Table functions
   {"CLI_udfFmpThreads", Built::no, "FmpThreads", Frame::tableCallback, {int32("selector")}, {int32(), int32(), int32(), int32(), int32(), int32()}, 0, "", "The engine's table of Fmp threads."},
   {"CLI_udfFmpRows", Built::no, "FmpRows", Frame::tableCallback, {}, {int32(), int32(), int16(), int16(), int16(), int16()}, 0, "", "The engine's table of Fmp rows."},

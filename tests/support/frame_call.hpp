@@ -64,6 +64,11 @@ inline Outcome failsStoring(std::string code, double d) {
   return {std::move(code), "", static_cast<std::int64_t>(bitsOf(d)), true, true};
 }
 
+// A failure that left the pieces built so far in a string result.
+inline Outcome failsLeaving(std::string code, std::string bytes) {
+  return {std::move(code), std::move(bytes), 0, true};
+}
+
 void PrintTo(const Outcome &o, std::ostream *os);
 
 // Calls the export `name` with one result.

@@ -1,0 +1,248 @@
+// LOCATE, REPLACE, INSERT, SOUNDEX and DIFFERENCE: the edge cases as
+// tables, and every form against naive left-to-right models on small
+// alphabets, where matches and near-matches are frequent.
+#include <gtest/gtest.h>
+
+#include <cstdint>
+#include <random>
+#include <string>
+#include <vector>
+
+#include "support/frame_call.hpp"
+
+namespace {
+
+using namespace orv::test;
+
+Outcome n(std::int64_t v) { return ok(v); }
+
+struct Case {
+  const char *routine;
+  std::vector<Value> in;
+  Value result;
+  Outcome want;
+};
+
+TEST(LocateReplaceInsert, KeepTheirEdges) {
+  const std::string a3999b = std::string(3999, 'a') + "b";
+  // clang-format off
+  const Case cases[] = {
+      {"CLI_udfLOCATE3", {text("b"), text("abcb")}, intArea(), n(2)},
+      {"CLI_udfLOCATE1", {text("b"), text("abcb"), i32(3)}, intArea(), n(4)},
+      {"CLI_udfLOCATE1", {text("b"), text("abcb"), i32(0)}, intArea(), fails("01")},
+      {"CLI_udfLOCATE1", {text("b"), text("abcb"), i32(4001)}, intArea(), fails("01")},
+      {"CLI_udfLOCATE1", {text("b"), text("abcb"), i32(4000)}, intArea(), n(0)},
+      {"CLI_udfLOCATE2", {lob("b"), lob("abcb"), i32(1048577)}, intArea(), fails("01")},
+      {"CLI_udfLOCATE2", {lob("b"), lob("abcb"), i32(-1)}, intArea(), fails("01")},
+      {"CLI_udfLOCATE1", {text(""), text("abc"), i32(4)}, intArea(), n(4)},
+      {"CLI_udfLOCATE1", {text(""), text("abc"), i32(5)}, intArea(), n(0)},
+      {"CLI_udfLOCATE4", {lob(""), lob("")}, intArea(), n(1)},
+      {"CLI_udfLOCATE4", {lob(std::string("b\0c", 3)), lob(std::string("ab\0c", 4))}, intArea(), n(2)},
+      {"CLI_udfLOCATE3", {text("aab"), text("aaab")}, intArea(), n(2)},
+      {"CLI_udfLOCATE3", {text(a3999b), text(std::string(5000, 'a') + "b")}, intArea(), n(1002)},
+      {"CLI_udfREPLACE1", {text("aXbXc"), text("X"), text("YY")}, textArea(), ok("aYYbYYc")},
+      {"CLI_udfREPLACE1", {text("aaa"), text("aa"), text("b")}, textArea(), ok("ba")},
+      {"CLI_udfREPLACE2", {lob("XXX"), lob("X"), lob("")}, lobArea(), ok("")},
+      {"CLI_udfREPLACE1", {text(std::string(4000, 'x')), text("x"), text("y")}, textArea(), ok(std::string(4000, 'y'))},
+      // A failure leaves the pieces so far as terminated text.
+      {"CLI_udfREPLACE1", {text(std::string(4000, 'x')), text("x"), text("yy")}, textArea(), failsLeaving("10", std::string(4000, 'y'))},
+      {"CLI_udfREPLACE1", {text("ab" + std::string(3998, 'x')), text("a"), text("cc")}, textArea(), failsLeaving("10", "cc")},
+      {"CLI_udfINSERT1", {text("abcdef"), i32(3), i32(2), text("XY")}, textArea(), ok("abXYef")},
+      {"CLI_udfINSERT1", {text("abcdef"), i32(3), i32(0), text("XY")}, textArea(), ok("abXYcdef")},
+      {"CLI_udfINSERT1", {text("abcdef"), i32(6), i32(5), text("XY")}, textArea(), ok("abcdeXY")},
+      {"CLI_udfINSERT1", {text("abcdef"), i32(7), i32(0), text("XY")}, textArea(), fails("10")},
+      {"CLI_udfINSERT1", {text("abcdef"), i32(0), i32(0), text("XY")}, textArea(), fails("01")},
+      {"CLI_udfINSERT1", {text(""), i32(1), i32(0), text("XY")}, textArea(), fails("10")},
+      {"CLI_udfINSERT1", {text("abcdef"), i32(3), i32(100), text("XY")}, textArea(), ok("abXY")},
+      {"CLI_udfINSERT2", {lob("abcdef"), i32(3), i32(100), lob("XY")}, lobArea(), fails("10")},
+      {"CLI_udfINSERT1", {text("abcdef"), i32(3), i32(-1), text("XY")}, textArea(), fails("01")},
+      {"CLI_udfINSERT1", {text("abcdef"), i32(3), i32(-5000), text("XY")}, textArea(), fails("10")},
+      // A length that would wrap p + l; a range past the end whose true
+      // length passes the capacity although s - l + i does not.
+      {"CLI_udfINSERT1", {text("abcdef"), i32(3), i32(2147483647), text("XY")}, textArea(), fails("01")},
+      {"CLI_udfINSERT2", {lob("abcdef"), i32(6), i32(5), lob("0123456789")}, lobArea(12), fails("10")},
+      {"CLI_udfINSERT2", {lob("abcdef"), i32(6), i32(5), lob("012345")}, lobArea(12), ok("abcde012345")},
+      {"CLI_udfINSERT2", {lob("abcdef"), i32(2), i32(11), lob("012345")}, lobArea(12), fails("01")},
+  };
+  // clang-format on
+  for (const Case &c : cases) {
+    EXPECT_EQ(call(c.routine, c.in, c.result), c.want) << c.routine;
+  }
+  // Past the limit with nothing written: the length word holds the source's.
+  const Outcome tooLong =
+      call("CLI_udfREPLACE2", {lob(std::string(1048577, 'x')), lob(""), lob("y")}, lobArea());
+  EXPECT_EQ(tooLong.error, "10");
+}
+
+// ---- Naive models, as the routines are defined --------------------------
+
+std::int64_t locateModel(const std::string &search, const std::string &in, std::size_t start) {
+  for (std::size_t p = start - 1; p + search.size() <= in.size(); ++p) {
+    if (in.compare(p, search.size(), search) == 0) return static_cast<std::int64_t>(p + 1);
+  }
+  return 0;
+}
+
+std::string replaceModel(const std::string &in, const std::string &search, const std::string &by) {
+  if (search.empty()) return in;
+  std::string out;
+  for (std::size_t p = 0; p < in.size();) {
+    if (in.compare(p, search.size(), search) == 0) {
+      out += by;
+      p += search.size();
+    } else {
+      out += in[p++];
+    }
+  }
+  return out;
+}
+
+// The checks in their order, with s - l + i in the form's 32-bit type.
+Outcome insertModel(bool lobForm, const std::string &in, std::int64_t p, std::int64_t l,
+                    const std::string &add, std::int64_t limit) {
+  const auto s = static_cast<std::int64_t>(in.size()), i = static_cast<std::int64_t>(add.size());
+  const auto wrapped = static_cast<std::uint32_t>(s - l + i);
+  const std::int64_t size = lobForm ? std::int64_t{wrapped} : static_cast<std::int32_t>(wrapped);
+  const std::int64_t trueSize = p - 1 + l > s ? p - 1 + i : s - l + i;
+  if (size > limit || p > s || (p >= 1 && l >= 0 && trueSize > limit)) return fails("10");
+  if (p < 1 || (!lobForm && p > limit) || l < 0 || p + l > limit) return fails("01");
+  const auto head = static_cast<std::size_t>(p - 1);
+  const auto tail = static_cast<std::size_t>(std::min(p - 1 + l, s));
+  return ok(in.substr(0, head) + add + in.substr(tail));
+}
+
+std::string randomText(std::mt19937 &rng, const char *alphabet, std::size_t maxLength) {
+  std::string s(std::uniform_int_distribution<std::size_t>(0, maxLength)(rng), ' ');
+  const std::size_t k = std::char_traits<char>::length(alphabet);
+  for (char &c : s) c = alphabet[std::uniform_int_distribution<std::size_t>(0, k - 1)(rng)];
+  return s;
+}
+
+TEST(LocateReplaceInsert, AgreeWithNaiveModelsOnSmallAlphabets) {
+  std::mt19937 rng(5150);
+  int failures = 0;
+  const auto check = [&](const Outcome &got, const Outcome &want, const std::string &what) {
+    if (got != want && ++failures <= 10) {
+      ADD_FAILURE() << what << ": got " << testing::PrintToString(got) << ", want "
+                    << testing::PrintToString(want);
+    }
+  };
+  for (int round = 0; round < 6000; ++round) {
+    const char *alphabet = round % 3 == 0 ? "ab" : round % 3 == 1 ? "aab" : "abc";
+    const std::string hay = randomText(rng, alphabet, 24);
+    const std::string needle = randomText(rng, alphabet, 4);
+    const std::string by = randomText(rng, "xy", 3);
+    std::string lobHay = hay, lobNeedle = needle;  // NUL bytes for the CLI_udfLob forms
+    if (round % 4 == 0 && !lobHay.empty()) lobHay[rng() % lobHay.size()] = '\0';
+    if (round % 8 == 0 && !lobNeedle.empty()) lobNeedle[0] = '\0';
+    const auto start = static_cast<std::int32_t>(rng() % 28);
+    const std::string what = "'" + needle + "' in '" + hay + "' from " + std::to_string(start);
+
+    check(call("CLI_udfLOCATE3", {text(needle), text(hay)}, intArea()),
+          n(locateModel(needle, hay, 1)), what);
+    check(call("CLI_udfLOCATE4", {lob(lobNeedle), lob(lobHay)}, intArea()),
+          n(locateModel(lobNeedle, lobHay, 1)), what);
+    const Outcome fromStart =
+        start < 1 ? fails("01") : n(locateModel(needle, hay, static_cast<std::size_t>(start)));
+    check(call("CLI_udfLOCATE1", {text(needle), text(hay), i32(start)}, intArea()), fromStart,
+          what);
+    check(call("CLI_udfLOCATE2", {lob(needle), lob(hay), i32(start)}, intArea()), fromStart, what);
+    check(call("CLI_udfREPLACE1", {text(hay), text(needle), text(by)}, textArea()),
+          ok(replaceModel(hay, needle, by)), what);
+    check(call("CLI_udfREPLACE2", {lob(lobHay), lob(lobNeedle), lob(by)}, lobArea()),
+          ok(replaceModel(lobHay, lobNeedle, by)), what);
+
+    const std::int32_t p = static_cast<std::int32_t>(rng() % 30) - 2;
+    const std::int32_t l = static_cast<std::int32_t>(rng() % 34) - 4;
+    const std::uint32_t capacity = static_cast<std::uint32_t>(rng() % 40);
+    check(call("CLI_udfINSERT1", {text(hay), i32(p), i32(l), text(by)}, textArea()),
+          insertModel(false, hay, p, l, by, 4000), what + " insert " + std::to_string(l));
+    check(call("CLI_udfINSERT2", {lob(lobHay), i32(p), i32(l), lob(by)}, lobArea(capacity)),
+          insertModel(true, lobHay, p, l, by, capacity), what + " insert " + std::to_string(l));
+  }
+  EXPECT_EQ(failures, 0);
+}
+
+// ---- SOUNDEX and DIFFERENCE ---------------------------------------------
+
+// The code as its steps tell it, with the groups looked up by name.
+std::string soundexModel(const std::string &text) {
+  const auto value = [](unsigned char c) -> int {
+    if (!((c >= 'A' && c <= 'Z') || (c >= 'a' && c <= 'z'))) return -1;
+    const std::string groups[] = {"AEHIOUWY", "BFPV", "CGJKQSXZ", "DT", "L", "MN", "R"};
+    for (int g = 0; g < 7; ++g) {
+      if (groups[g].find(static_cast<char>(std::toupper(c))) != std::string::npos) return g;
+    }
+    return -1;
+  };
+  std::size_t i = 0;
+  while (i < text.size() && value(static_cast<unsigned char>(text[i])) < 0) ++i;
+  if (i == text.size()) return "Z000";
+  std::string code(1, static_cast<char>(std::toupper(static_cast<unsigned char>(text[i]))));
+  int last = value(static_cast<unsigned char>(text[i]));
+  for (++i; i < text.size() && code.size() < 4; ++i) {
+    const int v = value(static_cast<unsigned char>(text[i]));
+    if (v < 0 || v == last) continue;
+    last = v;
+    if (v != 0) code += static_cast<char>('0' + v);
+  }
+  return code + std::string(4 - code.size(), '0');
+}
+
+TEST(Soundex, CodesNamesAsTheRulesSay) {
+  const std::pair<const char *, const char *> cases[] = {
+      {"", "Z000"},
+      {"123", "Z000"},
+      {"Zoe", "Z000"},
+      {"  a", "A000"},
+      {"A1B2C3", "A120"},
+      {"a b c d e", "A123"},
+      {"Rupert", "R163"},
+      {"Rubin", "R150"},
+      {"Ashcroft", "A226"},
+      {"Tymczak", "T522"},
+      {"Pfister", "P236"},
+      {"Honeyman", "H555"},
+      {"Lloyd", "L300"},
+      {"SMYTHE", "S530"},
+      {"Gutierrez", "G362"},
+      {"O'Brien", "O165"},
+      {"Bhb", "B100"},
+      {"B-b", "B000"},
+      {"Ab Ab", "A110"},
+      {"\xE9"
+       "A",
+       "A000"},
+      {"abcdefghijklmnopqrstuvwxyz", "A123"},
+  };
+  for (const auto &[in, code] : cases) {
+    EXPECT_EQ(call("CLI_udfSOUNDEX", {text(in)}, textArea(5)), ok(code)) << in;
+  }
+  const std::tuple<const char *, const char *, int> pairs[] = {
+      {"Robert", "Rupert", 4}, {"Robert", "Smith", 0}, {"Smith", "Jones", 2}, {"Lee", "Leigh", 3},
+      {"bc", "cb", 2},         {"", "Z", 4},           {"Ann", "Andrew", 2},
+  };
+  for (const auto &[a, b, same] : pairs) {
+    EXPECT_EQ(call("CLI_udfDIFFERENCE", {text(a), text(b)}, intArea()), n(same)) << a << "/" << b;
+  }
+}
+
+TEST(Soundex, AgreesWithTheModelOnRandomBytes) {
+  std::mt19937 rng(31337);
+  for (int round = 0; round < 20000; ++round) {
+    std::string s(rng() % 12, ' ');
+    for (char &c : s) c = static_cast<char>(1 + rng() % 255);  // letters, others, 0x80 and up
+    if (round % 2 == 0) {
+      for (char &c : s) c = "BbFfPpAaHhWwCcDdLlMmRr -"[rng() % 24];
+    }
+    const std::string other = s.substr(0, s.size() / 2) + "x";
+    const std::string a = soundexModel(s), b = soundexModel(other);
+    ASSERT_EQ(call("CLI_udfSOUNDEX", {text(s)}, textArea(5)), ok(a)) << testing::PrintToString(s);
+    int same = 0;
+    for (int i = 0; i < 4; ++i)
+      same += a[static_cast<std::size_t>(i)] == b[static_cast<std::size_t>(i)];
+    ASSERT_EQ(call("CLI_udfDIFFERENCE", {text(s), text(other)}, intArea()), n(same));
+  }
+}
+
+}  // namespace
