@@ -47,7 +47,9 @@ inline bool CLI_isOutOfRange(double r) noexcept { return r == HUGE_VAL || r == 0
 }  // namespace cli
 
 // One input and one result, or two inputs and one result, in the plain
-// frame; `compute` maps the input values to an Answer.
+// frame; `compute` maps the input values to an Answer.  The value types
+// stand as types in the signatures, where parentheses cannot go.
+// NOLINTBEGIN(bugprone-macro-parentheses)
 #define CLI_NUMERIC_EXPORT1(name, X, R, compute)                                                \
   CLI_EXPORT void name(const X *x, R *result, cli::Ind, cli::Ind, char *sqlstate, cli::NameArg, \
                        cli::NameArg, char *message) noexcept {                                  \
@@ -59,3 +61,4 @@ inline bool CLI_isOutOfRange(double r) noexcept { return r == HUGE_VAL || r == 0
                        char *sqlstate, cli::NameArg, cli::NameArg, char *message) noexcept { \
     cli::deliver(compute(*x, *y), result, cli::Status{sqlstate, message});                   \
   }
+// NOLINTEND(bugprone-macro-parentheses)

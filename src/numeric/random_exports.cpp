@@ -27,7 +27,8 @@ static_assert(kRandomBits >= 15 && (RAND_MAX & (RAND_MAX + 1ULL)) == 0,
               "rand must give a whole number of random bits, at least 15");
 
 double next() noexcept {
-  const int r = std::rand() >> (kRandomBits - 15);
+  // The C library's generator is the one whose sequence srand sets.
+  const int r = std::rand() >> (kRandomBits - 15);  // NOLINT(cert-msc30-c,cert-msc50-cpp)
   // A division by 32767.0, not a multiplication by its inverse: 32767
   // gives exactly 1.0.
   return static_cast<double>(r) / 32767.0;
@@ -44,9 +45,8 @@ CLI_EXPORT void CLI_udfRAND1(double *result, Ind, char *, NameArg, NameArg, char
 // the seed.
 CLI_EXPORT void CLI_udfRAND2(const std::int32_t *seed, double *result, Ind, Ind, char *, NameArg,
                              NameArg, char *, unsigned char *scratchpad) noexcept {
-  unsigned char &seeded = scratchpad[CLI_SCRATCHPAD_DATA_OFFSET];
-  if (seeded == 0) {
-    seeded = 1;
+  if (scratchpad[CLI_SCRATCHPAD_DATA_OFFSET] == 0) {
+    scratchpad[CLI_SCRATCHPAD_DATA_OFFSET] = 1;
     std::srand(static_cast<unsigned>(*seed));
   }
   *result = next();

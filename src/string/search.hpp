@@ -38,7 +38,7 @@ class Searcher {
 
   // The first position at or after `from` where the needle stands in
   // `haystack` in full, or kNotFound.  An empty needle stands at `from`.
-  std::size_t find(Bytes haystack, std::size_t from) const noexcept {
+  [[nodiscard]] std::size_t find(Bytes haystack, std::size_t from) const noexcept {
     if (from > haystack.size || m_ > haystack.size - from) return kNotFound;
     const Byte *h = haystack.data + from;
     const std::size_t n = haystack.size - from;
@@ -60,7 +60,7 @@ class Searcher {
 
   // The maximal suffix of the needle and its period, by Crochemore and
   // Perrin; unsigned arithmetic wraps start from -1 on purpose.
-  Suffix maximalSuffix(bool reversed) const noexcept {
+  [[nodiscard]] Suffix maximalSuffix(bool reversed) const noexcept {
     std::size_t start = kNotFound, j = 0, k = 1, p = 1;
     while (j + k < m_) {
       const Byte a = x_[j + k], b = x_[start + k];

@@ -47,7 +47,7 @@ class Builder {
     if constexpr (std::is_same_v<Form, Text>) area_[length_] = 0;
     return true;
   }
-  std::size_t length() const noexcept { return length_; }
+  [[nodiscard]] std::size_t length() const noexcept { return length_; }
 
  private:
   cli::Byte *area_;
