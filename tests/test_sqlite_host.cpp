@@ -111,7 +111,7 @@ TEST_F(SqliteHost, ReportsSysfunErrorsWithSqlstateCodeAndWords) {
   for (const Case &c : cases) EXPECT_EQ(eval(c.sql), c.expected) << c.sql;
 }
 
-TEST_F(SqliteHost, CallsDateAndNumberRoutines) {
+TEST_F(SqliteHost, CallsDateNumberAndSearchRoutines) {
   const Case cases[] = {
       // The plain name validates the time; the narrower export reads only the date.
       {"SELECT JULIAN_DAY('2001-09-27') || ' ' || sysfun_julian_day1('2001-09-27-99.99.99')",
@@ -129,6 +129,11 @@ TEST_F(SqliteHost, CallsDateAndNumberRoutines) {
       {"SELECT sysfun_abs(-9223372036854775808)",
        "error: ABS: SQLSTATE 38552, SYSFUN:01: an argument lies outside what the function "
        "accepts"},
+      {"SELECT LOCATE('b', 'abcb', 3) || \"INSERT\"('abcdef', 3, 2, 'XY') || DIFFERENCE('a', 'b')",
+       "4abXYef3"},
+      {"SELECT sysfun_soundex('Ashcraft') || length(sysfun_replace(printf('%5000c', 'a'), 'a', "
+       "'bb'))",
+       "A2265001"},
       {"SELECT sysfun_mod(1, 0.5)",
        "error: MOD: argument 2 (y) is 0.5, not a whole number in the 64-bit range of CLI_udfMOD3"},
   };
