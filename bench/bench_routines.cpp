@@ -85,12 +85,21 @@ void run(benchmark::State &state, const char *name, std::vector<std::vector<unsi
   std::memcpy(&capacity, result.data(), 4);
   for (auto _ : state) {
     if (capacity != 0) std::memcpy(result.data(), &capacity, 4);
-    if (args.size() == 6) {
-      invoke(fn, args.data(), std::make_index_sequence<6>{});
-    } else if (args.size() == 8) {
-      invoke(fn, args.data(), std::make_index_sequence<8>{});
-    } else {
-      invoke(fn, args.data(), std::make_index_sequence<10>{});
+    switch (args.size()) {
+      case 6:
+        invoke(fn, args.data(), std::make_index_sequence<6>{});
+        break;
+      case 8:
+        invoke(fn, args.data(), std::make_index_sequence<8>{});
+        break;
+      case 10:
+        invoke(fn, args.data(), std::make_index_sequence<10>{});
+        break;
+      case 12:
+        invoke(fn, args.data(), std::make_index_sequence<12>{});
+        break;
+      default:
+        invoke(fn, args.data(), std::make_index_sequence<14>{});
     }
     benchmark::DoNotOptimize(result.data());
     benchmark::ClobberMemory();
@@ -273,6 +282,93 @@ const bool kMathRowsRegistered = [] {
   benchmark::RegisterBenchmark("libm exp/0.7", mathCall1<expCall>, 0.7);
   benchmark::RegisterBenchmark("libm log/0.7", mathCall1<logCall>, 0.7);
   benchmark::RegisterBenchmark("libm sqrt/2.0", mathCall1<sqrtCall>, 2.0);
+  return true;
+}();
+
+// Searching and rebuilding.  The 1 MiB rows report bytes of the searched
+// string per second; the needle rows of 'a' are the inputs that make a
+// left-to-right search quadratic.
+std::string words(std::size_t size) {
+  const std::string line = "the quick brown fox jumps over the lazy dog, then naps by the river. ";
+  std::string out;
+  while (out.size() < size) out += line;
+  out.resize(size);
+  return out;
+}
+std::string everyHundred(std::size_t size) {  // "x" once in every 100 bytes
+  std::string out = words(size);
+  for (std::size_t i = 50; i < size; i += 100) out[i] = 'x';
+  return out;
+}
+const std::string kAs(1 << 20, 'a');
+
+struct SearchRow {
+  const char *name, *routine;
+  std::vector<std::vector<unsigned char>> inputs;
+  std::vector<unsigned char> result;
+  std::int64_t bytes;
+};
+const SearchRow kSearchRows[] = {
+    {"LOCATE4/1 MiB of text, no match",
+     "CLI_udfLOCATE4",
+     {lob("quartz"), lob(words(1 << 20))},
+     number(0),
+     1 << 20},
+    {"LOCATE4/1 MiB of text, no match, 40-byte needle",
+     "CLI_udfLOCATE4",
+     {lob("the quick brown fox jumps over the cat!!"), lob(words(1 << 20))},
+     number(0),
+     1 << 20},
+    {"LOCATE4/1 MiB of a, 3999 a and a b",
+     "CLI_udfLOCATE4",
+     {lob(std::string(3999, 'a').append("b")), lob(kAs)},
+     number(0),
+     1 << 20},
+    {"LOCATE4/1 MiB of a, a b and 3999 a",
+     "CLI_udfLOCATE4",
+     {lob(std::string("b").append(3999, 'a')), lob(kAs)},
+     number(0),
+     1 << 20},
+    {"LOCATE4/1 MiB of a, aab", "CLI_udfLOCATE4", {lob("aab"), lob(kAs)}, number(0), 1 << 20},
+    {"REPLACE2/1 MiB, a match every 100 bytes",
+     "CLI_udfREPLACE2",
+     {lob(everyHundred(1 << 20)), lob("x"), lob("y")},
+     lobArea(),
+     1 << 20},
+    {"REPLACE2/1 MiB, no match",
+     "CLI_udfREPLACE2",
+     {lob(words(1 << 20)), lob("quartz"), lob("yz")},
+     lobArea(),
+     1 << 20},
+    {"LOCATE1/20-byte text",
+     "CLI_udfLOCATE1",
+     {text("fox"), text(words(20)), number(1)},
+     number(0),
+     0},
+    {"LOCATE3/20-byte text", "CLI_udfLOCATE3", {text("fox"), text(words(20))}, number(0), 0},
+    {"REPLACE1/20-byte text",
+     "CLI_udfREPLACE1",
+     {text(words(20)), text("o"), text("00")},
+     textArea(),
+     0},
+    {"INSERT1/20-byte text",
+     "CLI_udfINSERT1",
+     {text(words(20)), number(5), number(3), text("XYZ")},
+     textArea(),
+     0},
+    {"SOUNDEX/10-byte name", "CLI_udfSOUNDEX", {text("Washington")}, textArea(), 0},
+    {"DIFFERENCE/two names",
+     "CLI_udfDIFFERENCE",
+     {text("Ashcraft"), text("Ashcroft")},
+     number(0),
+     0},
+};
+
+const bool kSearchRowsRegistered = [] {
+  for (const SearchRow &r : kSearchRows) {
+    benchmark::RegisterBenchmark(
+        r.name, [&r](benchmark::State &s) { run(s, r.routine, r.inputs, r.result, r.bytes); });
+  }
   return true;
 }();
 

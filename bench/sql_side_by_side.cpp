@@ -44,6 +44,9 @@ constexpr Row kRows[] = {
     {"ROUND vs round", "sysfun_round(x, 2)", "round(x, 2)"},
     {"POWER vs power", "sysfun_power(x, 1.5)", "power(x, 1.5)"},
     {"SQRT vs sqrt", "sysfun_sqrt(x)", "sqrt(x)"},
+    {"LOCATE vs instr", "LOCATE('ab', s)", "instr(s, 'ab')"},
+    {"REPLACE vs replace", "sysfun_replace(s, 'a', 'xy')", "replace(s, 'a', 'xy')"},
+    {"SOUNDEX vs soundex", "sysfun_soundex(s)", "soundex(s)"},
 };
 
 void check(sqlite3 *db, int rc, const char *what) {

@@ -129,8 +129,16 @@ TEST(LocateReplaceInsert, AgreeWithNaiveModelsOnSmallAlphabets) {
   };
   for (int round = 0; round < 6000; ++round) {
     const char *alphabet = round % 3 == 0 ? "ab" : round % 3 == 1 ? "aab" : "abc";
-    const std::string hay = randomText(rng, alphabet, 24);
-    const std::string needle = randomText(rng, alphabet, 4);
+    // Short needles, and long ones cut from the haystack with a byte
+    // changed now and then, so that long partial matches are frequent.
+    const bool longer = round % 2 == 1;
+    const std::string hay = randomText(rng, alphabet, longer ? 90 : 24);
+    std::string needle = randomText(rng, alphabet, 4);
+    if (longer && hay.size() > 2) {
+      const std::size_t from = rng() % (hay.size() - 1);
+      needle = hay.substr(from, 1 + rng() % 24);
+      if (rng() % 2 == 0) needle[rng() % needle.size()] ^= 3;
+    }
     const std::string by = randomText(rng, "xy", 3);
     std::string lobHay = hay, lobNeedle = needle;  // NUL bytes for the CLI_udfLob forms
     if (round % 4 == 0 && !lobHay.empty()) lobHay[rng() % lobHay.size()] = '\0';

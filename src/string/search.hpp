@@ -6,13 +6,16 @@
 // Two-Way algorithm of Crochemore and Perrin finds the same first match in
 // at most about 2n comparisons with O(1) memory, so nothing is allocated.
 // memchr on the first byte that each attempt compares skips positions that
-// cannot match; it only moves forward, so the bound holds.
+// cannot match; it only moves forward, so the bound holds.  Comparisons go
+// a word at a time, on little-endian machines (all that we build for).
 //
 // The C library's memmem would do, but is not linear on every platform and
 // missing on some, so the library carries its own.
 #pragma once
 
+#include <bit>
 #include <cstddef>
+#include <cstdint>
 #include <cstring>
 
 #include "frame/frame.hpp"
@@ -20,6 +23,8 @@
 namespace cli::str {
 
 inline constexpr std::size_t kNotFound = static_cast<std::size_t>(-1);
+
+static_assert(std::endian::native == std::endian::little, "word compares assume little-endian");
 
 class Searcher {
  public:
@@ -83,6 +88,45 @@ class Searcher {
     return {start, p};
   }
 
+  // The first i in [from, m) where the needle and the haystack at j
+  // differ, or m; compared a word at a time.
+  [[nodiscard]] std::size_t mismatchForward(const Byte *h, std::size_t from) const noexcept {
+    std::size_t i = from;
+    for (; i + 8 <= m_; i += 8) {
+      const std::uint64_t d = word(x_ + i) ^ word(h + i);
+      if (d != 0) return i + lowestByte(d);
+    }
+    while (i < m_ && x_[i] == h[i]) ++i;
+    return i;
+  }
+
+  // Going down from `from` (exclusive) to `floor`: the highest i below
+  // `from` where they differ, or floor - 1 (wrapping) when all match.
+  [[nodiscard]] std::size_t mismatchBackward(const Byte *h, std::size_t from,
+                                             std::size_t floor) const noexcept {
+    std::size_t i = from;
+    for (; i >= floor + 8; i -= 8) {
+      const std::uint64_t d = word(x_ + i - 8) ^ word(h + i - 8);
+      if (d != 0) return i - 1 - highestByte(d);
+    }
+    while (i > floor && x_[i - 1] == h[i - 1]) --i;
+    return i - 1;
+  }
+
+  static std::uint64_t word(const Byte *p) noexcept {
+    std::uint64_t w = 0;
+    std::memcpy(&w, p, sizeof w);
+    return w;
+  }
+  // Byte offsets, in memory order, of the lowest and highest differing
+  // byte of a non-zero XOR of two little-endian words.
+  static std::size_t lowestByte(std::uint64_t d) noexcept {
+    return static_cast<std::size_t>(std::countr_zero(d)) / 8;
+  }
+  static std::size_t highestByte(std::uint64_t d) noexcept {
+    return static_cast<std::size_t>(std::countl_zero(d)) / 8;
+  }
+
   // Moves j to the next position whose first compared byte matches, or
   // gives false when no position is left.
   bool skip(const Byte *h, std::size_t n, std::size_t &j) const noexcept {
@@ -96,11 +140,9 @@ class Searcher {
     std::size_t j = 0, memory = 0;
     while (j <= n - m_) {
       if (memory == 0 && !skip(h, n, j)) return kNotFound;
-      std::size_t i = suffix_ > memory ? suffix_ : memory;
-      while (i < m_ && x_[i] == h[i + j]) ++i;
+      std::size_t i = mismatchForward(h + j, suffix_ > memory ? suffix_ : memory);
       if (i >= m_) {
-        i = suffix_ - 1;
-        while (memory < i + 1 && x_[i] == h[i + j]) --i;
+        i = mismatchBackward(h + j, suffix_, memory);
         if (i + 1 < memory + 1) return j;
         j += period_;
         memory = m_ - period_;
@@ -116,11 +158,9 @@ class Searcher {
     std::size_t j = 0;
     while (j <= n - m_) {
       if (!skip(h, n, j)) return kNotFound;
-      std::size_t i = suffix_;
-      while (i < m_ && x_[i] == h[i + j]) ++i;
+      std::size_t i = mismatchForward(h + j, suffix_);
       if (i >= m_) {
-        i = suffix_ - 1;
-        while (i != kNotFound && x_[i] == h[i + j]) --i;
+        i = mismatchBackward(h + j, suffix_, 0);
         if (i == kNotFound) return j;
         j += period_;
       } else {
