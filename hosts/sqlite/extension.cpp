@@ -103,9 +103,9 @@ struct Call {
   bool blobResult = false;  // the first string argument was a BLOB
 };
 
-// Most SQL strings are short: these read and write them in at most two
+// Most SQL strings are short: these read and write them in at most four
 // overlapping words each way, never outside [from, from + size), and call
-// the C library only for long ones.
+// the C library only for longer ones.
 std::uint64_t word(const unsigned char *p) {
   std::uint64_t w = 0;
   std::memcpy(&w, p, sizeof w);
@@ -122,6 +122,10 @@ constexpr bool hasZeroByte(std::uint64_t w) {
 
 bool holdsNul(const unsigned char *p, std::size_t size) {
   if (size >= 8 && size <= 16) return hasZeroByte(word(p)) || hasZeroByte(word(p + size - 8));
+  if (size > 16 && size <= 32) {
+    return hasZeroByte(word(p)) || hasZeroByte(word(p + 8)) || hasZeroByte(word(p + size - 16)) ||
+           hasZeroByte(word(p + size - 8));
+  }
   if (size >= 4 && size < 8) {
     return hasZeroByte(halfWord(p) | (std::uint64_t{0xFFFFFFFF} << 32)) ||
            hasZeroByte(halfWord(p + size - 4) | (std::uint64_t{0xFFFFFFFF} << 32));
@@ -134,6 +138,13 @@ void copyShort(char *to, const unsigned char *from, std::size_t size) {
     const std::uint64_t head = word(from), tail = word(from + size - 8);
     std::memcpy(to, &head, 8);
     std::memcpy(to + size - 8, &tail, 8);
+  } else if (size > 16 && size <= 32) {
+    const std::uint64_t a = word(from), b = word(from + 8), c = word(from + size - 16),
+                        d = word(from + size - 8);
+    std::memcpy(to, &a, 8);
+    std::memcpy(to + 8, &b, 8);
+    std::memcpy(to + size - 16, &c, 8);
+    std::memcpy(to + size - 8, &d, 8);
   } else if (size != 0) {
     std::memcpy(to, from, size);
   }
@@ -352,8 +363,17 @@ struct Result<Layout::text, Longest> {
   bool prepare(const Call &) { return true; }
   void *pointer() { return text.data(); }
   void deliver(const Call &c) {
-    sqlite3_result_text(c.context, text.data(), static_cast<int>(::strnlen(text.data(), Longest)),
-                        SQLITE_TRANSIENT);
+    sqlite3_result_text(c.context, text.data(), static_cast<int>(length()), SQLITE_TRANSIENT);
+  }
+  // A short area is measured inline; a call to strnlen costs more.
+  std::size_t length() const {
+    if constexpr (Longest <= 32) {
+      std::size_t n = 0;
+      while (n < Longest && text[n] != '\0') ++n;
+      return n;
+    } else {
+      return ::strnlen(text.data(), Longest);
+    }
   }
 };
 
