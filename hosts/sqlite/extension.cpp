@@ -366,7 +366,7 @@ struct Result<Layout::text, Longest> {
     sqlite3_result_text(c.context, text.data(), static_cast<int>(length()), SQLITE_TRANSIENT);
   }
   // A short area is measured inline; a call to strnlen costs more.
-  std::size_t length() const {
+  [[nodiscard]] std::size_t length() const {
     if constexpr (Longest <= 32) {
       std::size_t n = 0;
       while (n < Longest && text[n] != '\0') ++n;
