@@ -181,8 +181,8 @@ inline constexpr Routine kRoutines[] = {
   {"CLI_udfRAND1", Built::yes, "RAND", Frame::plain, {}, {real()}, kInnocuous, "", "A pseudo-random double from 0.0 to 1.0."},
   {"CLI_udfRAND2", Built::yes, "RAND", Frame::scratchpad, {int32("seed")}, {real()}, kInnocuous, "", "A pseudo-random double from 0.0 to 1.0; the first call of a statement seeds the generator."},
   // Number text
-  {"CLI_udfCHARTODOUBLE", Built::no, "CHARTODOUBLE", Frame::plain, {text("text")}, {real()}, kPure, "11", "The number that a text spells, as a double."},
-  {"CLI_udfDOUBLETOCHAR", Built::no, "DOUBLETOCHAR", Frame::plain, {real("x")}, {fixedText(24)}, kPure, "", "A double in short scientific notation, 24 bytes filled up with blanks."},
+  {"CLI_udfCHARTODOUBLE", Built::yes, "CHARTODOUBLE", Frame::plain, {text("text")}, {real()}, kPure, "11", "The number that a text spells, as a double."},
+  {"CLI_udfDOUBLETOCHAR", Built::yes, "DOUBLETOCHAR", Frame::plain, {real("x")}, {fixedText(24)}, kPure, "", "A double in short scientific notation, 24 bytes filled up with blanks."},
   // Basic strings
   {"CLI_udfSPACE", Built::yes, "SPACE", Frame::plain, {int32("count")}, {textOf(kText)}, kPure, "01", "A text of count blanks, count from 0 to 4000."},
   {"CLI_udfLCASE1", Built::yes, "LCASE", Frame::plain, {text("string")}, {textOf(kText)}, kPure, "", "The string with each byte lowered by the process's locale."},
@@ -223,7 +223,7 @@ inline constexpr Routine kRoutines[] = {
   {"CLI_udfVEBLOB_CP_LARGE", Built::no, "VEBLOB_CP_LARGE", Frame::plain, {lob("object"), int32("source code page"), int32("target code page"), int32("byte order")}, {lobOf(1000000)}, kPure | kHandlesNull, "", "A record-chain object copied into another code page, up to 1000000 bytes."},
   {"CLI_udfVEBLOB_CP_SMALL", Built::no, "VEBLOB_CP_SMALL", Frame::plain, {lob("object"), int32("source code page"), int32("target code page"), int32("byte order")}, {lobOf(500000)}, kPure | kHandlesNull, "", "A record-chain object copied into another code page, up to 500000 bytes."},
   // Collation
-  {"CLI_udfCOLLATIONNAME", Built::no, "COLLATIONNAME", Frame::plain, {bytes(8, "collation id")}, {textOf(128)}, kPure | kHandlesNull, "", "Name of a collation identifier; INVALID for NULL or an unknown one."},
+  {"CLI_udfCOLLATIONNAME", Built::yes, "COLLATIONNAME", Frame::plain, {bytes(8, "collation id")}, {textOf(128)}, kPure | kHandlesNull, "", "Name of a collation identifier; INVALID for NULL or an unknown one."},
 };
 // clang-format on
 

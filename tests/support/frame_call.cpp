@@ -68,7 +68,8 @@ std::size_t widthOf(Value::Layout layout) {
 }
 
 bool isNumber(Value::Layout layout) {
-  return layout != Value::Layout::text && layout != Value::Layout::lob;
+  return layout != Value::Layout::text && layout != Value::Layout::lob &&
+         layout != Value::Layout::fixed;
 }
 
 // A number is its bytes in the machine's order; terminated text its bytes
@@ -85,6 +86,7 @@ std::vector<unsigned char> layOut(const Value &v) {
     return {raw, raw + widthOf(v.layout)};
   }
   std::vector<unsigned char> out(v.bytes.begin(), v.bytes.end());
+  if (v.layout == Value::Layout::fixed) return out;
   if (v.layout == Value::Layout::text) {
     out.push_back(0);
   } else {
@@ -119,6 +121,8 @@ std::int64_t numberIn(const unsigned char *area, Value::Layout layout) {
 
 Outcome resultIn(const char *name, const std::vector<unsigned char> &out, std::size_t area,
                  const Value &result, bool succeeded);
+Outcome callFrame(const char *name, const std::vector<Value> &inputs, const Value &result,
+                  bool nullable);
 
 }  // namespace
 
@@ -137,6 +141,17 @@ void PrintTo(const Outcome &o, std::ostream *os) {
 }
 
 Outcome call(const char *name, const std::vector<Value> &inputs, const Value &result) {
+  return callFrame(name, inputs, result, false);
+}
+
+Outcome callNullable(const char *name, const std::vector<Value> &inputs, const Value &result) {
+  return callFrame(name, inputs, result, true);
+}
+
+namespace {
+
+Outcome callFrame(const char *name, const std::vector<Value> &inputs, const Value &result,
+                  bool nullable) {
   void *fn = exportAddress(name);
   EXPECT_NE(fn, nullptr) << name << " is not exported";
   if (fn == nullptr) return fails("no export");
@@ -145,15 +160,19 @@ Outcome call(const char *name, const std::vector<Value> &inputs, const Value &re
   in.reserve(inputs.size());
   for (const Value &v : inputs) in.push_back(layOut(v));
 
-  const std::size_t area = isNumber(result.layout)                ? widthOf(result.layout)
-                           : result.layout == Value::Layout::text ? result.size
-                                                                  : 4 + std::size_t{result.size};
+  const std::size_t area = isNumber(result.layout)               ? widthOf(result.layout)
+                           : result.layout == Value::Layout::lob ? 4 + std::size_t{result.size}
+                                                                 : result.size;
   std::vector<unsigned char> out(area + kCanaryBytes, kCanary);
   std::fill_n(out.begin(), area, kUnwritten);
   if (result.layout == Value::Layout::lob) std::memcpy(out.data(), &result.size, 4);
   const std::vector<unsigned char> before = out;
 
   std::vector<std::int16_t> indicators(inputs.size() + 1, kIndicator);
+  if (nullable) {
+    for (std::size_t i = 0; i < inputs.size(); ++i) indicators[i] = inputs[i].null ? -1 : 0;
+  }
+  const std::vector<std::int16_t> indicatorsBefore = indicators;
   char sqlstate[6];
   char message[kMessageBytes];
   std::memset(sqlstate, 'S', sizeof sqlstate);
@@ -173,9 +192,10 @@ Outcome call(const char *name, const std::vector<Value> &inputs, const Value &re
   EXPECT_TRUE(std::all_of(out.begin() + static_cast<std::ptrdiff_t>(area), out.end(),
                           [](unsigned char b) { return b == kCanary; }))
       << name << " wrote past its result area";
-  EXPECT_TRUE(std::all_of(indicators.begin(), indicators.end(),
-                          [](std::int16_t i) { return i == kIndicator; }))
+  EXPECT_TRUE(std::equal(indicators.begin(), indicators.end() - (nullable ? 1 : 0),
+                         indicatorsBefore.begin()))
       << name << " touched a null indicator";
+  const int resultIndicator = nullable ? indicators.back() : 0;
 
   if (sqlstate[0] != 'S') {
     EXPECT_EQ(std::string(sqlstate, 6), std::string("38552\0", 6)) << name;
@@ -187,8 +207,13 @@ Outcome call(const char *name, const std::vector<Value> &inputs, const Value &re
     EXPECT_TRUE(std::all_of(message + 10, message + kMessageBytes, [](char c) { return c == 'M'; }))
         << name << " wrote past the message";
     // A failure may leave what the routine stored before its test.
-    if (out == before) return fails(std::string(message + 7, 2));
+    if (out == before) {
+      Outcome failed = fails(std::string(message + 7, 2));
+      failed.indicator = resultIndicator;
+      return failed;
+    }
     Outcome failed = resultIn(name, out, area, result, false);
+    failed.indicator = resultIndicator;
     failed.error = std::string(message + 7, 2);
     failed.stored = true;
     return failed;
@@ -196,8 +221,12 @@ Outcome call(const char *name, const std::vector<Value> &inputs, const Value &re
   EXPECT_TRUE(std::all_of(sqlstate, sqlstate + 6, [](char c) { return c == 'S'; })) << name;
   EXPECT_TRUE(std::all_of(message, message + kMessageBytes, [](char c) { return c == 'M'; }))
       << name << " wrote a message on success";
-  return resultIn(name, out, area, result, true);
+  Outcome got = resultIn(name, out, area, result, true);
+  got.indicator = resultIndicator;
+  return got;
 }
+
+}  // namespace
 
 namespace {
 
@@ -220,6 +249,8 @@ Outcome resultIn(const char *name, const std::vector<unsigned char> &out, std::s
       EXPECT_NE(end, out.begin() + static_cast<std::ptrdiff_t>(area)) << name << ": no terminator";
       return ok(std::string(out.begin(), end));
     }
+    case Value::Layout::fixed:
+      return ok(std::string(out.begin(), out.begin() + static_cast<std::ptrdiff_t>(area)));
     case Value::Layout::lob: {
       std::uint32_t n = 0;
       std::memcpy(&n, out.data(), 4);

@@ -17,10 +17,11 @@ namespace orv::test {
 
 // An input or the shape of a result, in one of the frame's layouts.
 struct Value {
-  enum class Layout { int16, int32, int64, real, text, lob } layout;
+  enum class Layout { int16, int32, int64, real, text, lob, fixed } layout;
   std::int64_t number = 0;  // an integer, or the bits of a double
   std::string bytes;        // text without its terminator, or CLI_udfLob data
-  std::uint32_t size = 0;   // result area: text area bytes, or CLI_udfLob capacity
+  std::uint32_t size = 0;   // result area: text area bytes, CLI_udfLob capacity, fixed bytes
+  bool null = false;        // for routines that read their input indicators
 };
 
 inline std::uint64_t bitsOf(double d) { return std::bit_cast<std::uint64_t>(d); }
@@ -33,6 +34,13 @@ inline Value f64(double v) {
 }
 inline Value text(std::string s) { return {Value::Layout::text, 0, std::move(s), 0}; }
 inline Value lob(std::string s) { return {Value::Layout::lob, 0, std::move(s), 0}; }
+// Fixed bytes as an input; as a result, an area of exactly `size` bytes.
+inline Value fixed(std::string s) { return {Value::Layout::fixed, 0, std::move(s), 0}; }
+inline Value fixedArea(std::uint32_t size) { return {Value::Layout::fixed, 0, {}, size}; }
+inline Value nullOf(Value v) {
+  v.null = true;
+  return v;
+}
 // Results: a terminated-text area of `area` bytes, a CLI_udfLob area whose
 // length word holds `capacity`, a number of the given layout.
 inline Value textArea(std::uint32_t area = 4001) { return {Value::Layout::text, 0, {}, area}; }
@@ -50,6 +58,7 @@ struct Outcome {
   std::int64_t number = 0;
   bool stored = false;  // a failure that left a value in the result area
   bool real = false;    // `number` holds the bits of a double
+  int indicator = 0;    // the result indicator, from callNullable only
   bool operator==(const Outcome &) const = default;
 };
 
@@ -71,8 +80,14 @@ inline Outcome failsLeaving(std::string code, std::string bytes) {
 
 void PrintTo(const Outcome &o, std::ostream *os);
 
-// Calls the export `name` with one result.
+// Calls the export `name` with one result.  Its null indicators must stay
+// as they were.
 Outcome call(const char *name, const std::vector<Value> &inputs, const Value &result);
+
+// The same for a routine that handles NULL itself: input indicators are -1
+// for inputs made with nullOf and 0 otherwise, and the result indicator
+// that the routine leaves (0x5A5A if it leaves it alone) is in `indicator`.
+Outcome callNullable(const char *name, const std::vector<Value> &inputs, const Value &result);
 
 // The address of an export of the built library, or null.
 void *exportAddress(const char *name);

@@ -1,0 +1,123 @@
+#include "codepages.hpp"
+
+#include <array>
+#include <cstdio>
+#include <utility>
+
+namespace orv::standin {
+namespace {
+
+// Code pages whose ICU name is not "ibm-<number>".
+constexpr std::pair<std::uint32_t, const char *> kNames[] = {
+    {1208, "UTF-8"},
+    {1200, "UTF-16BE"},
+    {1202, "UTF-16LE"},
+    {13488, "UTF-16BE"},
+    {13490, "UTF-16LE"},
+    {17584, "UTF-16BE"},
+    {17586, "UTF-16LE"},
+    {1204, "UTF-16"},
+    {1232, "UTF-32BE"},
+    {1234, "UTF-32LE"},
+    {1236, "UTF-32"},
+    {819, "ISO-8859-1"},
+    {1252, "windows-1252"},
+    {954, "EUC-JP"},
+    {932, "ibm-943_P15A-2003"},
+    {943, "ibm-943_P15A-2003"},
+    {1392, "GB18030"},
+    {5488, "GB18030"},
+    {950, "windows-950"},
+    {1394, "ibm-943_P15A-2003"},
+    {5039, "ibm-943_P15A-2003"},
+};
+
+struct Open {
+  std::uint32_t codePage = 0;
+  int role = 0;
+  UConverter *converter = nullptr;
+};
+
+// A few converters per thread, opened once: ICU converters are not to be
+// shared between threads.
+class Cache {
+ public:
+  ~Cache() {
+    for (Open &o : slots_) {
+      if (o.converter != nullptr) ucnv_close(o.converter);
+    }
+  }
+  UConverter *get(std::uint32_t codePage, int role) {
+    for (Open &o : slots_) {
+      if (o.converter != nullptr && o.codePage == codePage && o.role == role) return o.converter;
+    }
+    UConverter *c = open(codePage);
+    if (c == nullptr) return nullptr;
+    Open &slot = slots_[next_++ % slots_.size()];
+    if (slot.converter != nullptr) ucnv_close(slot.converter);
+    slot = {codePage, role, c};
+    return c;
+  }
+
+ private:
+  static UConverter *open(std::uint32_t codePage) {
+    const char *name = nullptr;
+    for (const auto &[number, icuName] : kNames) {
+      if (number == codePage) name = icuName;
+    }
+    char ibm[24];
+    if (name == nullptr) {
+      static_cast<void>(std::snprintf(ibm, sizeof ibm, "ibm-%u", codePage));
+      name = ibm;
+    }
+    UErrorCode status = U_ZERO_ERROR;
+    UConverter *c = ucnv_open(name, &status);
+    if (U_FAILURE(status)) return nullptr;
+    // Refuse bytes that are not valid in the source, and characters that
+    // the target cannot hold, rather than substituting them.
+    ucnv_setToUCallBack(c, UCNV_TO_U_CALLBACK_STOP, nullptr, nullptr, nullptr, &status);
+    ucnv_setFromUCallBack(c, UCNV_FROM_U_CALLBACK_STOP, nullptr, nullptr, nullptr, &status);
+    return c;
+  }
+
+  std::array<Open, 8> slots_{};
+  std::size_t next_ = 0;
+};
+
+}  // namespace
+
+UConverter *converterFor(std::uint32_t codePage, int role) {
+  thread_local Cache cache;
+  return cache.get(codePage, role);
+}
+
+EncodingClass encodingClassOf(std::uint32_t codePage) {
+  UConverter *c = converterFor(codePage);
+  if (c == nullptr) return kUnknown;
+  switch (ucnv_getType(c)) {
+    case UCNV_UTF8:
+      return kUtf8;
+    case UCNV_UTF16_BigEndian:
+    case UCNV_UTF16_LittleEndian:
+    case UCNV_UTF16:
+      return kUtf16;
+    case UCNV_UTF32_BigEndian:
+    case UCNV_UTF32_LittleEndian:
+    case UCNV_UTF32:
+      return kUtf32;
+    default:
+      break;
+  }
+  if (ucnv_getMaxCharSize(c) > 1) return kMultiByte;
+  // One byte a character: EBCDIC when the letter A is 0xC1.
+  const UChar a = u'A';
+  char out[4];
+  UErrorCode status = U_ZERO_ERROR;
+  ucnv_reset(c);
+  const int32_t n = ucnv_fromUChars(c, out, sizeof out, &a, 1, &status);
+  return U_SUCCESS(status) && n == 1 && static_cast<unsigned char>(out[0]) == 0xC1
+             ? kSingleByteEbcdic
+             : kSingleByte;
+}
+
+}  // namespace orv::standin

@@ -1,0 +1,91 @@
+// Routines that call the engine's services, against the stand-ins: number
+// text, collation names, day and month names.
+#include <gtest/gtest.h>
+
+#include <cmath>
+#include <cstdint>
+#include <limits>
+#include <random>
+#include <string>
+
+#include "support/frame_call.hpp"
+
+namespace {
+
+using namespace orv::test;
+
+Outcome number(double d) { return okReal(d); }
+std::string padded(const std::string &s) { return s + std::string(24 - s.size(), ' '); }
+
+TEST(CharToDouble, ReadsDecimalTextAfterCuttingTrailingSpace) {
+  const std::pair<const char *, Outcome> cases[] = {
+      {"1.5", number(1.5)},        {"1.5 \t\n\r\v\f", number(1.5)},
+      {"-2.25e2", number(-225.0)}, {"+7", number(7.0)},
+      {"-0", number(-0.0)},        {".5", number(0.5)},
+      {"5.", number(5.0)},         {"1e-400", number(0.0)},
+      {"", fails("11")},           {" \t ", fails("11")},
+      {" 1", fails("11")},         {"1e400", fails("11")},
+      {"1.5x", fails("11")},       {"e5", fails("11")},
+      {"1e", fails("11")},         {"0x10", fails("11")},
+      {"nan", fails("11")},        {"1 5", fails("11")},
+  };
+  for (const auto &[text, want] : cases) {
+    EXPECT_EQ(call("CLI_udfCHARTODOUBLE", {orv::test::text(text)}, numberArea(Value::Layout::real)),
+              want)
+        << "'" << text << "'";
+  }
+}
+
+TEST(DoubleToChar, WritesTheShortNotationIn24Bytes) {
+  const std::pair<double, const char *> cases[] = {
+      {1.5, "1.5E0"},
+      {1.0, "1.0E0"},
+      {-1234.5, "-1.2345E3"},
+      {0.001, "1.0E-3"},
+      {1e100, "1.0E100"},
+      {1.05e10, "1.05E10"},
+      {0.0, "0E0"},
+      {-0.0, "0E0"},
+      {-1.23456789012345e-100, "-1.23456789012345E-100"},
+      {0.1, "1.0E-1"},
+      {123456789012345678.0, "1.23456789012346E17"},
+      {5e-324, "4.94065645841247E-324"},
+  };
+  for (const auto &[x, want] : cases) {
+    EXPECT_EQ(call("CLI_udfDOUBLETOCHAR", {f64(x)}, fixedArea(24)), ok(padded(want))) << x;
+  }
+}
+
+// Reading back what DOUBLETOCHAR writes gives the double rounded to 15
+// significant digits, for doubles of every magnitude.
+TEST(DoubleToChar, RoundTripsThroughCharToDoubleAt15Digits) {
+  std::mt19937_64 rng(99);
+  for (int i = 0; i < 3000; ++i) {
+    double x = 0.0;
+    do {
+      x = std::bit_cast<double>(rng());
+    } while (!std::isfinite(x) || x == 0.0);
+    const Outcome shortText = call("CLI_udfDOUBLETOCHAR", {f64(x)}, fixedArea(24));
+    const std::string trimmed = shortText.bytes.substr(0, shortText.bytes.find(' '));
+    char expected[40];
+    std::snprintf(expected, sizeof expected, "%.14E", x);
+    EXPECT_EQ(call("CLI_udfCHARTODOUBLE", {text(trimmed)}, numberArea(Value::Layout::real)),
+              number(std::strtod(expected, nullptr)))
+        << trimmed;
+  }
+}
+
+TEST(CollationName, NamesKnownIdentifiersAndGivesInvalidOtherwise) {
+  const Value area = textArea(129);
+  const auto named = [&](const Value &id) {
+    return callNullable("CLI_udfCOLLATIONNAME", {id}, area);
+  };
+  EXPECT_EQ(named(fixed(std::string(8, '\0'))), ok("IDENTITY"));
+  EXPECT_EQ(named(fixed(std::string(8, '\xFF'))), ok("INVALID"));
+  EXPECT_EQ(named(nullOf(fixed(std::string(8, '\0')))), ok("INVALID"));
+  const Outcome icu = named(fixed(std::string("\x01\x00\x00\x02\0\0\0\0", 8)));
+  EXPECT_TRUE(icu.bytes.starts_with("ICU_") && icu.bytes.ends_with("_S2")) << icu.bytes;
+  EXPECT_EQ(named(fixed(std::string("\x01\xFF\xFF\x02\0\0\0\0", 8))), ok("INVALID"));
+}
+
+}  // namespace
