@@ -4,6 +4,8 @@
 
 #include <cmath>
 #include <cstdint>
+#include <cstdlib>
+#include <cstring>
 #include <limits>
 #include <random>
 #include <string>
@@ -86,6 +88,73 @@ TEST(CollationName, NamesKnownIdentifiersAndGivesInvalidOtherwise) {
   const Outcome icu = named(fixed(std::string("\x01\x00\x00\x02\0\0\0\0", 8)));
   EXPECT_TRUE(icu.bytes.starts_with("ICU_") && icu.bytes.ends_with("_S2")) << icu.bytes;
   EXPECT_EQ(named(fixed(std::string("\x01\xFF\xFF\x02\0\0\0\0", 8))), ok("INVALID"));
+}
+
+// ---- DAYNAME and MONTHNAME ------------------------------------------------
+
+// A database information block whose code page is `codePage`.
+struct DatabaseInfo {
+  explicit DatabaseInfo(std::uint32_t codePage) { std::memcpy(block + 268, &codePage, 4); }
+  unsigned char block[512] = {};
+};
+
+class Names : public ::testing::Test {
+ protected:
+  void SetUp() override { setenv("ORVENGINE_LOCALE", "en_US", 1); }
+  void TearDown() override { unsetenv("ORVENGINE_LOCALE"); }
+  Outcome name(const char *routine, const char *date, void *dbinfo) {
+    return call(routine, {text(date)}, textArea(102), {dbinfo});
+  }
+  DatabaseInfo utf8{1208};
+};
+
+TEST_F(Names, GiveTheServersNamesForEachReader) {
+  const struct {
+    const char *routine, *date;
+    Outcome want;
+  } cases[] = {
+      {"CLI_udfDAYNAME1", "2001-01-07", ok("Sunday")},
+      {"CLI_udfDAYNAME2", "2000-12-31-99.99.99", ok("Sunday")},
+      {"CLI_udfDAYNAME1", "2001-01-01 12:00:00", ok("Monday")},
+      {"CLI_udfDAYNAME2", "0001-01-01", ok("Monday")},
+      {"CLI_udfDAYNAME1", "9999-12-31", ok("Friday")},
+      {"CLI_udfMONTHNAME1", "2001-01-31 junk", ok("January")},
+      {"CLI_udfMONTHNAME2", "2000-02-29", ok("February")},
+      {"CLI_udfMONTHNAME2", "2001-12-01", ok("December")},
+      {"CLI_udfDAYNAME1", "2001-03-05 junk", fails("06")},
+      {"CLI_udfMONTHNAME2", "2001-03-05 junk", fails("06")},
+      {"CLI_udfDAYNAME2", "2001-13-05", fails("04")},
+      {"CLI_udfMONTHNAME1", "2001-02-29", fails("04")},
+  };
+  for (const auto &c : cases) {
+    EXPECT_EQ(name(c.routine, c.date, utf8.block), c.want) << c.routine << " " << c.date;
+  }
+}
+
+TEST_F(Names, ValidateTheDateButFetchNothingWithoutTheBlock) {
+  EXPECT_EQ(name("CLI_udfDAYNAME1", "2001-13-05", nullptr), fails("04"));
+  using Export = void (*)(char *, char *, std::int16_t *, std::int16_t *, char *, const char *,
+                          const char *, char *, void *);
+  const auto fn = reinterpret_cast<Export>(exportAddress("CLI_udfMONTHNAME2"));
+  ASSERT_NE(fn, nullptr);
+  char date[] = "2001-01-05";
+  char result[102];
+  std::memset(result, 'R', sizeof result);
+  std::int16_t ind[2] = {7, 7};
+  char status[6 + 70] = {};
+  fn(date, result, &ind[0], &ind[1], status, "", "", status + 6, nullptr);
+  EXPECT_EQ(std::string(result, sizeof result), std::string(sizeof result, 'R'));
+  EXPECT_EQ(status[0], '\0');
+}
+
+TEST_F(Names, ConvertIntoTheDatabasesCodePage) {
+  setenv("ORVENGINE_LOCALE", "de_DE", 1);
+  DatabaseInfo latin1{819}, ebcdic{37}, unknown{70000};
+  EXPECT_EQ(name("CLI_udfMONTHNAME1", "2001-03-01", utf8.block), ok("M\xC3\xA4rz"));
+  EXPECT_EQ(name("CLI_udfMONTHNAME1", "2001-03-01", latin1.block), ok("M\xE4rz"));
+  EXPECT_EQ(name("CLI_udfDAYNAME2", "2001-01-07", ebcdic.block),
+            ok("\xE2\x96\x95\x95\xA3\x81\x87"));
+  EXPECT_EQ(name("CLI_udfDAYNAME2", "2001-01-07", unknown.block).error, "03");
 }
 
 }  // namespace

@@ -126,10 +126,10 @@ inline constexpr Routine kRoutines[] = {
   {"CLI_udfDAYOFWEEK_ISO1", Built::yes, "DAYOFWEEK_ISO", Frame::plain, {text("date")}, {int32()}, kPure, "04 06", "Day of the week, Monday = 1, of a date or timestamp."},
   {"CLI_udfDAYOFWEEK_ISO2", Built::yes, "DAYOFWEEK_ISO", Frame::plain, {text("date")}, {int32()}, kPure | kNarrowerForm, "04", "Day of the week, Monday = 1, of the date at the head of the text."},
   // Names in a date
-  {"CLI_udfDAYNAME1", Built::no, "DAYNAME", Frame::dbinfo, {text("date")}, {textOf(kName)}, kInnocuous, "03 04 06", "Name of the day of the week of a date or timestamp, in the server's language."},
-  {"CLI_udfDAYNAME2", Built::no, "DAYNAME", Frame::dbinfo, {text("date")}, {textOf(kName)}, kInnocuous | kNarrowerForm, "03 04", "Name of the day of the week of the date at the head of the text."},
-  {"CLI_udfMONTHNAME1", Built::no, "MONTHNAME", Frame::dbinfo, {text("date")}, {textOf(kName)}, kInnocuous | kNarrowerForm, "03 04", "Name of the month of the date at the head of the text, in the server's language."},
-  {"CLI_udfMONTHNAME2", Built::no, "MONTHNAME", Frame::dbinfo, {text("date")}, {textOf(kName)}, kInnocuous, "03 04 06", "Name of the month of a date or timestamp."},
+  {"CLI_udfDAYNAME1", Built::yes, "DAYNAME", Frame::dbinfo, {text("date")}, {textOf(kName)}, kInnocuous, "03 04 06", "Name of the day of the week of a date or timestamp, in the server's language."},
+  {"CLI_udfDAYNAME2", Built::yes, "DAYNAME", Frame::dbinfo, {text("date")}, {textOf(kName)}, kInnocuous | kNarrowerForm, "03 04", "Name of the day of the week of the date at the head of the text."},
+  {"CLI_udfMONTHNAME1", Built::yes, "MONTHNAME", Frame::dbinfo, {text("date")}, {textOf(kName)}, kInnocuous | kNarrowerForm, "03 04", "Name of the month of the date at the head of the text, in the server's language."},
+  {"CLI_udfMONTHNAME2", Built::yes, "MONTHNAME", Frame::dbinfo, {text("date")}, {textOf(kName)}, kInnocuous, "03 04 06", "Name of the month of a date or timestamp."},
   // Integer and sign
   {"CLI_udfABS1", Built::yes, "ABS", Frame::plain, {real("x")}, {real()}, kPure, "", "Absolute value of a double: its sign bit cleared."},
   {"CLI_udfABS2", Built::yes, "ABS", Frame::plain, {int32("x")}, {int32()}, kPure, "", "Absolute value of a 32-bit integer."},

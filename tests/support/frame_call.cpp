@@ -37,23 +37,19 @@ bool invoke(void *fn, void *const *args, std::index_sequence<Is...>) {
   return true;
 }
 
-// Calls `fn` with the K = 2N + 2M + 4 arguments of a plain frame.
+// Calls `fn` with as many arguments as `args` holds, 6 + one of Ks.
+template <std::size_t... Ks>
+bool invokeAny(void *fn, const std::vector<void *> &args, std::index_sequence<Ks...>) {
+  const bool known =
+      ((args.size() == Ks + 6 && invoke(fn, args.data(), std::make_index_sequence<Ks + 6>{})) ||
+       ...);
+  if (!known) ADD_FAILURE() << "no frame of " << args.size() << " arguments";
+  return known;
+}
+
+// Calls `fn` with the 6 to 15 arguments of a frame with its extras.
 bool invokeFrame(void *fn, const std::vector<void *> &args) {
-  switch (args.size()) {
-    case 6:
-      return invoke(fn, args.data(), std::make_index_sequence<6>{});
-    case 8:
-      return invoke(fn, args.data(), std::make_index_sequence<8>{});
-    case 10:
-      return invoke(fn, args.data(), std::make_index_sequence<10>{});
-    case 12:
-      return invoke(fn, args.data(), std::make_index_sequence<12>{});
-    case 14:
-      return invoke(fn, args.data(), std::make_index_sequence<14>{});
-    default:
-      ADD_FAILURE() << "no frame of " << args.size() << " arguments";
-      return false;
-  }
+  return invokeAny(fn, args, std::make_index_sequence<10>{});
 }
 
 std::size_t widthOf(Value::Layout layout) {
@@ -122,7 +118,7 @@ std::int64_t numberIn(const unsigned char *area, Value::Layout layout) {
 Outcome resultIn(const char *name, const std::vector<unsigned char> &out, std::size_t area,
                  const Value &result, bool succeeded);
 Outcome callFrame(const char *name, const std::vector<Value> &inputs, const Value &result,
-                  bool nullable);
+                  bool nullable, const std::vector<void *> &extras);
 
 }  // namespace
 
@@ -140,18 +136,19 @@ void PrintTo(const Outcome &o, std::ostream *os) {
   if (o.stored) *os << ", stored";
 }
 
-Outcome call(const char *name, const std::vector<Value> &inputs, const Value &result) {
-  return callFrame(name, inputs, result, false);
+Outcome call(const char *name, const std::vector<Value> &inputs, const Value &result,
+             const std::vector<void *> &extras) {
+  return callFrame(name, inputs, result, false, extras);
 }
 
 Outcome callNullable(const char *name, const std::vector<Value> &inputs, const Value &result) {
-  return callFrame(name, inputs, result, true);
+  return callFrame(name, inputs, result, true, {});
 }
 
 namespace {
 
 Outcome callFrame(const char *name, const std::vector<Value> &inputs, const Value &result,
-                  bool nullable) {
+                  bool nullable, const std::vector<void *> &extras) {
   void *fn = exportAddress(name);
   EXPECT_NE(fn, nullptr) << name << " is not exported";
   if (fn == nullptr) return fails("no export");
@@ -187,6 +184,7 @@ Outcome callFrame(const char *name, const std::vector<Value> &inputs, const Valu
   args.push_back(const_cast<char *>("FUNCTION"));
   args.push_back(const_cast<char *>("SPECIFIC"));
   args.push_back(message);
+  args.insert(args.end(), extras.begin(), extras.end());
   if (!invokeFrame(fn, args)) return fails("no frame");
 
   EXPECT_TRUE(std::all_of(out.begin() + static_cast<std::ptrdiff_t>(area), out.end(),

@@ -82,7 +82,9 @@ void PrintTo(const Outcome &o, std::ostream *os);
 
 // Calls the export `name` with one result.  Its null indicators must stay
 // as they were.
-Outcome call(const char *name, const std::vector<Value> &inputs, const Value &result);
+// `extras` are the frame's extra arguments, passed behind the message.
+Outcome call(const char *name, const std::vector<Value> &inputs, const Value &result,
+             const std::vector<void *> &extras = {});
 
 // The same for a routine that handles NULL itself: input indicators are -1
 // for inputs made with nullOf and 0 otherwise, and the result indicator
