@@ -134,6 +134,13 @@ TEST_F(SqliteHost, CallsDateNumberAndSearchRoutines) {
       {"SELECT sysfun_soundex('Ashcraft') || length(sysfun_replace(printf('%5000c', 'a'), 'a', "
        "'bb'))",
        "A2265001"},
+      {"SELECT DAYNAME('2001-01-07') || MONTHNAME('2001-03-01') || sysfun_dayname2('2001-01-07 x')",
+       "SundayMarchSunday"},
+      {"SELECT CHARTODOUBLE('1.5e3 ') || '|' || DOUBLETOCHAR(-1234.5) || '|'",
+       "1500.0|-1.2345E3               |"},
+      {"SELECT COLLATIONNAME(zeroblob(8)) || COLLATIONNAME(NULL) || COLLATIONNAME(x'FF')",
+       "error: COLLATIONNAME: argument 1 (collation id) must be exactly 8 bytes"},
+      {"SELECT COLLATIONNAME(zeroblob(8)) || COLLATIONNAME(NULL)", "IDENTITYINVALID"},
       {"SELECT sysfun_mod(1, 0.5)",
        "error: MOD: argument 2 (y) is 0.5, not a whole number in the 64-bit range of CLI_udfMOD3"},
   };

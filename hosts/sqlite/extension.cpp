@@ -432,6 +432,16 @@ unsigned char *statementScratchpad(sqlite3_context *context) {
   return static_cast<unsigned char *>(sqlite3_get_auxdata(context, 0));
 }
 
+// The database information block that the extension hands to the routines
+// that read one: SQLite text is UTF-8, so the database's code page is 1208.
+// The routines only read it.
+alignas(8) std::array<unsigned char, 512> kDatabaseInfo = [] {
+  std::array<unsigned char, 512> block{};
+  const std::uint32_t utf8 = 1208;
+  std::memcpy(block.data() + CLI_DBINFO_CODEPAGE_OFFSET, &utf8, sizeof utf8);
+  return block;
+}();
+
 // Calls an export that takes sizeof...(Is) pointers.  Every argument of the
 // frame is a pointer, so one pointer type serves every signature.
 template <std::size_t... Is>
@@ -470,14 +480,16 @@ void callRow(const Call &c, std::index_sequence<Is...>) {
                   const_cast<char *>(r.sqlName),
                   const_cast<char *>(r.symbol),
                   message};
-  if constexpr (r.frame == Frame::scratchpad) {
-    unsigned char *scratchpad = statementScratchpad(c.context);
-    if (scratchpad == nullptr) return sqlite3_result_error_nomem(c.context);
-    void *withScratchpad[std::size(args) + 1];
-    std::copy(std::begin(args), std::end(args), withScratchpad);
-    withScratchpad[std::size(args)] = scratchpad;
-    invoke(c.connection.exports[Row], withScratchpad,
-           std::make_index_sequence<std::size(withScratchpad)>{});
+  if constexpr (r.frame == Frame::scratchpad || r.frame == Frame::dbinfo) {
+    void *extra = kDatabaseInfo.data();
+    if constexpr (r.frame == Frame::scratchpad) {
+      extra = statementScratchpad(c.context);
+      if (extra == nullptr) return sqlite3_result_error_nomem(c.context);
+    }
+    void *withExtra[std::size(args) + 1];
+    std::copy(std::begin(args), std::end(args), withExtra);
+    withExtra[std::size(args)] = extra;
+    invoke(c.connection.exports[Row], withExtra, std::make_index_sequence<std::size(withExtra)>{});
   } else {
     invoke(c.connection.exports[Row], args, std::make_index_sequence<std::size(args)>{});
   }

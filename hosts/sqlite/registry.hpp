@@ -33,8 +33,9 @@ using cli::catalogue::Routine;
 // Frames that the host knows how to call.
 constexpr bool hostable(const Routine &r) {
   // A scratchpad is kept as auxiliary data of the first argument.
-  const bool frameKnown =
-      r.frame == Frame::plain || (r.frame == Frame::scratchpad && inputCount(r) >= 1);
+  // A database information block is the extension's own, for UTF-8.
+  const bool frameKnown = r.frame == Frame::plain || r.frame == Frame::dbinfo ||
+                          (r.frame == Frame::scratchpad && inputCount(r) >= 1);
   return r.built == Built::yes && frameKnown && resultCount(r) == 1;
 }
 
