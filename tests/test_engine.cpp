@@ -9,6 +9,7 @@
 #include <limits>
 #include <random>
 #include <string>
+#include <vector>
 
 #include "support/frame_call.hpp"
 
@@ -155,6 +156,100 @@ TEST_F(Names, ConvertIntoTheDatabasesCodePage) {
   EXPECT_EQ(name("CLI_udfDAYNAME2", "2001-01-07", ebcdic.block),
             ok("\xE2\x96\x95\x95\xA3\x81\x87"));
   EXPECT_EQ(name("CLI_udfDAYNAME2", "2001-01-07", unknown.block).error, "03");
+}
+
+// ---- VEBLOB_CP ------------------------------------------------------------
+
+using Veblob = void (*)(const unsigned char *, const std::int32_t *, const std::int32_t *,
+                        const std::int32_t *, unsigned char *, const std::int16_t *, std::int16_t *,
+                        std::int16_t *, std::int16_t *, std::int16_t *, char *, const char *,
+                        const char *, char *);
+
+struct Copied {
+  std::string data;     // the result's data, by its length word, when it was set
+  std::string status;   // five SQLSTATE characters, empty when none
+  std::string message;  // eight characters
+  int indicator = 0x5A5A;
+};
+
+// A record: head, tag, length field in the given byte order, string.
+std::string record(unsigned char tag, const std::string &text, bool bigEndian = false) {
+  std::string r(22, 'H');
+  r += static_cast<char>(tag);
+  const std::size_t width = tag == 0x4B ? 1 : tag == 0x8B ? 2 : 4;
+  for (std::size_t i = 0; i < width; ++i) {
+    const std::size_t shift = 8 * (bigEndian ? width - 1 - i : i);
+    r += static_cast<char>((text.size() >> shift) & 0xFF);
+  }
+  return r + text;
+}
+
+Copied copy(const char *routine, const std::string &object, std::int32_t from, std::int32_t to,
+            std::int32_t order, bool null = false) {
+  const auto fn = reinterpret_cast<Veblob>(exportAddress(routine));
+  EXPECT_NE(fn, nullptr);
+  std::vector<unsigned char> in(4 + object.size());
+  const auto n = static_cast<std::uint32_t>(object.size());
+  std::memcpy(in.data(), &n, 4);
+  std::memcpy(in.data() + 4, object.data(), object.size());
+  std::vector<unsigned char> out(4 + 1000000 + 64, 0xCD);
+  std::int16_t ind[5] = {static_cast<std::int16_t>(null ? -1 : 0), 0, 0, 0, 0x5A5A};
+  char sqlstate[6] = {}, message[16] = {};
+  fn(in.data(), &from, &to, &order, out.data(), &ind[0], &ind[1], &ind[2], &ind[3], &ind[4],
+     sqlstate, "", "", message);
+  Copied c;
+  c.indicator = ind[4];
+  if (sqlstate[0] != '\0') {
+    c.status.assign(sqlstate, 5);
+    c.message.assign(message, 8);
+    return c;
+  }
+  std::uint32_t length = 0;
+  std::memcpy(&length, out.data(), 4);
+  if (c.indicator == 1) c.data.assign(reinterpret_cast<char *>(out.data()) + 4, length);
+  return c;
+}
+
+TEST(VeblobCopy, ConvertsEachStringAndRewritesItsLength) {
+  const char *large = "CLI_udfVEBLOB_CP_LARGE";
+  EXPECT_EQ(copy(large, "", 819, 1208, 0, true).indicator, -1);
+  EXPECT_EQ(copy(large, std::string(22, 'H'), 819, 1208, 0).indicator, 1);
+  EXPECT_EQ(copy(large, std::string(22, 'H'), 819, 1208, 0).data, "");
+  EXPECT_EQ(copy(large, record(0x4B, ""), 819, 1208, 0).data, record(0x4B, ""));
+  EXPECT_EQ(copy(large, record(0x4B, "M\xE4rz"), 819, 1208, 0).data, record(0x4B, "M\xC3\xA4rz"));
+  // Two records, 16- and 32-bit fields, the second in the object's order.
+  const std::string two = record(0x8B, "\xE4\xE4", true) + record(0xCB, "\xFC", true);
+  EXPECT_EQ(copy(large, two, 819, 1208, -1).data,
+            record(0x8B, "\xC3\xA4\xC3\xA4", true) + record(0xCB, "\xC3\xBC", true));
+  EXPECT_EQ(copy(large, two, 819, 819, 1).data, two);  // 1 swaps as -1 does
+  // Bytes behind the last whole record are dropped.
+  EXPECT_EQ(copy(large, record(0x4B, "ab") + "HHHH", 1208, 1208, 0).data, record(0x4B, "ab"));
+  EXPECT_EQ(copy(large, record(0x4B, "ab") + std::string(22, 'H'), 1208, 1208, 0).data,
+            record(0x4B, "ab"));
+}
+
+TEST(VeblobCopy, ReportsRoomFormAndConversionFailures) {
+  const auto status = [](const Copied &c) { return c.status + "/" + c.message; };
+  const char *large = "CLI_udfVEBLOB_CP_LARGE", *small = "CLI_udfVEBLOB_CP_SMALL";
+  std::string unknownTag = record(0x4B, "ab");
+  unknownTag[22] = 0x11;
+  EXPECT_EQ(status(copy(large, unknownTag, 1208, 1208, 0)), "38603/sqlocpcv");
+  // Factor 2 (EUC-JP to UTF-8) on a string of 400000 bytes fits only LARGE.
+  const std::string big = record(0xCB, std::string(400000, 'a'));
+  EXPECT_EQ(copy(large, big, 954, 1208, 0).data, big);
+  EXPECT_EQ(status(copy(small, big, 954, 1208, 0)), "38601/sqlocpcv");
+  EXPECT_EQ(status(copy(large, record(0x4B, "\xFF"), 1208, 819, 0)), "38602/sqlocpcv");
+  EXPECT_EQ(copy(large, record(0x4B, "\xFF"), 1208, 819, 0).indicator, 0x5A5A);
+  // The space for each string is the object's size; a converted string
+  // longer than that fails, and one longer than its 8-bit field can say.
+  const std::string grows = record(0x4B, std::string(200, '\xE4'));
+  EXPECT_EQ(status(copy(large, grows, 819, 1208, 0)), "38602/sqlocpcv");
+  EXPECT_EQ(status(copy(large, grows + record(0x4B, std::string(250, 'a')), 819, 1208, 0)),
+            "38601/sqlocpcv");
+  // Lengths and strings that run past the end of the object.
+  std::string cut = record(0xCB, "abcdef");
+  EXPECT_EQ(status(copy(large, cut.substr(0, cut.size() - 2), 1208, 1208, 0)), "38603/sqlocpcv");
+  EXPECT_EQ(status(copy(large, cut.substr(0, 25), 1208, 1208, 0)), "38603/sqlocpcv");
 }
 
 }  // namespace

@@ -1,0 +1,182 @@
+// VEBLOB_CP_LARGE and VEBLOB_CP_SMALL: a chain of records copied from one
+// code page to another.  Each record is a 22-byte head, copied as it is,
+// a tag that says the width of the length field, the length, and a string
+// that is converted; the length field is rewritten with the new length,
+// and 16- and 32-bit fields can be swapped between byte orders.
+//
+// The routines trust nothing in the object: a length field or a string
+// that runs past its end gives a status, and the conversion service is
+// never given more room than the result has left.
+#include <cstdint>
+#include <cstring>
+#include <initializer_list>
+
+#include "engine/services.h"
+#include "frame/conversion.hpp"
+#include "frame/frame.hpp"
+
+namespace {
+
+using cli::Ind;
+using cli::Lob;
+using cli::NameArg;
+
+constexpr std::size_t kHead = 22;
+
+bool isOneOf(std::int32_t cp, std::initializer_list<std::int32_t> set) {
+  for (std::int32_t c : set) {
+    if (c == cp) return true;
+  }
+  return false;
+}
+
+bool isUtf16(std::int32_t cp) { return isOneOf(cp, {1200, 1202, 13488, 13490, 17584, 17586}); }
+bool isMixed(std::int32_t cp) {
+  return isOneOf(cp, {932, 942, 943, 949, 950, 970, 1363, 1375, 1381, 1383, 1386, 1394, 5039});
+}
+bool isNarrowClass(std::int32_t cp) {
+  const std::int32_t c = sqlnls_Encoding2(static_cast<std::uint32_t>(cp), 2);
+  return c == 2 || c == 9;
+}
+
+// By how much a string may grow from one code page to the other: the
+// first rule that applies decides.
+std::int32_t expansionFactor(std::int32_t from, std::int32_t to) {
+  if (to == from || to == 0 || from == 0) return 1;
+  if (from == 1208) return to == 819 || isUtf16(to) ? 2 : isOneOf(to, {1232, 1234}) ? 1 : 3;
+  if (isOneOf(from, {819, 1252})) return 1;
+  if (isOneOf(from, {954, 964})) return 2;
+  if (isUtf16(from)) return isUtf16(to) || to == 1204 ? 1 : isNarrowClass(to) ? 1 : 2;
+  if (isOneOf(from, {1232, 1234})) {
+    if (isUtf16(to) || to == 1204) return 2;
+    if (isOneOf(to, {1232, 1234, 1236})) return 1;
+    return isNarrowClass(to) ? 2 : 4;
+  }
+  if (isOneOf(from, {1392, 5488})) return to == 1208 ? 4 : isUtf16(to) || to == 1204 ? 2 : 1;
+  if (isMixed(from)) return to == 1208 ? 2 : 1;
+  return 1;
+}
+
+// The machine's own byte order as the object's byte-order input gives it:
+// -1 for big-endian, 0 for little-endian.
+std::int32_t machineByteOrder() {
+  const std::uint32_t probe = 0x12345678;
+  unsigned char first = 0;
+  std::memcpy(&first, &probe, 1);
+  return first == 0x12 ? -1 : 0;
+}
+
+std::size_t widthOfTag(unsigned char tag) {
+  switch (tag) {
+    case 0x4B:
+      return 1;
+    case 0x8B:
+      return 2;
+    case 0xCB:
+      return 4;
+    default:
+      return 0;
+  }
+}
+
+std::uint32_t readLength(const unsigned char *p, std::size_t width, bool swap) {
+  if (width == 1) return p[0];
+  unsigned char b[4] = {};
+  for (std::size_t i = 0; i < width; ++i) b[i] = p[swap ? width - 1 - i : i];
+  if (width == 2) {
+    std::uint16_t v = 0;
+    std::memcpy(&v, b, 2);
+    return v;
+  }
+  std::uint32_t v = 0;
+  std::memcpy(&v, b, 4);
+  return v;
+}
+
+void writeLength(unsigned char *p, std::size_t width, std::uint32_t value, bool swap) {
+  unsigned char b[4] = {};
+  if (width == 1) {
+    p[0] = static_cast<unsigned char>(value);
+    return;
+  }
+  if (width == 2) {
+    const auto v = static_cast<std::uint16_t>(value);
+    std::memcpy(b, &v, 2);
+  } else {
+    std::memcpy(b, &value, 4);
+  }
+  for (std::size_t i = 0; i < width; ++i) p[i] = b[swap ? width - 1 - i : i];
+}
+
+// The status of this routine: five SQLSTATE characters and "sqlocpcv",
+// neither terminated.
+void report(char *sqlstate, char *message, const char *state) {
+  std::memcpy(sqlstate, state, 5);
+  std::memcpy(message, CLI_MESSAGE_SQLOCPCV, 8);
+}
+
+template <std::uint32_t Capacity>
+void copyObject(const CLI_udfLob *object, std::int32_t from, std::int32_t to,
+                std::int32_t byteOrder, CLI_udfLob *result, const std::int16_t *objectNull,
+                std::int16_t *resultNull, char *sqlstate, char *message) noexcept {
+  if (*objectNull < 0) {
+    *resultNull = *objectNull;
+    return;
+  }
+  const bool swap = byteOrder != machineByteOrder();
+  const std::int32_t factor = expansionFactor(from, to);
+  const cli::Bytes in = Lob::read(object);
+  unsigned char *out = Lob::area(result);
+  std::size_t end = 0;  // the end of the last converted string in the result
+  if (in.size >= kHead + 1) {
+    std::size_t t = kHead, u = kHead;
+    for (;;) {
+      if (u + 26 > Capacity) return report(sqlstate, message, CLI_SQLSTATE_RESULT_TOO_SMALL);
+      const unsigned char tag = in.data[t];
+      const std::size_t width = widthOfTag(tag);
+      if (width == 0) return report(sqlstate, message, CLI_SQLSTATE_UNKNOWN_LENGTH_FORM);
+      // A length field or string past the end of the object is no record.
+      if (t + 1 + width > in.size)
+        return report(sqlstate, message, CLI_SQLSTATE_UNKNOWN_LENGTH_FORM);
+      std::memcpy(out + u - kHead, in.data + t - kHead, kHead + 1);
+      const std::uint32_t n = readLength(in.data + t + 1, width, swap);
+      const std::size_t source = t + 1 + width;
+      if (n > in.size - source) return report(sqlstate, message, CLI_SQLSTATE_UNKNOWN_LENGTH_FORM);
+      const std::size_t v = u + 1 + width;
+      const auto room = static_cast<std::uint64_t>(static_cast<double>(n) * factor + 0.5);
+      if (v + room >= Capacity) return report(sqlstate, message, CLI_SQLSTATE_RESULT_TOO_SMALL);
+      // The object's size is the space, but never more than the result holds.
+      const auto space =
+          static_cast<std::uint32_t>(in.size < Capacity - v ? in.size : Capacity - v);
+      const cli::Converted c =
+          cli::CLI_convertCodePage(in.data + source, n, static_cast<std::uint32_t>(from),
+                                   static_cast<std::uint32_t>(to), out + v, space);
+      if (c.status < 0) return report(sqlstate, message, CLI_SQLSTATE_CONVERSION_FAILED);
+      // The new length must fit the width of its field.
+      if (c.length > space || (width < 4 && c.length >= (1u << (8 * width)))) {
+        return report(sqlstate, message, CLI_SQLSTATE_RESULT_TOO_SMALL);
+      }
+      writeLength(out + u + 1, width, c.length, swap);
+      end = v + c.length;
+      t = source + n + kHead;
+      u = end + kHead;
+      if (t + 1 > in.size) break;
+    }
+  }
+  Lob::finish(result, end);
+  *resultNull = 1;
+}
+
+}  // namespace
+
+#define CLI_VEBLOB_EXPORT(symbol, capacity)                                                        \
+  CLI_EXPORT void symbol(                                                                          \
+      const CLI_udfLob *object, const std::int32_t *from, const std::int32_t *to,                  \
+      const std::int32_t *byteOrder, CLI_udfLob *result, const std::int16_t *objectNull, Ind, Ind, \
+      Ind, std::int16_t *resultNull, char *sqlstate, NameArg, NameArg, char *message) noexcept {   \
+    copyObject<capacity>(object, *from, *to, *byteOrder, result, objectNull, resultNull, sqlstate, \
+                         message);                                                                 \
+  }
+
+CLI_VEBLOB_EXPORT(CLI_udfVEBLOB_CP_LARGE, 1000000)
+CLI_VEBLOB_EXPORT(CLI_udfVEBLOB_CP_SMALL, 500000)
