@@ -215,8 +215,8 @@ inline constexpr Routine kRoutines[] = {
   {"CLI_udfSOUNDEX", Built::yes, "SOUNDEX", Frame::plain, {text("string")}, {textOf(4)}, kPure, "", "Four-character Soundex code; Z000 for a text without a letter."},
   {"CLI_udfDIFFERENCE", Built::yes, "DIFFERENCE", Frame::plain, {text("a"), text("b")}, {int32()}, kPure, "", "How many of the four Soundex positions agree, 0 to 4."},
   // Table functions
-  {"CLI_udfFmpThreads", Built::no, "FmpThreads", Frame::tableCallback, {int32("selector")}, {int32(), int32(), int32(), int32(), int32(), int32()}, 0, "", "The engine's table of Fmp threads."},
-  {"CLI_udfFmpRows", Built::no, "FmpRows", Frame::tableCallback, {}, {int32(), int32(), int16(), int16(), int16(), int16()}, 0, "", "The engine's table of Fmp rows."},
+  {"CLI_udfFmpThreads", Built::yes, "FmpThreads", Frame::tableCallback, {int32("selector")}, {int32(), int32(), int32(), int32(), int32(), int32()}, 0, "", "The engine's table of Fmp threads."},
+  {"CLI_udfFmpRows", Built::yes, "FmpRows", Frame::tableCallback, {}, {int32(), int32(), int16(), int16(), int16(), int16()}, 0, "", "The engine's table of Fmp rows."},
   // Cache snapshot
   {"SQLCACHE_SNAPSHOT", Built::no, "SQLCACHE_SNAPSHOT", Frame::table, {}, {int32(), int32(), int32(), int32(), int32(), int32(), int32(), int32(), int32(), int32(), int32(), int32(), int32(), int32(), int32(), int32(), textOf(8), lobOf(kLob)}, 0, "", "One row per statement of the SQL statement cache snapshot."},
   // Object copy

@@ -7,6 +7,7 @@
 // The routines trust nothing in the object: a length field or a string
 // that runs past its end gives a status, and the conversion service is
 // never given more room than the result has left.
+#include <algorithm>
 #include <cstdint>
 #include <cstring>
 #include <initializer_list>
@@ -24,10 +25,7 @@ using cli::NameArg;
 constexpr std::size_t kHead = 22;
 
 bool isOneOf(std::int32_t cp, std::initializer_list<std::int32_t> set) {
-  for (std::int32_t c : set) {
-    if (c == cp) return true;
-  }
-  return false;
+  return std::ranges::find(set, cp) != set.end();
 }
 
 bool isUtf16(std::int32_t cp) { return isOneOf(cp, {1200, 1202, 13488, 13490, 17584, 17586}); }
@@ -112,7 +110,7 @@ void writeLength(unsigned char *p, std::size_t width, std::uint32_t value, bool 
 // neither terminated.
 void report(char *sqlstate, char *message, const char *state) {
   std::memcpy(sqlstate, state, 5);
-  std::memcpy(message, CLI_MESSAGE_SQLOCPCV, 8);
+  std::memcpy(message, CLI_MESSAGE_SQLOCPCV, 8);  // NOLINT(bugprone-not-null-terminated-result)
 }
 
 template <std::uint32_t Capacity>
@@ -143,7 +141,10 @@ void copyObject(const CLI_udfLob *object, std::int32_t from, std::int32_t to,
       const std::size_t source = t + 1 + width;
       if (n > in.size - source) return report(sqlstate, message, CLI_SQLSTATE_UNKNOWN_LENGTH_FORM);
       const std::size_t v = u + 1 + width;
-      const auto room = static_cast<std::uint64_t>(static_cast<double>(n) * factor + 0.5);
+      // The room test as the contract gives it: n times the factor in
+      // floating point, with 0.5 added, truncated.
+      const double scaled = static_cast<double>(n) * factor + 0.5;
+      const auto room = static_cast<std::uint64_t>(scaled);
       if (v + room >= Capacity) return report(sqlstate, message, CLI_SQLSTATE_RESULT_TOO_SMALL);
       // The object's size is the space, but never more than the result holds.
       const auto space =

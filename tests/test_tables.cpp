@@ -1,0 +1,171 @@
+// The Fmp table functions, driven through open, fetch and close with a
+// callback that plays the engine's part.
+#include <gtest/gtest.h>
+
+#include <array>
+#include <cstdint>
+#include <cstring>
+#include <string>
+#include <vector>
+
+#include "frame/cliudf.h"
+#include "support/frame_call.hpp"
+
+namespace {
+
+using orv::test::exportAddress;
+
+// The engine's side: its answers to open and close, and what it was asked.
+struct Engine {
+  std::int32_t openStatus = 0, closeStatus = 0, count = 0;
+  std::vector<unsigned char> table;
+  bool giveTable = true;
+  std::vector<std::int32_t> codes;    // request codes, in order
+  std::vector<std::int32_t> inputs;   // FmpThreads' input value on open
+  std::vector<std::uint64_t> closed;  // table pointers handed back
+};
+Engine *engine = nullptr;
+
+std::int32_t callback(std::int32_t slots, void *request) {
+  auto *slot = static_cast<std::uint64_t *>(request);
+  std::int32_t code = 0;
+  std::memcpy(&code, reinterpret_cast<void *>(slot[0]), 4);
+  engine->codes.push_back(code);
+  if (code == 1) {
+    EXPECT_EQ(slots, 2);
+    engine->closed.push_back(slot[1]);
+    return engine->closeStatus;
+  }
+  const bool threads = code == 3;
+  EXPECT_EQ(slots, threads ? 4 : 3);
+  if (threads) engine->inputs.push_back(*reinterpret_cast<std::int32_t *>(slot[1]));
+  auto *count = reinterpret_cast<std::int32_t *>(slot[threads ? 2 : 1]);
+  EXPECT_EQ(*count, 0);
+  EXPECT_EQ(slot[threads ? 3 : 2], 0u);
+  *count = engine->count;
+  if (engine->giveTable)
+    slot[threads ? 3 : 2] = reinterpret_cast<std::uintptr_t>(engine->table.data());
+  return engine->openStatus;
+}
+
+// One call of either routine; rows come back as six numbers.
+struct Call {
+  std::string sqlstate, message;
+  std::array<std::int64_t, 6> row{};
+  std::array<std::int16_t, 6> indicators{};
+};
+
+class Tables : public ::testing::Test {
+ protected:
+  void SetUp() override { engine = &fake; }
+  void TearDown() override { engine = nullptr; }
+
+  Call run(bool threads, std::int32_t callType, std::int32_t selector = 7) {
+    Call c;
+    c.indicators.fill(0x5A5A);
+    char sqlstate[6] = {}, message[28] = {};
+    std::int32_t r32[6] = {};
+    std::int16_t r16[4] = {};
+    std::int16_t inputIndicator = 0;
+    const char *name = threads ? "CLI_udfFmpThreads" : "CLI_udfFmpRows";
+    void *fn = exportAddress(name);
+    if (threads) {
+      using Fn = void (*)(const std::int32_t *, std::int32_t *, std::int32_t *, std::int32_t *,
+                          std::int32_t *, std::int32_t *, std::int32_t *, std::int16_t *,
+                          std::int16_t *, std::int16_t *, std::int16_t *, std::int16_t *,
+                          std::int16_t *, std::int16_t *, char *, const char *, const char *,
+                          char *, unsigned char *, const std::int32_t *, CLI_tableCallback);
+      std::int16_t *n = c.indicators.data();
+      reinterpret_cast<Fn>(fn)(&selector, &r32[0], &r32[1], &r32[2], &r32[3], &r32[4], &r32[5],
+                               &inputIndicator, &n[0], &n[1], &n[2], &n[3], &n[4], &n[5], sqlstate,
+                               "", "", message, scratchpad.data(), &callType, callback);
+      for (std::size_t i = 0; i < 6; ++i) c.row[i] = r32[i];
+    } else {
+      using Fn =
+          void (*)(std::int32_t *, std::int32_t *, std::int16_t *, std::int16_t *, std::int16_t *,
+                   std::int16_t *, std::int16_t *, std::int16_t *, std::int16_t *, std::int16_t *,
+                   std::int16_t *, std::int16_t *, char *, const char *, const char *, char *,
+                   unsigned char *, const std::int32_t *, CLI_tableCallback);
+      std::int16_t *n = c.indicators.data();
+      reinterpret_cast<Fn>(fn)(&r32[0], &r32[1], &r16[0], &r16[1], &r16[2], &r16[3], &n[0], &n[1],
+                               &n[2], &n[3], &n[4], &n[5], sqlstate, "", "", message,
+                               scratchpad.data(), &callType, callback);
+      c.row = {r32[0], r32[1], r16[0], r16[1], r16[2], r16[3]};
+    }
+    EXPECT_EQ(inputIndicator, 0);
+    c.sqlstate = sqlstate;
+    c.message = message;
+    return c;
+  }
+
+  Engine fake;
+  std::array<unsigned char, 128> scratchpad{};
+};
+
+std::vector<unsigned char> words(std::initializer_list<std::int32_t> values) {
+  std::vector<unsigned char> out(values.size() * 4);
+  std::size_t i = 0;
+  for (std::int32_t v : values) std::memcpy(out.data() + 4 * i++, &v, 4);
+  return out;
+}
+
+TEST_F(Tables, ThreadsDeliverEachRowThenEndAndGiveTheTableBack) {
+  fake.count = 2;
+  fake.table = words({99, 1, 2, 3, 4, 5, 6, 99, -1, -2, -3, -4, -5, -6});
+  EXPECT_EQ(run(true, CLI_CALL_OPEN, 42).sqlstate, "");
+  EXPECT_EQ(fake.inputs, std::vector<std::int32_t>{42});
+  const Call first = run(true, CLI_CALL_FETCH), second = run(true, CLI_CALL_FETCH);
+  EXPECT_EQ(first.row, (std::array<std::int64_t, 6>{1, 2, 3, 4, 5, 6}));
+  EXPECT_EQ(second.row, (std::array<std::int64_t, 6>{-1, -2, -3, -4, -5, -6}));
+  EXPECT_EQ(first.indicators, (std::array<std::int16_t, 6>{}));
+  for (int i = 0; i < 2; ++i) {
+    const Call end = run(true, CLI_CALL_FETCH);
+    EXPECT_EQ(end.sqlstate, "02000");
+    EXPECT_EQ(end.indicators[0], 0x5A5A);
+  }
+  EXPECT_EQ(run(true, 7).sqlstate, "");  // an unknown call type does nothing
+  EXPECT_EQ(run(true, CLI_CALL_CLOSE).sqlstate, "");
+  EXPECT_EQ(fake.closed,
+            std::vector<std::uint64_t>{reinterpret_cast<std::uintptr_t>(fake.table.data())});
+  EXPECT_EQ(fake.codes, (std::vector<std::int32_t>{3, 1}));
+  run(true, CLI_CALL_CLOSE);  // no table held: no close request
+  EXPECT_EQ(fake.codes.size(), 2u);
+}
+
+TEST_F(Tables, ThreadsTakeStatusMinus3AsAnEmptyTable) {
+  fake.openStatus = -3;
+  fake.count = 5;
+  fake.table = words({0});  // a table pointer left in the record
+  EXPECT_EQ(run(true, CLI_CALL_OPEN).sqlstate, "");
+  EXPECT_EQ(run(true, CLI_CALL_FETCH).sqlstate, "02000");
+  run(true, CLI_CALL_CLOSE);
+  EXPECT_EQ(fake.codes, (std::vector<std::int32_t>{3, 1}));
+}
+
+TEST_F(Tables, ReportFailedCallbacksWithTheirStatus) {
+  fake.table = words({0, 0, 0, 0});
+  fake.openStatus = 5;
+  const Call threads = run(true, CLI_CALL_OPEN);
+  EXPECT_EQ(threads.sqlstate + "|" + threads.message, "38620|API call failed 5");
+  fake.openStatus = -3;
+  const Call rows = run(false, CLI_CALL_OPEN);
+  EXPECT_EQ(rows.sqlstate + "|" + rows.message, "38620|API call failed -3");
+  EXPECT_EQ(run(false, CLI_CALL_FETCH).sqlstate, "02000");  // no table: nothing is read
+  fake.openStatus = 0;
+  fake.closeStatus = -2147483647 - 1;
+  run(false, CLI_CALL_OPEN);
+  const Call close = run(false, CLI_CALL_CLOSE);
+  EXPECT_EQ(close.sqlstate + "|" + close.message, "38660|API call failed -2147483648");
+  run(false, CLI_CALL_CLOSE);  // the pointer was cleared all the same
+  EXPECT_EQ(fake.closed.size(), 1u);
+}
+
+TEST_F(Tables, RowsWidenTheirUnsignedBytes) {
+  fake.count = 1;
+  fake.table = {1, 0, 0, 0, 2, 0, 0, 0, 0xFF, 0xFF, 4, 0, 0xFF, 0x80, 9, 9};
+  run(false, CLI_CALL_OPEN);
+  EXPECT_EQ(run(false, CLI_CALL_FETCH).row, (std::array<std::int64_t, 6>{1, 2, -1, 4, 255, 128}));
+  EXPECT_EQ(run(false, CLI_CALL_FETCH).sqlstate, "02000");
+}
+
+}  // namespace
