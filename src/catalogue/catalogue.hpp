@@ -218,7 +218,7 @@ inline constexpr Routine kRoutines[] = {
   {"CLI_udfFmpThreads", Built::yes, "FmpThreads", Frame::tableCallback, {int32("selector")}, {int32(), int32(), int32(), int32(), int32(), int32()}, 0, "", "The engine's table of Fmp threads."},
   {"CLI_udfFmpRows", Built::yes, "FmpRows", Frame::tableCallback, {}, {int32(), int32(), int16(), int16(), int16(), int16()}, 0, "", "The engine's table of Fmp rows."},
   // Cache snapshot
-  {"SQLCACHE_SNAPSHOT", Built::no, "SQLCACHE_SNAPSHOT", Frame::table, {}, {int32(), int32(), int32(), int32(), int32(), int32(), int32(), int32(), int32(), int32(), int32(), int32(), int32(), int32(), int32(), int32(), textOf(8), lobOf(kLob)}, 0, "", "One row per statement of the SQL statement cache snapshot."},
+  {"SQLCACHE_SNAPSHOT", Built::yes, "SQLCACHE_SNAPSHOT", Frame::table, {}, {int32(), int32(), int32(), int32(), int32(), int32(), int32(), int32(), int32(), int32(), int32(), int32(), int32(), int32(), int32(), int32(), textOf(8), lobOf(kLob)}, 0, "", "One row per statement of the SQL statement cache snapshot."},
   // Object copy
   {"CLI_udfVEBLOB_CP_LARGE", Built::yes, "VEBLOB_CP_LARGE", Frame::plain, {lob("object"), int32("source code page"), int32("target code page"), int32("byte order")}, {lobOf(1000000)}, kPure | kHandlesNull, "", "A record-chain object copied into another code page, up to 1000000 bytes."},
   {"CLI_udfVEBLOB_CP_SMALL", Built::yes, "VEBLOB_CP_SMALL", Frame::plain, {lob("object"), int32("source code page"), int32("target code page"), int32("byte order")}, {lobOf(500000)}, kPure | kHandlesNull, "", "A record-chain object copied into another code page, up to 500000 bytes."},

@@ -8,7 +8,6 @@
 #include <cstdint>
 #include <cstdio>
 #include <cstring>
-#include <initializer_list>
 
 #include "frame/frame.hpp"
 
@@ -44,6 +43,7 @@ void callFailed(char *sqlstate, char *message, const char *state, std::int32_t s
 
 // A request record: 64-bit slots, the first pointing at the request code.
 using Slot = std::uint64_t;
+static_assert(sizeof(void *) == sizeof(Slot), "a slot holds a pointer");
 template <typename T>
 Slot slotOf(T *pointer) {
   return reinterpret_cast<std::uintptr_t>(pointer);
@@ -107,7 +107,7 @@ CLI_EXPORT void CLI_udfFmpThreads(const std::int32_t *selector, std::int32_t *r1
         callFailed(sqlstate, message, CLI_SQLSTATE_OPEN_CALLBACK_FAILED, status);
       }
       s.count = count;
-      s.table = reinterpret_cast<const unsigned char *>(static_cast<std::uintptr_t>(request[3]));
+      std::memcpy(&s.table, &request[3], sizeof s.table);  // the slot holds the pointer
       s.next = 0;
       save(scratchpad, s);
       return;
@@ -147,7 +147,7 @@ CLI_EXPORT void CLI_udfFmpRows(std::int32_t *r1, std::int32_t *r2, std::int16_t 
         return callFailed(sqlstate, message, CLI_SQLSTATE_OPEN_CALLBACK_FAILED, status);
       }
       s.count = count;
-      s.table = reinterpret_cast<const unsigned char *>(static_cast<std::uintptr_t>(request[2]));
+      std::memcpy(&s.table, &request[2], sizeof s.table);
       s.next = 0;
       save(scratchpad, s);
       return;
@@ -161,7 +161,7 @@ CLI_EXPORT void CLI_udfFmpRows(std::int32_t *r1, std::int32_t *r2, std::int16_t 
       *r4 = field<std::int16_t>(row, 10);
       *r5 = row[12];  // unsigned bytes, widened with zeros
       *r6 = row[13];
-      for (Ind n : {n1, n2, n3, n4, n5, n6}) *n = 0;
+      *n1 = *n2 = *n3 = *n4 = *n5 = *n6 = 0;
       return;
     }
     case CLI_CALL_CLOSE:

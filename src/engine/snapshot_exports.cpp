@@ -1,0 +1,274 @@
+// SQLCACHE_SNAPSHOT: a snapshot of the engine's SQL statement cache, one
+// row per cached statement, read from a file of monitor elements under
+// the instance path.
+//
+// The stream holds sections (a 30, then a section text 321 and section
+// data 322, in any order among the section's statements) and statements
+// (a 19 whose data is a list of inner elements, one per column).  Every
+// failure looks like the end of the table to the engine.  The file comes
+// from outside, so every size in it is checked against the room it claims
+// before anything is read or written; a stream that breaks a limit ends
+// the table.
+#include <cstdint>
+#include <cstdio>
+#include <cstring>
+
+#include "engine/services.h"
+#include "frame/frame.hpp"
+
+namespace {
+
+using cli::Ind;
+using cli::NameArg;
+
+#if defined(_WIN32)
+constexpr const char *kSeparator = "\\";
+#else
+constexpr const char *kSeparator = "/";
+#endif
+
+constexpr std::uint16_t kStatement = 19, kSection = 30, kSectionText = 321, kSectionData = 322;
+constexpr std::uint32_t kTextRoom = 8, kDataRoom = 264;
+constexpr std::size_t kColumns = 18;
+constexpr const char *kModule = "cliudf";
+
+// The scratchpad's data.
+struct Scratch {
+  CLI_fileHandle file;
+  std::uint32_t capacity;  // of the statement block; 0 when none is held
+  char sectionText[9];
+  std::uint8_t closed;  // 1 until the file is open
+  unsigned char *block;
+};
+
+// The result columns of one call, and their indicators.
+struct Row {
+  std::int32_t *number[16];
+  char *text;
+  CLI_udfLob *statement;
+  Ind indicator[kColumns];
+};
+
+void endTable(char *sqlstate) { std::memcpy(sqlstate, CLI_SQLSTATE_NO_MORE_ROWS, 6); }
+
+// The snapshot name, at the end of a chain of pointers that starts in the
+// process's static data; null where a link is missing.
+const char *snapshotName() {
+  const auto *data = static_cast<const unsigned char *>(sqlo_get_static_data());
+  if (data == nullptr) return nullptr;
+  const unsigned char *p = nullptr, *q = nullptr, *r = nullptr;
+  std::memcpy(&p, data + 88, sizeof p);
+  if (p == nullptr) return nullptr;
+  std::memcpy(&q, p, sizeof q);
+  if (q == nullptr) return nullptr;
+  std::memcpy(&r, q + 112, sizeof r);
+  return r == nullptr ? nullptr : reinterpret_cast<const char *>(r + 26408);
+}
+
+void open(Scratch &s, char *sqlstate) {
+  s.block = nullptr;
+  s.capacity = 0;
+  s.closed = 1;
+  char instance[264] = {};
+  if (sqleinstancepath(0, instance) != 0) return endTable(sqlstate);
+  const char *name = snapshotName();
+  char path[256];
+  const int n = name == nullptr ? -1
+                                : std::snprintf(path, sizeof path, "%s%s%s%s%s.%s", instance,
+                                                kSeparator, "tmp", kSeparator, name, "sql");
+  // A path that does not fit its area is a file that cannot be opened.
+  if (n < 0 || static_cast<std::size_t>(n) >= sizeof path) return;
+  sqlm_filter_file_name(path);
+  if (sqloopenp(path, 20, 1024, &s.file, 0) != 0) return;
+  s.closed = 0;
+}
+
+bool readHeader(const Scratch &s, sqlm_header_info &h) {
+  unsigned char raw[8];
+  if (sqloread(s.file, raw, sizeof raw, nullptr) != 0) return false;
+  std::memcpy(&h, raw, sizeof h);
+  return true;
+}
+
+// The section scan: reads the section's text and data, skipping statements
+// that stand before them, and goes back to the first of those.  Leaves the
+// file at the first statement's header, read into `h`.
+bool scanSection(Scratch &s, sqlm_header_info &h) {
+  std::int64_t rewind = 0;
+  bool text = false, data = false;
+  while (!(text && data)) {
+    if (!readHeader(s, h)) return false;
+    const std::int64_t whole = std::int64_t{h.size} + 8;
+    switch (h.element) {
+      case kSectionText:
+        if (h.size > kTextRoom) return false;
+        std::memset(s.sectionText, 0, sizeof s.sectionText);
+        if (sqloread(s.file, s.sectionText, h.size, nullptr) != 0) return false;
+        if (rewind < 0) rewind -= whole;
+        text = true;
+        break;
+      case kSectionData: {
+        if (h.size > kDataRoom) return false;
+        unsigned char work[kDataRoom];
+        if (sqloread(s.file, work, h.size, nullptr) != 0) return false;
+        if (rewind < 0) rewind -= whole;
+        data = true;
+        break;
+      }
+      case kStatement:
+        if (sqlochgfileptr(s.file, h.size, 1, 0) != 0) return false;
+        rewind -= whole;
+        break;
+      default:
+        return false;
+    }
+  }
+  if (rewind != 0 && sqlochgfileptr(s.file, rewind, 1, 0) != 0) return false;
+  return readHeader(s, h) && h.element == kStatement;
+}
+
+bool has(const sqlm_header_info &h, std::uint32_t bytes) { return h.size >= bytes; }
+
+// The 32-bit integer at the start of a child element's data.
+bool childValue(const sqlm_header_info *parent, std::uint32_t child, std::int32_t &out) {
+  const sqlm_header_info *c = sqlm_find_element(child, parent);
+  if (c == nullptr || !has(*c, 4)) return false;
+  std::memcpy(&out, reinterpret_cast<const unsigned char *>(c) + 8, 4);
+  return true;
+}
+
+// Fills the columns that an inner element names; false when the element is
+// too short for what it must hold.
+bool fill(const unsigned char *at, const sqlm_header_info &h, const Row &row) {
+  static constexpr struct {
+    std::uint16_t element;
+    std::uint8_t column;  // 0-based
+    std::uint8_t width;   // bytes read: 4, or 8 for the low half of a 64-bit value
+  } kDirect[] = {{554, 0, 4}, {540, 1, 4}, {521, 2, 4}, {539, 3, 4}, {446, 4, 8},
+                 {487, 5, 8}, {522, 6, 8}, {447, 7, 8}, {523, 8, 8}, {532, 9, 8}};
+  const unsigned char *data = at + 8;
+  for (const auto &d : kDirect) {
+    if (h.element != d.element) continue;
+    if (!has(h, d.width)) return false;
+    std::int32_t v = 0;
+    if (d.width == 4) {
+      std::memcpy(&v, data, 4);
+    } else {
+      std::int64_t wide = 0;
+      std::memcpy(&wide, data, 8);
+      v = static_cast<std::int32_t>(static_cast<std::uint32_t>(static_cast<std::uint64_t>(wide)));
+    }
+    *row.number[d.column] = v;
+    *row.indicator[d.column] = 0;
+    return true;
+  }
+  static constexpr struct {
+    std::uint16_t element;
+    std::uint8_t column;
+  } kPairs[] = {{229, 10}, {586, 12}, {585, 14}};
+  for (const auto &p : kPairs) {
+    if (h.element != p.element) continue;
+    const auto *parent = reinterpret_cast<const sqlm_header_info *>(at);
+    std::int32_t first = 0, second = 0;
+    if (!childValue(parent, 300, first) || !childValue(parent, 301, second)) return false;
+    *row.number[p.column] = first;
+    *row.number[p.column + 1] = second;
+    *row.indicator[p.column] = 0;
+    *row.indicator[p.column + 1] = 0;
+    return true;
+  }
+  if (h.element == 312) {
+    // The data and a NUL behind it must fit the statement column's area.
+    if (h.size >= cli::kLobLimit) return false;
+    cli::Lob::finish(row.statement, h.size);
+    std::memcpy(cli::Lob::area(row.statement), data, h.size);
+    cli::Lob::area(row.statement)[h.size] = 0;
+    *row.indicator[17] = 0;
+  }
+  return true;
+}
+
+void fetch(Scratch &s, const Row &row, char *sqlstate) {
+  if (s.closed != 0) return endTable(sqlstate);
+  sqlm_header_info h{};
+  if (!readHeader(s, h)) return endTable(sqlstate);
+  if (h.element == kSection) {
+    if (!scanSection(s, h)) return endTable(sqlstate);
+  } else if (h.element != kStatement) {
+    return endTable(sqlstate);
+  }
+  // One block serves every statement; it is replaced only by a larger one.
+  if (s.capacity < h.size) {
+    if (s.capacity > 0) sqlofmblkEx(kModule, __LINE__, s.block);
+    s.block = nullptr;
+    s.capacity = 0;
+    void *block = nullptr;
+    const std::int32_t status = sqlogmblkEx(nullptr, h.size, 0, &block, kModule, __LINE__, 0);
+    if (status != 0) {
+      endTable(sqlstate);
+      sqlt_logerr_data("SQLCACHE_SNAPSHOT: unable to allocate temporary sqlcache stmt", &status, 4,
+                       3);
+      return;
+    }
+    s.block = static_cast<unsigned char *>(block);
+    s.capacity = h.size;
+  }
+  if (sqloread(s.file, s.block, h.size, nullptr) != 0) return endTable(sqlstate);
+  std::int64_t left = h.size;
+  for (const unsigned char *at = s.block; left > 0;) {
+    sqlm_header_info inner;
+    if (left < 8) return endTable(sqlstate);
+    std::memcpy(&inner, at, sizeof inner);
+    const std::int64_t whole = std::int64_t{inner.size} + 8;
+    if (whole > left || !fill(at, inner, row)) return endTable(sqlstate);
+    at += whole;
+    left -= whole;
+  }
+  std::memcpy(row.text, s.sectionText, sizeof s.sectionText);
+}
+
+void close(Scratch &s) {
+  if (s.closed != 0) return;
+  sqloclose(s.file);
+  if (s.capacity > 0) sqlofmblkEx(kModule, __LINE__, s.block);
+  s.block = nullptr;
+  s.capacity = 0;
+  s.closed = 1;
+}
+
+}  // namespace
+
+// N = 0, M = 18: 18 results, 18 result indicators, the status buffers,
+// the scratchpad and the call type.
+CLI_EXPORT void SQLCACHE_SNAPSHOT(
+    std::int32_t *c1, std::int32_t *c2, std::int32_t *c3, std::int32_t *c4, std::int32_t *c5,
+    std::int32_t *c6, std::int32_t *c7, std::int32_t *c8, std::int32_t *c9, std::int32_t *c10,
+    std::int32_t *c11, std::int32_t *c12, std::int32_t *c13, std::int32_t *c14, std::int32_t *c15,
+    std::int32_t *c16, char *c17, CLI_udfLob *c18, Ind n1, Ind n2, Ind n3, Ind n4, Ind n5, Ind n6,
+    Ind n7, Ind n8, Ind n9, Ind n10, Ind n11, Ind n12, Ind n13, Ind n14, Ind n15, Ind n16, Ind n17,
+    Ind n18, char *sqlstate, NameArg, NameArg, char *, unsigned char *scratchpad,
+    const std::int32_t *callType) noexcept {
+  sqlo_get_static_data();  // called on every entry; used on open only
+  Scratch s;
+  std::memcpy(&s, scratchpad + CLI_SCRATCHPAD_DATA_OFFSET, sizeof s);
+  switch (*callType) {
+    case CLI_CALL_OPEN:
+      open(s, sqlstate);
+      break;
+    case CLI_CALL_FETCH: {
+      const Row row{
+          {c1, c2, c3, c4, c5, c6, c7, c8, c9, c10, c11, c12, c13, c14, c15, c16},
+          c17,
+          c18,
+          {n1, n2, n3, n4, n5, n6, n7, n8, n9, n10, n11, n12, n13, n14, n15, n16, n17, n18}};
+      fetch(s, row, sqlstate);
+      break;
+    }
+    case CLI_CALL_CLOSE:
+      close(s);
+      break;
+    default:
+      return;
+  }
+  std::memcpy(scratchpad + CLI_SCRATCHPAD_DATA_OFFSET, &s, sizeof s);
+}

@@ -1,0 +1,188 @@
+// SQLCACHE_SNAPSHOT over snapshot files written with the snapshot writer,
+// through open, fetch and close, against the stand-in services.
+#include <gtest/gtest.h>
+#include <unistd.h>
+
+#include <array>
+#include <cstdint>
+#include <cstdlib>
+#include <cstring>
+#include <filesystem>
+#include <fstream>
+#include <string>
+#include <utility>
+#include <vector>
+
+#include "frame/cliudf.h"
+#include "snapshot.hpp"
+#include "support/frame_call.hpp"
+
+namespace {
+
+namespace fs = std::filesystem;
+using namespace orv::snapshot;
+
+template <std::size_t... Is>
+void invoke(void *fn, void *const *args, std::index_sequence<Is...>) {
+  using Export = void (*)(decltype(Is, static_cast<void *>(nullptr))...);
+  reinterpret_cast<Export>(fn)(args[Is]...);
+}
+
+struct Row {
+  std::array<std::int32_t, 16> columns{};
+  std::string text;       // column 17
+  std::string statement;  // column 18
+  std::array<std::int16_t, 18> indicators{};
+};
+
+class Snapshot : public ::testing::Test {
+ protected:
+  void SetUp() override {
+    dir = fs::temp_directory_path() / ("orv_snapshot_" + std::to_string(::getpid()));
+    fs::create_directories(dir / "tmp");
+    setenv("ORVENGINE_INSTANCE_PATH", dir.c_str(), 1);
+    setenv("ORVENGINE_SNAPSHOT_NAME", "cache", 1);
+  }
+  void TearDown() override {
+    fs::remove_all(dir);
+    unsetenv("ORVENGINE_INSTANCE_PATH");
+    unsetenv("ORVENGINE_SNAPSHOT_NAME");
+  }
+  void write(const std::string &stream) {
+    std::ofstream(dir / "tmp" / "cache.sql", std::ios::binary) << stream;
+  }
+
+  // One call; a fetch's row is returned with the SQLSTATE it stored.
+  std::pair<Row, std::string> call(std::int32_t callType) {
+    Row row;
+    row.indicators.fill(0x5A5A);
+    std::array<std::int32_t, 16> numbers{};
+    numbers.fill(-7);
+    char text[9] = "unset";
+    std::vector<unsigned char> statement(4 + 1048576);
+    char sqlstate[6] = {}, message[28] = {};
+    std::vector<void *> args;
+    for (auto &n : numbers) args.push_back(&n);
+    args.push_back(text);
+    args.push_back(statement.data());
+    for (auto &i : row.indicators) args.push_back(&i);
+    args.insert(args.end(), {sqlstate, nullptr, nullptr, message, scratchpad.data(), &callType});
+    invoke(orv::test::exportAddress("SQLCACHE_SNAPSHOT"), args.data(),
+           std::make_index_sequence<42>{});
+    row.columns = numbers;
+    row.text = text;
+    std::uint32_t length = 0;
+    std::memcpy(&length, statement.data(), 4);
+    if (row.indicators[17] == 0)
+      row.statement.assign(reinterpret_cast<char *>(statement.data()) + 4, length);
+    return {row, sqlstate};
+  }
+
+  // Opens, fetches until the table ends (at most `limit` rows), closes.
+  std::vector<Row> rows(std::size_t limit = 100) {
+    std::vector<Row> out;
+    scratchpad.fill(0);
+    EXPECT_EQ(call(CLI_CALL_OPEN).second, "");
+    for (std::size_t i = 0; i < limit; ++i) {
+      auto [row, state] = call(CLI_CALL_FETCH);
+      if (state == "02000") break;
+      EXPECT_EQ(state, "");
+      out.push_back(row);
+    }
+    call(CLI_CALL_CLOSE);
+    return out;
+  }
+
+  std::vector<std::string> texts(std::size_t limit = 100) {
+    std::vector<std::string> out;
+    for (const Row &r : rows(limit)) out.push_back(r.text + ":" + r.statement);
+    return out;
+  }
+
+  fs::path dir;
+  std::array<unsigned char, 128> scratchpad{};
+};
+
+Statement numbered(std::int32_t base, std::string text) {
+  Statement s;
+  for (std::size_t i = 0; i < 16; ++i) s.columns[i] = base + static_cast<std::int32_t>(i);
+  s.text = std::move(text);
+  return s;
+}
+
+TEST_F(Snapshot, DeliversEveryColumnOfEachStatement) {
+  write(section("PKG1") + statement(numbered(100, "SELECT 1")) +
+        statement(numbered(-200, std::string("x\0y", 3))));
+  const std::vector<Row> got = rows();
+  ASSERT_EQ(got.size(), 2u);
+  EXPECT_EQ(got[0].columns, numbered(100, "").columns);
+  EXPECT_EQ(got[1].columns, numbered(-200, "").columns);
+  EXPECT_EQ(got[1].statement, std::string("x\0y", 3));
+  EXPECT_EQ(got[0].text, "PKG1");
+  for (std::size_t i = 0; i < 18; ++i) {
+    EXPECT_EQ(got[0].indicators[i], i == 16 ? 0x5A5A : 0) << "column " << i + 1;
+  }
+}
+
+TEST_F(Snapshot, ReadsSectionsInEveryOrder) {
+  const auto st = [](const char *text) { return statement(numbered(1, text)); };
+  const struct {
+    std::string stream;
+    std::vector<std::string> want;
+  } cases[] = {
+      {"", {}},
+      {st("a"), {":a"}},  // no section: column 17 is empty
+      {section("S1") + st("a") + st("b"), {"S1:a", "S1:b"}},
+      // Statements before the section's text and data are read after them.
+      {element(30, "") + st("a") + st("b") + element(321, "S2") + element(322, "dd") + st("c"),
+       {"S2:a", "S2:b"}},
+      {section("S1") + section("S2") + st("a"), {}},
+      {section("LONGTEXT") + st("a") + section("S") + st("b"), {"LONGTEXT:a", "S:b"}},
+      {section("S1") + st("a") + element(77, "") + st("b"), {"S1:a"}},
+      {st("a") + element(19, element(9999, "zz") + element(312, "kept")), {":a", ":kept"}},
+  };
+  for (const auto &c : cases) {
+    write(c.stream);
+    EXPECT_EQ(texts(), c.want);
+  }
+}
+
+// Streams that break their limits end the table; nothing outside the
+// areas is read or written.
+TEST_F(Snapshot, EndsTheTableOnHostileStreams) {
+  const std::string good = statement(numbered(1, "a"));
+  const std::string cases[] = {
+      element(30, "") + element(321, "NINEBYTES") + element(322, "") + good,
+      element(30, "") + element(321, "S") + element(322, std::string(265, 'd')) + good,
+      element(19, element(554, "12345678") + element(540, "1")),  // too short for its column
+      element(19, element(229, element(300, "1234"))),            // no child 301
+      element(19, element(554, "1234").substr(0, 6)),             // a header cut short
+      element(19, element(312, std::string(1048576, 's'))),       // no room for the NUL
+      good.substr(0, good.size() - 1),                            // the file ends early
+  };
+  for (const std::string &stream : cases) {
+    std::string claims = stream;
+    write(claims);
+    EXPECT_EQ(texts().size(), 0u);
+  }
+  // An inner element that claims more than its statement holds.
+  std::string lying = element(19, element(554, "1234"));
+  lying[8] = 100;
+  write(lying);
+  EXPECT_EQ(texts().size(), 0u);
+}
+
+TEST_F(Snapshot, EndsTheTableWhenTheFileCannotBeFound) {
+  write(statement(numbered(1, "a")));
+  setenv("ORVENGINE_SNAPSHOT_NAME", std::string(300, 'n').c_str(), 1);  // the path would not fit
+  EXPECT_EQ(texts().size(), 0u);
+  setenv("ORVENGINE_SNAPSHOT_NAME", "missing", 1);
+  EXPECT_EQ(texts().size(), 0u);
+  unsetenv("ORVENGINE_INSTANCE_PATH");
+  scratchpad.fill(0);
+  EXPECT_EQ(call(CLI_CALL_OPEN).second, "02000");
+  EXPECT_EQ(call(CLI_CALL_FETCH).second, "02000");
+  call(CLI_CALL_CLOSE);
+}
+
+}  // namespace
