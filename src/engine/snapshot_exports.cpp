@@ -239,7 +239,8 @@ void close(Scratch &s) {
 }  // namespace
 
 // N = 0, M = 18: 18 results, 18 result indicators, the status buffers,
-// the scratchpad and the call type.
+// the scratchpad and the call type.  The results are written through Row.
+// NOLINTBEGIN(readability-non-const-parameter)
 CLI_EXPORT void SQLCACHE_SNAPSHOT(
     std::int32_t *c1, std::int32_t *c2, std::int32_t *c3, std::int32_t *c4, std::int32_t *c5,
     std::int32_t *c6, std::int32_t *c7, std::int32_t *c8, std::int32_t *c9, std::int32_t *c10,
@@ -272,3 +273,4 @@ CLI_EXPORT void SQLCACHE_SNAPSHOT(
   }
   std::memcpy(scratchpad + CLI_SCRATCHPAD_DATA_OFFSET, &s, sizeof s);
 }
+// NOLINTEND(readability-non-const-parameter)
