@@ -11,7 +11,7 @@
 
 int main(int argc, char **argv) {
   if (argc < 2) {
-    std::fprintf(stderr, "usage: %s FILE [STATEMENTS [SECTIONS]]\n", argv[0]);
+    static_cast<void>(std::fprintf(stderr, "usage: %s FILE [STATEMENTS [SECTIONS]]\n", argv[0]));
     return 2;
   }
   const long statements = argc > 2 ? std::strtol(argv[2], nullptr, 10) : 5;
@@ -29,7 +29,7 @@ int main(int argc, char **argv) {
     }
   }
   if (!out) {
-    std::fprintf(stderr, "%s: cannot write %s\n", argv[0], argv[1]);
+    static_cast<void>(std::fprintf(stderr, "%s: cannot write %s\n", argv[0], argv[1]));
     return 1;
   }
   return 0;
