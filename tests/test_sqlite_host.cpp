@@ -1,8 +1,14 @@
 // The SQLite extension, driven through SQL as a user drives it.
 #include <gtest/gtest.h>
 #include <sqlite3.h>
+#include <unistd.h>
 
+#include <cstdlib>
+#include <filesystem>
+#include <fstream>
 #include <string>
+
+#include "snapshot.hpp"
 
 namespace {
 
@@ -162,6 +168,31 @@ TEST_F(SqliteHost, SeedsRandOncePerStatement) {
   EXPECT_EQ(first.find("error"), std::string::npos) << first;
   const auto space = first.find(' ');
   EXPECT_NE(first.substr(0, space), first.substr(space + 1, space));
+}
+
+// Table functions are table-valued functions: one row per fetch.
+TEST_F(SqliteHost, ReadsTheSnapshotAndTheFmpTablesAsTables) {
+  namespace fs = std::filesystem;
+  const fs::path dir = fs::temp_directory_path() / ("orv_host_" + std::to_string(::getpid()));
+  fs::create_directories(dir / "tmp");
+  orv::snapshot::Statement st;
+  st.columns[0] = 7;
+  st.text = "SELECT 1";
+  std::ofstream(dir / "tmp" / "sqlcache.sql", std::ios::binary)
+      << orv::snapshot::section("PKG") + orv::snapshot::statement(st) +
+             orv::snapshot::statement(st);
+  setenv("ORVENGINE_INSTANCE_PATH", dir.c_str(), 1);
+  EXPECT_EQ(eval("SELECT count(*) || group_concat(column1 || column17 || column18, ',') "
+                 "FROM sqlcache_snapshot"),
+            "27PKGSELECT 1,7PKGSELECT 1");
+  unsetenv("ORVENGINE_INSTANCE_PATH");
+  EXPECT_EQ(eval("SELECT count(*) FROM sysfun_sqlcache_snapshot"), "0");
+  fs::remove_all(dir);
+  // FmpRows lists the catalogue: every routine, each one built.
+  EXPECT_EQ(eval("SELECT count(*) || '/' || sum(column6) FROM fmprows"), "104/104");
+  EXPECT_EQ(eval("SELECT column2 FROM fmprows WHERE column1 = 0"), "8");  // SPACE: 8 arguments
+  EXPECT_EQ(eval("SELECT count(*) > 0 FROM fmpthreads(0)"), "1");
+  EXPECT_EQ(eval("SELECT count(*) FROM fmpthreads(-5)"), "0");
 }
 
 TEST_F(SqliteHost, RegistersDeterministicInnocuousFunctionsWithoutHidingBuiltIns) {

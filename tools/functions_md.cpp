@@ -116,8 +116,9 @@ lies outside what the function accepts`.
 The form follows the arguments, not the result: `REPEAT('ab', 3000)` reaches
 the terminated-text form, whose results stop at 4000 bytes, and fails with
 SYSFUN:10; `sysfun_repeat2` reaches the `CLI_udfLob` form, which builds up to
-1048576 bytes. `LEFT` and `RIGHT` are keywords of SQLite's grammar: call them
-quoted, as `"LEFT"(s, n)`, or as `sysfun_left` and `sysfun_right`.
+1048576 bytes. `LEFT`, `RIGHT` and `INSERT` are keywords of SQLite's grammar:
+call them quoted, as `"LEFT"(s, n)`, or as `sysfun_left`, `sysfun_right` and
+`sysfun_insert`.
 
 ## Functions in this build
 )";
@@ -149,13 +150,33 @@ int main(int argc, char **argv) {
     }
   }
 
-  out << "\n## Not yet in this build\n\n"
-      << "| Export | SQL name | Arguments | Result | SYSFUN errors | What it gives |\n"
-      << "|---|---|---|---|---|---|\n";
+  out << "\n## Table functions\n\n"
+      << "Table functions are table-valued functions in SQLite, one row per fetch: "
+      << "`SELECT * FROM sqlcache_snapshot`, `SELECT * FROM fmpthreads(0)`. Their "
+      << "columns are `column1` and on, in the order of the results; an argument is "
+      << "the hidden column that follows them.\n\n"
+      << "| Export | In SQLite | Argument | Columns | What it gives |\n"
+      << "|---|---|---|---|---|\n";
   for (const Routine &r : kRoutines) {
-    if (r.built == cli::catalogue::Built::yes) continue;
-    out << "| `" << r.symbol << "` | " << r.sqlName << " | " << arguments(r) << " | " << results(r)
-        << " | " << codes(r) << " | " << r.summary << " |\n";
+    const bool table =
+        r.frame == cli::catalogue::Frame::table || r.frame == cli::catalogue::Frame::tableCallback;
+    if (!table || r.built != cli::catalogue::Built::yes) continue;
+    const std::string plain = orv::host::lowerCase(r.sqlName);
+    out << "| `" << r.symbol << "` | `" << orv::host::kPrefix << plain << "`, `" << plain << "` | "
+        << arguments(r) << " | " << results(r) << " | " << r.summary << " |\n";
+  }
+
+  bool pending = false;
+  for (const Routine &r : kRoutines) pending = pending || r.built != cli::catalogue::Built::yes;
+  if (pending) {
+    out << "\n## Not yet in this build\n\n"
+        << "| Export | SQL name | Arguments | Result | SYSFUN errors | What it gives |\n"
+        << "|---|---|---|---|---|---|\n";
+    for (const Routine &r : kRoutines) {
+      if (r.built == cli::catalogue::Built::yes) continue;
+      out << "| `" << r.symbol << "` | " << r.sqlName << " | " << arguments(r) << " | "
+          << results(r) << " | " << codes(r) << " | " << r.summary << " |\n";
+    }
   }
   sqlite3_close(db);
 

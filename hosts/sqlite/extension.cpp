@@ -28,6 +28,7 @@ SQLITE_EXTENSION_INIT1
 #include "builtin_names.hpp"
 #include "frame/cliudf.h"
 #include "registry.hpp"
+#include "tables.hpp"
 
 namespace {
 
@@ -645,8 +646,11 @@ int initialise(sqlite3 *db, char **error) {
       rc = registerFunction(db, groups[g].plainName, groups[g], shared);
   }
   if (--shared->functions == 0) delete shared;
-  if (rc != SQLITE_OK) *error = sqlite3_mprintf("orvclifn: %s", sqlite3_errmsg(db));
-  return rc;
+  if (rc != SQLITE_OK) {
+    *error = sqlite3_mprintf("orvclifn: %s", sqlite3_errmsg(db));
+    return rc;
+  }
+  return orv::host::registerTables(db, library, error);
 }
 
 }  // namespace
