@@ -91,7 +91,20 @@ Outcome call(const char *name, const std::vector<Value> &inputs, const Value &re
 // that the routine leaves (0x5A5A if it leaves it alone) is in `indicator`.
 Outcome callNullable(const char *name, const std::vector<Value> &inputs, const Value &result);
 
-// The address of an export of the built library, or null.
+// The address of an export of the library in use, or null.
 void *exportAddress(const char *name);
+
+// While one lives, calls go to the library at `path` (by default the
+// built library): the copy linked against the fake services, for one.
+class LibraryInUse {
+ public:
+  explicit LibraryInUse(const char *path);
+  ~LibraryInUse();
+  LibraryInUse(const LibraryInUse &) = delete;
+  LibraryInUse &operator=(const LibraryInUse &) = delete;
+
+ private:
+  const char *previous_;
+};
 
 }  // namespace orv::test

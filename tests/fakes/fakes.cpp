@@ -1,0 +1,174 @@
+// The fake services: each does the least that lets a routine go on, fails
+// where the control block says, and keeps what it was handed.
+#include "fakes/fakes.h"
+
+#include <fcntl.h>
+#include <unistd.h>
+
+#include <algorithm>
+#include <cstdio>
+#include <cstdlib>
+#include <cstring>
+
+namespace {
+
+OrvFakes fakes;
+
+int descriptorOf(const CLI_fileHandle &handle) {
+  int fd = -1;
+  std::memcpy(&fd, handle.bytes, sizeof fd);
+  return fd;
+}
+
+// The chain from the static data to the snapshot name "cache".
+struct StaticData {
+  alignas(8) unsigned char head[96];
+  alignas(8) unsigned char p[8];
+  alignas(8) unsigned char q[120];
+  alignas(8) unsigned char r[26408 + 16];
+};
+StaticData chain;
+
+uint8_t name(const CLI_nlsTimeRecord *time, uint32_t size, unsigned char *out, uint16_t *codePage) {
+  ++fakes.nameCalls;
+  fakes.lastTime = *time;
+  fakes.lastNameSize = size;
+  std::memcpy(out, fakes.name, std::min<std::size_t>(fakes.nameLength, size));
+  *codePage = fakes.nameCodePage;
+  return fakes.nameLength;
+}
+
+}  // namespace
+
+extern "C" {
+
+OrvFakes *orv_fakes(void) { return &fakes; }
+
+void orv_fakes_reset(void) {
+  fakes = OrvFakes{};
+  fakes.nameLength = 6;
+  std::memcpy(fakes.name, "Sunday", 6);
+  fakes.nameCodePage = 1208;
+  fakes.convertBytes = -1;
+  fakes.encodingClass = 1;
+  fakes.collationLength = 4;
+  std::memcpy(fakes.collationName, "NAME", 4);
+  std::memcpy(fakes.rawText, "+1.50000000000000E+000", 23);
+}
+
+int32_t sqlocpcv(const unsigned char **source, uint32_t length, uint32_t from, uint32_t to, int32_t,
+                 CLI_conversionRecord *record, int32_t *) {
+  ++fakes.convertCalls;
+  fakes.lastRecord = *record;
+  fakes.lastSourceCodePage = from;
+  fakes.lastTargetCodePage = to;
+  fakes.lastLength = length;
+  uint32_t n = fakes.convertBytes < 0 ? length : static_cast<uint32_t>(fakes.convertBytes);
+  n = std::min(n, record->space);
+  std::memcpy(record->target, *source, std::min(n, length));
+  record->space -= n;
+  return fakes.convertStatus;
+}
+
+uint8_t sqloNLSGetServerMonthName(const CLI_nlsTimeRecord *t, uint32_t size, unsigned char *out,
+                                  uint16_t *cp) {
+  return name(t, size, out, cp);
+}
+uint8_t sqloNLSGetServerDayName(const CLI_nlsTimeRecord *t, uint32_t size, unsigned char *out,
+                                uint16_t *cp) {
+  return name(t, size, out, cp);
+}
+
+int32_t sqlrxa2f(const char *, uint32_t length, double *value, uint32_t) {
+  fakes.lastA2fLength = length;
+  if (fakes.a2fStatus == 0) *value = fakes.a2fValue;
+  return fakes.a2fStatus;
+}
+
+int32_t sqlrxf2a(const double *, int32_t, char *text, uint32_t) {
+  std::memcpy(text, fakes.rawText, 23);
+  return 0;
+}
+
+int32_t sqlnlsCollIDMapIDToName(char *out, uint32_t size, const unsigned char *, int32_t) {
+  ++fakes.collationCalls;
+  fakes.lastCollationSize = size;
+  std::memcpy(out, fakes.collationName, std::min<std::size_t>(sizeof fakes.collationName, size));
+  return fakes.collationLength;
+}
+
+void *sqlo_get_static_data(void) {
+  const void *p = chain.p, *q = chain.q, *r = chain.r;
+  std::memcpy(chain.head + 88, &p, sizeof p);
+  std::memcpy(chain.p, &q, sizeof q);
+  std::memcpy(chain.q + 112, &r, sizeof r);
+  std::memcpy(chain.r + 26408, "cache", 6);
+  return chain.head;
+}
+
+int32_t sqleinstancepath(int32_t, char *path) {
+  std::memcpy(path, fakes.instancePath, sizeof fakes.instancePath);
+  return fakes.instanceStatus;
+}
+
+int32_t sqloopenp(const char *path, int32_t, int32_t, CLI_fileHandle *handle, int32_t) {
+  const int fd = ::open(path, O_RDONLY | O_CLOEXEC);
+  if (fd < 0) return 1;
+  ++fakes.opens;
+  std::memcpy(handle->bytes, &fd, sizeof fd);
+  return 0;
+}
+
+int32_t sqloread(CLI_fileHandle handle, void *out, uint32_t count, uint32_t *) {
+  if (++fakes.reads == fakes.failReadAt) return 1;
+  return ::read(descriptorOf(handle), out, count) == static_cast<ssize_t>(count) ? 0 : 1;
+}
+
+int32_t sqlochgfileptr(CLI_fileHandle handle, int64_t offset, int32_t, int32_t) {
+  if (fakes.seekFails != 0) return 1;
+  return ::lseek(descriptorOf(handle), static_cast<off_t>(offset), SEEK_CUR) < 0 ? 1 : 0;
+}
+
+int32_t sqloclose(CLI_fileHandle handle) {
+  ++fakes.closes;
+  return ::close(descriptorOf(handle));
+}
+
+int32_t sqlogmblkEx(void *, uint64_t size, int32_t, void **block, const char *, int32_t, int32_t) {
+  if (fakes.allocationStatus != 0) return fakes.allocationStatus;
+  ++fakes.allocations;
+  *block = std::malloc(size == 0 ? 1 : size);
+  return *block == nullptr ? 1 : 0;
+}
+
+int32_t sqlofmblkEx(const char *, int32_t, void *block) {
+  ++fakes.frees;
+  std::free(block);
+  return 0;
+}
+
+void sqlt_logerr_data(const char *message, const void *data, int32_t size, int32_t) {
+  ++fakes.logCalls;
+  static_cast<void>(std::snprintf(fakes.logMessage, sizeof fakes.logMessage, "%s", message));
+  if (size == 4) std::memcpy(&fakes.logStatus, data, 4);
+}
+
+void sqlm_filter_file_name(char *) {}
+
+const sqlm_header_info *sqlm_find_element(uint32_t element, const sqlm_header_info *parent) {
+  const auto *data = reinterpret_cast<const unsigned char *>(parent) + 8;
+  uint64_t left = parent->size;
+  while (left >= 8) {
+    sqlm_header_info child;
+    std::memcpy(&child, data, sizeof child);
+    if (8 + uint64_t{child.size} > left) return nullptr;
+    if (child.element == element) return reinterpret_cast<const sqlm_header_info *>(data);
+    data += 8 + child.size;
+    left -= 8 + child.size;
+  }
+  return nullptr;
+}
+
+int32_t sqlnls_Encoding2(uint32_t, int32_t) { return fakes.encodingClass; }
+
+}  // extern "C"

@@ -1,0 +1,72 @@
+/*
+ * fakes.h - a fake set of the engine's services, linked into a copy of the
+ * library in place of the stand-ins, so that tests can make each service
+ * fail and see what the routines handed it.  orv_fakes() gives the one
+ * control block; orv_fakes_reset() puts it back to services that succeed.
+ */
+#ifndef ORVCLIFN_TESTS_FAKES_H
+#define ORVCLIFN_TESTS_FAKES_H
+
+/* NOLINTBEGIN(modernize-deprecated-headers, modernize-use-using): plain C */
+#include <stdint.h>
+
+#include "engine/services.h"
+
+#ifdef __cplusplus
+extern "C" {
+#endif
+
+typedef struct OrvFakes {
+  /* Name services: the length they return (0 fails), the bytes and code page. */
+  uint8_t nameLength;
+  unsigned char name[256];
+  uint16_t nameCodePage;
+  int nameCalls;
+  CLI_nlsTimeRecord lastTime;
+  uint32_t lastNameSize;
+
+  /* sqlocpcv: copies up to `convertBytes` source bytes (all when -1) and
+   * returns `convertStatus`; what it was given is kept. */
+  int32_t convertStatus;
+  int32_t convertBytes;
+  int convertCalls;
+  CLI_conversionRecord lastRecord; /* as it was handed in */
+  uint32_t lastSourceCodePage, lastTargetCodePage, lastLength;
+
+  int32_t encodingClass; /* sqlnls_Encoding2 */
+
+  /* sqlnlsCollIDMapIDToName: returns collationLength after copying the name. */
+  int32_t collationLength;
+  char collationName[256];
+  int collationCalls;
+  uint32_t lastCollationSize;
+
+  /* Number text. */
+  int32_t a2fStatus;
+  double a2fValue;
+  uint32_t lastA2fLength;
+  char rawText[23]; /* what sqlrxf2a writes */
+
+  /* Snapshot services: real file reads on `instancePath`, with failures. */
+  int32_t instanceStatus;
+  char instancePath[264];
+  int failReadAt; /* the n-th sqloread fails (1-based); 0 never */
+  int reads;
+  int seekFails; /* sqlochgfileptr fails when set */
+  int opens, closes;
+  int32_t allocationStatus;
+  int allocations, frees;
+  int logCalls;
+  char logMessage[128];
+  int32_t logStatus;
+} OrvFakes;
+
+CLI_SERVICE_API OrvFakes *orv_fakes(void);
+CLI_SERVICE_API void orv_fakes_reset(void);
+
+#ifdef __cplusplus
+}
+#endif
+
+/* NOLINTEND(modernize-deprecated-headers, modernize-use-using) */
+#endif
