@@ -4,6 +4,7 @@
 // Rows: <ROUTINE>/<input>.  String rows over 1 MiB report bytes per second.
 #include <benchmark/benchmark.h>
 #include <dlfcn.h>
+#include <unistd.h>
 
 #include <algorithm>
 #include <cmath>
@@ -11,9 +12,14 @@
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
+#include <filesystem>
+#include <fstream>
 #include <string>
 #include <utility>
 #include <vector>
+
+#include "frame/cliudf.h"
+#include "snapshot.hpp"
 
 namespace {
 
@@ -372,7 +378,90 @@ const bool kSearchRowsRegistered = [] {
   return true;
 }();
 
+// DAYNAME and MONTHNAME with the names in the database's code page (UTF-8),
+// so that no conversion takes place.
+void nameRow(benchmark::State &state, const char *name, const char *date) {
+  void *fn = exportNamed(name);
+  setenv("ORVENGINE_LOCALE", "en_US", 1);
+  unsigned char dbinfo[512] = {};
+  const std::uint32_t utf8 = 1208;
+  std::memcpy(dbinfo + 268, &utf8, 4);
+  char text[40], result[102];
+  std::int16_t indicators[2] = {};
+  char sqlstate[6] = {}, message[70] = {};
+  void *args[] = {text,    result,  &indicators[0], &indicators[1], sqlstate,
+                  nullptr, nullptr, message,        dbinfo};
+  const std::size_t size = std::strlen(date) + 1;
+  for (auto _ : state) {
+    std::memcpy(text, date, size);
+    invoke(fn, args, std::make_index_sequence<9>{});
+    benchmark::DoNotOptimize(result);
+  }
+  if (sqlstate[0] != '\0') state.SkipWithError("the routine reported a status");
+}
+
+const bool kNameRowsRegistered = [] {
+  benchmark::RegisterBenchmark("DAYNAME1/10-byte date, no conversion", nameRow, "CLI_udfDAYNAME1",
+                               "2001-09-27");
+  benchmark::RegisterBenchmark("MONTHNAME2/26-byte timestamp, no conversion", nameRow,
+                               "CLI_udfMONTHNAME2", "2001-09-27-13.30.15.123456");
+  return true;
+}();
+
+// SQLCACHE_SNAPSHOT over a snapshot of 100000 statements: open, every
+// fetch, close.  Reports rows per second.
+void snapshotScan(benchmark::State &state) {
+  const std::string dir = "/tmp/orv_bench_snapshot_" + std::to_string(::getpid());
+  std::filesystem::create_directories(dir + "/tmp");
+  {
+    std::ofstream out(dir + "/tmp/sqlcache.sql", std::ios::binary);
+    out << orv::snapshot::section("BENCH");
+    for (int i = 0; i < 100000; ++i) {
+      orv::snapshot::Statement st;
+      st.columns.fill(i);
+      st.text = "SELECT C1, C2 FROM T WHERE ID = " + std::to_string(i);
+      out << orv::snapshot::statement(st);
+    }
+  }
+  setenv("ORVENGINE_INSTANCE_PATH", dir.c_str(), 1);
+  unsetenv("ORVENGINE_SNAPSHOT_NAME");
+  void *fn = exportNamed("SQLCACHE_SNAPSHOT");
+  std::int32_t numbers[16] = {};
+  char text[9] = {};
+  std::vector<unsigned char> statement(4 + 1048576);
+  std::int16_t indicators[18] = {};
+  char sqlstate[6] = {}, message[28] = {};
+  unsigned char scratchpad[128] = {};
+  std::int32_t callType = 0;
+  std::vector<void *> args;
+  for (auto &n : numbers) args.push_back(&n);
+  args.push_back(text);
+  args.push_back(statement.data());
+  for (auto &i : indicators) args.push_back(&i);
+  args.insert(args.end(), {sqlstate, nullptr, nullptr, message, scratchpad, &callType});
+  std::int64_t rows = 0;
+  for (auto _ : state) {
+    std::memset(scratchpad, 0, sizeof scratchpad);
+    callType = CLI_CALL_OPEN;
+    invoke(fn, args.data(), std::make_index_sequence<42>{});
+    callType = CLI_CALL_FETCH;
+    for (sqlstate[0] = '\0'; sqlstate[0] == '\0'; ++rows) {
+      invoke(fn, args.data(), std::make_index_sequence<42>{});
+    }
+    --rows;
+    callType = CLI_CALL_CLOSE;
+    invoke(fn, args.data(), std::make_index_sequence<42>{});
+  }
+  state.SetItemsProcessed(rows);
+  if (rows != 100000 * static_cast<std::int64_t>(state.iterations())) {
+    state.SkipWithError("the snapshot did not give every row");
+  }
+  std::filesystem::remove_all(dir);
+}
+
 }  // namespace
+
+BENCHMARK(snapshotScan)->Name("SQLCACHE_SNAPSHOT/100000 statements")->Unit(benchmark::kMillisecond);
 
 BENCHMARK(timestampRow)->Name("TIMESTAMP/26-byte timestamp");
 BENCHMARK(timestampDiffRow)->Name("TIMESTAMPDIFF/2, 20-byte duration");

@@ -115,10 +115,12 @@ void putPointer(unsigned char *at, const void *pointer) {
 
 // ---- Files ---------------------------------------------------------------
 
-int descriptorOf(const CLI_fileHandle &handle) {
-  int fd = -1;
-  std::memcpy(&fd, handle.bytes, sizeof fd);
-  return fd;
+// The handle holds a buffered C stream, so that the many small reads of a
+// snapshot cost no system call each.
+std::FILE *streamOf(const CLI_fileHandle &handle) {
+  std::FILE *f = nullptr;
+  std::memcpy(&f, handle.bytes, sizeof f);
+  return f;
 }
 
 }  // namespace
@@ -246,32 +248,25 @@ int32_t sqleinstancepath(int32_t, char *path) {
 }
 
 int32_t sqloopenp(const char *path, int32_t, int32_t, CLI_fileHandle *handle, int32_t) {
-  const int fd = ::open(path, O_RDONLY | O_CLOEXEC);
-  if (fd < 0) return 1;
+  std::FILE *f = std::fopen(path, "rbe");  // e: close on exec
+  if (f == nullptr) return 1;
   std::memset(handle->bytes, 0, sizeof handle->bytes);
-  std::memcpy(handle->bytes, &fd, sizeof fd);
+  std::memcpy(handle->bytes, &f, sizeof f);
   return 0;
 }
 
 int32_t sqloread(CLI_fileHandle handle, void *destination, uint32_t count, uint32_t *read) {
-  auto *out = static_cast<unsigned char *>(destination);
-  uint32_t done = 0;
-  while (done < count) {
-    const ssize_t n = ::read(descriptorOf(handle), out + done, count - done);
-    if (n < 0 && errno == EINTR) continue;
-    if (n <= 0) break;
-    done += static_cast<uint32_t>(n);
-  }
-  if (read != nullptr) *read = done;
+  const std::size_t done = count == 0 ? 0 : std::fread(destination, 1, count, streamOf(handle));
+  if (read != nullptr) *read = static_cast<uint32_t>(done);
   return done == count ? 0 : 1;
 }
 
 int32_t sqlochgfileptr(CLI_fileHandle handle, int64_t offset, int32_t origin, int32_t) {
   const int whence = origin == 0 ? SEEK_SET : origin == 2 ? SEEK_END : SEEK_CUR;
-  return ::lseek(descriptorOf(handle), static_cast<off_t>(offset), whence) < 0 ? 1 : 0;
+  return ::fseeko(streamOf(handle), static_cast<off_t>(offset), whence) != 0 ? 1 : 0;
 }
 
-int32_t sqloclose(CLI_fileHandle handle) { return ::close(descriptorOf(handle)) == 0 ? 0 : 1; }
+int32_t sqloclose(CLI_fileHandle handle) { return std::fclose(streamOf(handle)) == 0 ? 0 : 1; }
 
 int32_t sqlogmblkEx(void *, uint64_t size, int32_t, void **block, const char *, int32_t, int32_t) {
   void *p = std::malloc(size == 0 ? 1 : size);
