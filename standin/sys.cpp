@@ -119,7 +119,7 @@ void putPointer(unsigned char *at, const void *pointer) {
 // snapshot cost no system call each.
 std::FILE *streamOf(const CLI_fileHandle &handle) {
   std::FILE *f = nullptr;
-  std::memcpy(&f, handle.bytes, sizeof f);
+  std::memcpy(&f, handle.bytes, sizeof(std::FILE *));
   return f;
 }
 
@@ -251,7 +251,7 @@ int32_t sqloopenp(const char *path, int32_t, int32_t, CLI_fileHandle *handle, in
   std::FILE *f = std::fopen(path, "rbe");  // e: close on exec
   if (f == nullptr) return 1;
   std::memset(handle->bytes, 0, sizeof handle->bytes);
-  std::memcpy(handle->bytes, &f, sizeof f);
+  std::memcpy(handle->bytes, &f, sizeof(std::FILE *));
   return 0;
 }
 
