@@ -237,6 +237,17 @@ TEST_F(FakeSnapshot, LogsAFailedAllocationAndKeepsNoBlock) {
   EXPECT_EQ(fakes->closes, 1);
 }
 
+// The static data is asked for once on every entry, open included.
+TEST_F(FakeSnapshot, AsksForTheStaticDataOncePerCall) {
+  write(orv::snapshot::statement({{}, "s"}));
+  scratchpad.fill(0);
+  for (const std::int32_t type : {CLI_CALL_OPEN, CLI_CALL_FETCH, CLI_CALL_FETCH, CLI_CALL_CLOSE}) {
+    fakes->staticDataCalls = 0;
+    step(type);
+    EXPECT_EQ(fakes->staticDataCalls, 1) << "call type " << type;
+  }
+}
+
 TEST_F(FakeSnapshot, NeedsNoInstancePathOrFileToCloseCleanly) {
   fakes->instanceStatus = 3;
   scratchpad.fill(0);

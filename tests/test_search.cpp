@@ -63,6 +63,9 @@ TEST(LocateReplaceInsert, KeepTheirEdges) {
       {"CLI_udfINSERT2", {lob("abcdef"), i32(6), i32(5), lob("0123456789")}, lobArea(12), fails("10")},
       {"CLI_udfINSERT2", {lob("abcdef"), i32(6), i32(5), lob("012345")}, lobArea(12), ok("abcde012345")},
       {"CLI_udfINSERT2", {lob("abcdef"), i32(2), i32(11), lob("012345")}, lobArea(12), fails("01")},
+      // Past the end from a start below 1: the result length's 10 wins over the start's 01.
+      {"CLI_udfINSERT1", {text("abcdef"), i32(0), i32(8), text(std::string(4002, 'n'))}, textArea(), fails("10")},
+      {"CLI_udfINSERT2", {lob("abcdef"), i32(0), i32(8), lob("0123456789abcd")}, lobArea(12), fails("10")},
   };
   // clang-format on
   for (const Case &c : cases) {
@@ -104,7 +107,7 @@ Outcome insertModel(bool lobForm, const std::string &in, std::int64_t p, std::in
   const auto wrapped = static_cast<std::uint32_t>(s - l + i);
   const std::int64_t size = lobForm ? std::int64_t{wrapped} : static_cast<std::int32_t>(wrapped);
   const std::int64_t trueSize = p - 1 + l > s ? p - 1 + i : s - l + i;
-  if (size > limit || p > s || (p >= 1 && l >= 0 && trueSize > limit)) return fails("10");
+  if (size > limit || p > s || (l >= 0 && trueSize > limit)) return fails("10");
   if (p < 1 || (!lobForm && p > limit) || l < 0 || p + l > limit) return fails("01");
   const auto head = static_cast<std::size_t>(p - 1);
   const auto tail = static_cast<std::size_t>(std::min(p - 1 + l, s));

@@ -83,9 +83,10 @@ std::int64_t convert(std::int32_t code, const Duration &t, Sysfun &failure) noex
       if (totalMinutes > (kMax - t.seconds) / 60) break;
       return t.seconds + totalMinutes * 60;
     case 4:
-      // Beyond 32 bits from a year field of 4086 on: an error, not a wrapped value.
-      if (totalMinutes > kMax) break;
-      return totalMinutes;
+      // Minutes have no overflow test and no failure: from a year field of
+      // 4086 on the total passes 32 bits, and what is stored is the total
+      // kept in 32 bits, two's complement, the same on every platform.
+      return static_cast<std::int32_t>(static_cast<std::uint32_t>(totalMinutes));
     case 8:
       return t.years * 8760 + t.months * 720 + t.days * 24 + t.hours;
     case 16:
@@ -117,5 +118,5 @@ CLI_EXPORT void CLI_udfTIMESTAMPDIFF(const std::int32_t *code, const char *durat
   Sysfun failure{};
   const std::int64_t value = convert(*code, t, failure);
   if (failure != Sysfun{}) return status.raise(failure);
-  *result = static_cast<std::int32_t>(t.negative ? -value : value);
+  *result = static_cast<std::int32_t>(static_cast<std::uint32_t>(t.negative ? -value : value));
 }

@@ -53,8 +53,8 @@ void endTable(char *sqlstate) { std::memcpy(sqlstate, CLI_SQLSTATE_NO_MORE_ROWS,
 
 // The snapshot name, at the end of a chain of pointers that starts in the
 // process's static data; null where a link is missing.
-const char *snapshotName() {
-  const auto *data = static_cast<const unsigned char *>(sqlo_get_static_data());
+const char *snapshotName(const void *staticData) {
+  const auto *data = static_cast<const unsigned char *>(staticData);
   if (data == nullptr) return nullptr;
   const unsigned char *p = nullptr, *q = nullptr, *r = nullptr;
   std::memcpy(&p, data + 88, sizeof p);
@@ -65,13 +65,13 @@ const char *snapshotName() {
   return r == nullptr ? nullptr : reinterpret_cast<const char *>(r + 26408);
 }
 
-void open(Scratch &s, char *sqlstate) {
+void open(Scratch &s, const void *staticData, char *sqlstate) {
   s.block = nullptr;
   s.capacity = 0;
   s.closed = 1;
   char instance[264] = {};
   if (sqleinstancepath(0, instance) != 0) return endTable(sqlstate);
-  const char *name = snapshotName();
+  const char *name = snapshotName(staticData);
   char path[256];
   const int n = name == nullptr ? -1
                                 : std::snprintf(path, sizeof path, "%s%s%s%s%s.%s", instance,
@@ -83,9 +83,17 @@ void open(Scratch &s, char *sqlstate) {
   s.closed = 0;
 }
 
+// Reads n bytes on from where the file stands; false on a short read.  The
+// service reports the bytes it read into a word of ours, which we don't
+// need: a short read is a failure already.
+bool readBytes(const Scratch &s, void *destination, std::uint32_t n) {
+  std::uint32_t count = 0;
+  return sqloread(s.file, destination, n, &count) == 0;
+}
+
 bool readHeader(const Scratch &s, sqlm_header_info &h) {
   unsigned char raw[8];
-  if (sqloread(s.file, raw, sizeof raw, nullptr) != 0) return false;
+  if (!readBytes(s, raw, sizeof raw)) return false;
   std::memcpy(&h, raw, sizeof h);
   return true;
 }
@@ -103,14 +111,14 @@ bool scanSection(Scratch &s, sqlm_header_info &h) {
       case kSectionText:
         if (h.size > kTextRoom) return false;
         std::memset(s.sectionText, 0, sizeof s.sectionText);
-        if (sqloread(s.file, s.sectionText, h.size, nullptr) != 0) return false;
+        if (!readBytes(s, s.sectionText, h.size)) return false;
         if (rewind < 0) rewind -= whole;
         text = true;
         break;
       case kSectionData: {
         if (h.size > kDataRoom) return false;
         unsigned char work[kDataRoom];
-        if (sqloread(s.file, work, h.size, nullptr) != 0) return false;
+        if (!readBytes(s, work, h.size)) return false;
         if (rewind < 0) rewind -= whole;
         data = true;
         break;
@@ -213,7 +221,7 @@ void fetch(Scratch &s, const Row &row, char *sqlstate) {
     s.block = static_cast<unsigned char *>(block);
     s.capacity = h.size;
   }
-  if (sqloread(s.file, s.block, h.size, nullptr) != 0) return endTable(sqlstate);
+  if (!readBytes(s, s.block, h.size)) return endTable(sqlstate);
   std::int64_t left = h.size;
   for (const unsigned char *at = s.block; left > 0;) {
     sqlm_header_info inner;
@@ -249,12 +257,12 @@ CLI_EXPORT void SQLCACHE_SNAPSHOT(
     Ind n7, Ind n8, Ind n9, Ind n10, Ind n11, Ind n12, Ind n13, Ind n14, Ind n15, Ind n16, Ind n17,
     Ind n18, char *sqlstate, NameArg, NameArg, char *, unsigned char *scratchpad,
     const std::int32_t *callType) noexcept {
-  sqlo_get_static_data();  // called on every entry; used on open only
+  const void *staticData = sqlo_get_static_data();  // called on every entry; used on open only
   Scratch s;
   std::memcpy(&s, scratchpad + CLI_SCRATCHPAD_DATA_OFFSET, sizeof s);
   switch (*callType) {
     case CLI_CALL_OPEN:
-      open(s, sqlstate);
+      open(s, staticData, sqlstate);
       break;
     case CLI_CALL_FETCH: {
       const Row row{

@@ -101,7 +101,8 @@ void insert(Bytes source, std::int64_t p, std::int64_t l, Bytes added,
 // length s - l + i is formed as the form's 32-bit value (signed for text,
 // unsigned for CLI_udfLob, so that a deletion longer than source and new
 // string together wraps and fails); where the range runs past the end of
-// the source the true result length p - 1 + i must fit too.  p + l is
+// the source the true result length p - 1 + i must fit too, whatever p is,
+// so that this code 10 wins over the code 01 of a start below 1.  p + l is
 // formed in 64 bits, so no length to delete can wrap it into range.
 Sysfun insertCheck(bool lobForm, std::size_t s, std::int64_t p, std::int64_t l, std::size_t i,
                    std::size_t limit) noexcept {
@@ -114,7 +115,7 @@ Sysfun insertCheck(bool lobForm, std::size_t s, std::int64_t p, std::int64_t l, 
                                  static_cast<std::uint32_t>(i)) > static_cast<std::int64_t>(limit);
   if (tooLong || p > static_cast<std::int64_t>(s)) return Sysfun::tooLong;
   const auto end = static_cast<std::int64_t>(s);
-  if (p >= 1 && l >= 0 && p - 1 + l > end &&
+  if (l >= 0 && p - 1 + l > end &&
       p - 1 + static_cast<std::int64_t>(i) > static_cast<std::int64_t>(limit)) {
     return Sysfun::tooLong;
   }

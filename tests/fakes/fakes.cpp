@@ -98,6 +98,7 @@ int32_t sqlnlsCollIDMapIDToName(char *out, uint32_t size, const unsigned char *,
 }
 
 void *sqlo_get_static_data(void) {
+  ++fakes.staticDataCalls;
   const void *p = chain.p, *q = chain.q, *r = chain.r;
   std::memcpy(chain.head + 88, &p, sizeof p);
   std::memcpy(chain.p, &q, sizeof q);
@@ -119,9 +120,14 @@ int32_t sqloopenp(const char *path, int32_t, int32_t, CLI_fileHandle *handle, in
   return 0;
 }
 
-int32_t sqloread(CLI_fileHandle handle, void *out, uint32_t count, uint32_t *) {
+// Stores the bytes read through its last argument, as the engine's service
+// does, so a caller that hands it no word is caught.
+int32_t sqloread(CLI_fileHandle handle, void *out, uint32_t count, uint32_t *read) {
+  *read = 0;
   if (++fakes.reads == fakes.failReadAt) return 1;
-  return ::read(descriptorOf(handle), out, count) == static_cast<ssize_t>(count) ? 0 : 1;
+  const ssize_t got = ::read(descriptorOf(handle), out, count);
+  *read = got < 0 ? 0 : static_cast<uint32_t>(got);
+  return got == static_cast<ssize_t>(count) ? 0 : 1;
 }
 
 int32_t sqlochgfileptr(CLI_fileHandle handle, int64_t offset, int32_t, int32_t) {

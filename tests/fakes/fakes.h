@@ -50,6 +50,7 @@ typedef struct OrvFakes {
   /* Snapshot services: real file reads on `instancePath`, with failures. */
   int32_t instanceStatus;
   char instancePath[264];
+  int staticDataCalls;
   int failReadAt; /* the n-th sqloread fails (1-based); 0 never */
   int reads;
   int seekFails; /* sqlochgfileptr fails when set */
