@@ -400,6 +400,20 @@ TEST(DateText, IsTrimmedInTheCallersBuffer) {
     fn(buffer, &result, &ind[0], &ind[1], status, "", "", status + 6);
     EXPECT_EQ(std::string(buffer, 12), std::string(input, 10) + std::string("\0 ", 2)) << input;
   }
+  // TIMESTAMPDIFF reads its duration as it stands and leaves it so.
+  using DiffExport =
+      void (*)(const std::int32_t *, char *, std::int32_t *, std::int16_t *, std::int16_t *,
+               std::int16_t *, char *, const char *, const char *, char *);
+  auto diff = reinterpret_cast<DiffExport>(exportAddress("CLI_udfTIMESTAMPDIFF"));
+  ASSERT_NE(diff, nullptr);
+  char duration[] = "1.5  ";
+  const std::int32_t code = 2;
+  std::int32_t seconds = 0;
+  std::int16_t ind[3] = {};
+  char status[6 + 16] = {};
+  diff(&code, duration, &seconds, &ind[0], &ind[1], &ind[2], status, "", "", status + 6);
+  EXPECT_EQ(seconds, 1);
+  EXPECT_EQ(std::string(duration, sizeof duration), std::string("1.5  ", sizeof duration));
 }
 
 TEST(Timestamp, JoinsTheTextAsWrittenWithMidnightOrToday) {
