@@ -13,7 +13,10 @@ void sqlm_filter_file_name(char *) {}
 // of the parent's data and at a child that claims more than is left.
 const sqlm_header_info *sqlm_find_element(uint32_t element, const sqlm_header_info *parent) {
   const auto *data = reinterpret_cast<const unsigned char *>(parent) + sizeof(sqlm_header_info);
-  uint64_t left = parent->size;
+  // Elements lie packed at any byte offset: headers are copied out.
+  sqlm_header_info head;
+  std::memcpy(&head, parent, sizeof head);
+  uint64_t left = head.size;
   while (left >= sizeof(sqlm_header_info)) {
     sqlm_header_info child;
     std::memcpy(&child, data, sizeof child);

@@ -170,6 +170,24 @@ TEST_F(Snapshot, EndsTheTableOnHostileStreams) {
   lying[8] = 100;
   write(lying);
   EXPECT_EQ(texts().size(), 0u);
+  // A statement whose size word asks for gigabytes in a file of 16 bytes.
+  std::string huge = element(19, "12345678");
+  huge.replace(0, 4, "\xF0\xFF\xFF\xDD", 4);
+  write(huge);
+  EXPECT_EQ(texts().size(), 0u);
+}
+
+// Elements lie packed at any byte offset: a pair element behind an unknown
+// one of odd length still gives its two children.
+TEST_F(Snapshot, ReadsPairsAtOddOffsets) {
+  std::string pair =
+      element(300, std::string("\x05\0\0\0", 4)) + element(301, std::string("\x06\0\0\0", 4));
+  write(element(19, element(9999, "odd") + element(229, pair) + element(312, "s")));
+  const std::vector<Row> got = rows();
+  ASSERT_EQ(got.size(), 1u);
+  EXPECT_EQ(got[0].columns[10], 5);
+  EXPECT_EQ(got[0].columns[11], 6);
+  EXPECT_EQ(got[0].statement, "s");
 }
 
 TEST_F(Snapshot, EndsTheTableWhenTheFileCannotBeFound) {

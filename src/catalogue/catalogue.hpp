@@ -132,8 +132,8 @@ inline constexpr Routine kRoutines[] = {
   {"CLI_udfMONTHNAME2", Built::yes, "MONTHNAME", Frame::dbinfo, {text("date")}, {textOf(kName)}, kInnocuous, "03 04 06", "Name of the month of a date or timestamp."},
   // Integer and sign
   {"CLI_udfABS1", Built::yes, "ABS", Frame::plain, {real("x")}, {real()}, kPure, "", "Absolute value of a double: its sign bit cleared."},
-  {"CLI_udfABS2", Built::yes, "ABS", Frame::plain, {int32("x")}, {int32()}, kPure, "", "Absolute value of a 32-bit integer."},
-  {"CLI_udfABS3", Built::yes, "ABS", Frame::plain, {int16("x")}, {int16()}, kPure, "", "Absolute value of a 16-bit integer."},
+  {"CLI_udfABS2", Built::yes, "ABS", Frame::plain, {int32("x")}, {int32()}, kPure, "01", "Absolute value of a 32-bit integer."},
+  {"CLI_udfABS3", Built::yes, "ABS", Frame::plain, {int16("x")}, {int16()}, kPure, "01", "Absolute value of a 16-bit integer."},
   {"CLI_udfABS4", Built::yes, "ABS", Frame::plain, {int64("x")}, {int64()}, kPure, "01", "Absolute value of a 64-bit integer."},
   {"CLI_udfSIGN1", Built::yes, "SIGN", Frame::plain, {real("x")}, {real()}, kPure, "", "Sign of a double: -1.0, 0.0 or 1.0."},
   {"CLI_udfSIGN2", Built::yes, "SIGN", Frame::plain, {int32("x")}, {int32()}, kPure, "", "Sign of a 32-bit integer."},

@@ -29,6 +29,10 @@ constexpr const char *kSeparator = "/";
 
 constexpr std::uint16_t kStatement = 19, kSection = 30, kSectionText = 321, kSectionData = 322;
 constexpr std::uint32_t kTextRoom = 8, kDataRoom = 264;
+// The largest statement element taken: far above what its columns can
+// hold (a text below 1 MiB and a few numbers), so that a size word from a
+// damaged file can't ask for gigabytes before its read fails.
+constexpr std::uint32_t kStatementRoom = 64u << 20;
 constexpr std::size_t kColumns = 18;
 constexpr const char *kModule = "cliudf";
 
@@ -137,11 +141,16 @@ bool scanSection(Scratch &s, sqlm_header_info &h) {
 
 bool has(const sqlm_header_info &h, std::uint32_t bytes) { return h.size >= bytes; }
 
-// The 32-bit integer at the start of a child element's data.
+// The 32-bit integer at the start of a child element's data.  Elements lie
+// packed at any byte offset, so the child's header is copied out, never read
+// through the pointer.
 bool childValue(const sqlm_header_info *parent, std::uint32_t child, std::int32_t &out) {
-  const sqlm_header_info *c = sqlm_find_element(child, parent);
-  if (c == nullptr || !has(*c, 4)) return false;
-  std::memcpy(&out, reinterpret_cast<const unsigned char *>(c) + 8, 4);
+  const auto *c = reinterpret_cast<const unsigned char *>(sqlm_find_element(child, parent));
+  if (c == nullptr) return false;
+  sqlm_header_info header{};
+  std::memcpy(&header, c, sizeof header);
+  if (!has(header, 4)) return false;
+  std::memcpy(&out, c + sizeof header, 4);
   return true;
 }
 
@@ -205,6 +214,7 @@ void fetch(Scratch &s, const Row &row, char *sqlstate) {
   } else if (h.element != kStatement) {
     return endTable(sqlstate);
   }
+  if (h.size > kStatementRoom) return endTable(sqlstate);
   // One block serves every statement; it is replaced only by a larger one.
   if (s.capacity < h.size) {
     if (s.capacity > 0) sqlofmblkEx(kModule, __LINE__, s.block);
