@@ -47,13 +47,17 @@ class Cache {
       if (o.converter != nullptr) ucnv_close(o.converter);
     }
   }
+  // Each role has slots of its own, so that opening the target's converter
+  // never closes the source's, which the same conversion is about to use.
   UConverter *get(std::uint32_t codePage, int role) {
-    for (Open &o : slots_) {
-      if (o.converter != nullptr && o.codePage == codePage && o.role == role) return o.converter;
+    const std::size_t r = role == 0 ? 0 : 1;
+    Open *const own = slots_.data() + r * kPerRole;
+    for (std::size_t i = 0; i < kPerRole; ++i) {
+      if (own[i].converter != nullptr && own[i].codePage == codePage) return own[i].converter;
     }
     UConverter *c = open(codePage);
     if (c == nullptr) return nullptr;
-    Open &slot = slots_[next_++ % slots_.size()];
+    Open &slot = own[next_[r]++ % kPerRole];
     if (slot.converter != nullptr) ucnv_close(slot.converter);
     slot = {codePage, role, c};
     return c;
@@ -80,8 +84,9 @@ class Cache {
     return c;
   }
 
-  std::array<Open, 8> slots_{};
-  std::size_t next_ = 0;
+  static constexpr std::size_t kPerRole = 4;
+  std::array<Open, 2 * kPerRole> slots_{};
+  std::array<std::size_t, 2> next_{};
 };
 
 }  // namespace

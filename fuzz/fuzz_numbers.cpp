@@ -1,0 +1,242 @@
+// Numbers through every numeric routine: doubles and integers of each
+// width from the bytes, and the rest of the bytes as number text.
+//
+// Input: x, y (two doubles), two 32-bit, two 16-bit and two 64-bit
+// integers, a 32-bit digit count, then number text up to its first NUL.
+// Beyond the frame's checks: the integer routines give the exact answer
+// worked out here in 128 bits, the double routines that call the C maths
+// library give its result bit for bit and, for a finite argument, no
+// infinity on success,
+// DOUBLETOCHAR's 24 bytes read back as the number, and CHARTODOUBLE gives
+// what strtod gives for the text it accepts.
+#include <cmath>
+#include <cstdint>
+#include <cstdlib>
+#include <cstring>
+#include <limits>
+#include <string>
+#include <string_view>
+
+#include "harness.hpp"
+
+namespace {
+
+using namespace orv::fuzz;
+using I128 = __int128;
+
+template <typename T>
+T take(const std::uint8_t *&data, std::size_t &size) {
+  T v{};
+  const std::size_t n = size < sizeof v ? size : sizeof v;
+  std::memcpy(&v, data, n);
+  data += n;
+  size -= n;
+  return v;
+}
+
+std::uint64_t bits(double d) {
+  std::uint64_t b;
+  std::memcpy(&b, &d, 8);
+  return b;
+}
+
+bool sameDouble(double a, double b) {
+  return bits(a) == bits(b) || (std::isnan(a) && std::isnan(b));
+}
+
+// A call with number inputs and one number result.  `store` allows a
+// failure to leave a value behind.
+template <typename R, typename... A>
+std::string call(const char *name, R &out, bool store, A... in) {
+  Call c(name);
+  (c.input(numberBlock(in)), ...);
+  c.result(Block(sizeof(R)));
+  if (store) c.mayStoreOnFailure();
+  const std::string code = c.run();
+  out = numberIn<R>(c.out());
+  return code;
+}
+
+template <typename T>
+void integerForms(const char *abs, const char *sign, const char *ceiling, const char *floor, T x) {
+  T r{};
+  const std::string absCode = call(abs, r, false, x);
+  if (x == std::numeric_limits<T>::min()) {
+    ORV_CHECK(abs, absCode == "01");
+  } else {
+    ORV_CHECK(abs, absCode.empty() && r == (x < 0 ? static_cast<T>(-x) : x));
+  }
+  ORV_CHECK(sign, call(sign, r, false, x).empty() && r == (x > 0) - (x < 0));
+  ORV_CHECK(ceiling, call(ceiling, r, false, x).empty() && r == x);
+  ORV_CHECK(floor, call(floor, r, false, x).empty() && r == x);
+}
+
+template <typename T>
+void mod(const char *name, const char *zeroCode, T x, T y) {
+  T r{};
+  const std::string code = call(name, r, false, x, y);
+  if (y == 0) {
+    ORV_CHECK(name, code == zeroCode);
+    return;
+  }
+  ORV_CHECK(name, code.empty());
+  ORV_CHECK(name, I128{r} == I128{x} % I128{y});
+}
+
+// 10 to the power `n`, n from 0 up; beyond 10^30 every 64-bit value cuts
+// to 0 all the same.
+I128 power10(std::int64_t n) {
+  I128 p = 1;
+  for (std::int64_t i = 0; i < n && i < 30; ++i) p *= 10;
+  return p;
+}
+
+// ROUND and TRUNCATE of an integer: on success a multiple of 10^-n,
+// truncation toward zero or rounding within half a unit.
+template <typename T>
+void cutDigits(const char *round, const char *truncate, T x, std::int32_t n) {
+  const I128 unit = n >= 0 ? 1 : power10(-std::int64_t{n});
+  const I128 cut = I128{x} / unit * unit;
+  T r{};
+  if (call(truncate, r, false, x, n).empty()) ORV_CHECK(truncate, I128{r} == cut);
+  if (call(round, r, false, x, n).empty()) {
+    const I128 diff = I128{r} - I128{x};
+    ORV_CHECK(round, I128{r} % unit == 0 && 2 * (diff < 0 ? -diff : diff) <= unit);
+  }
+}
+
+using Fn1 = double (*)(double);
+
+void elementary(const char *name, Fn1 fn, double x) {
+  double r = 0;
+  if (call(name, r, true, x).empty()) {
+    ORV_CHECK(name, sameDouble(r, fn(x)));
+    if (std::isfinite(x)) ORV_CHECK(name, !std::isinf(r));
+  }
+}
+
+}  // namespace
+
+extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t *data, std::size_t size) {
+  keepLastInput(data, size);
+  const auto x = take<double>(data, size), y = take<double>(data, size);
+  const auto a = take<std::int32_t>(data, size), b = take<std::int32_t>(data, size);
+  const auto c = take<std::int16_t>(data, size), d = take<std::int16_t>(data, size);
+  const auto e = take<std::int64_t>(data, size), f = take<std::int64_t>(data, size);
+  const auto n = take<std::int32_t>(data, size);
+  const std::string_view text =
+      upToNul(std::string_view(reinterpret_cast<const char *>(data), size));
+
+  double r = 0;
+  ORV_CHECK("CLI_udfABS1", call("CLI_udfABS1", r, false, x).empty() &&
+                               bits(r) == (bits(x) & ~(std::uint64_t{1} << 63)));
+  if (call("CLI_udfSIGN1", r, false, x).empty() && !std::isnan(x)) {
+    ORV_CHECK("CLI_udfSIGN1", r == (x > 0 ? 1.0 : x < 0 ? -1.0 : 0.0));
+  }
+  ORV_CHECK("CLI_udfCEILING1",
+            call("CLI_udfCEILING1", r, false, x).empty() && sameDouble(r, std::ceil(x)));
+  ORV_CHECK("CLI_udfFLOOR1",
+            call("CLI_udfFLOOR1", r, false, x).empty() && sameDouble(r, std::floor(x)));
+  integerForms("CLI_udfABS2", "CLI_udfSIGN2", "CLI_udfCEILING2", "CLI_udfFLOOR2", a);
+  integerForms("CLI_udfABS3", "CLI_udfSIGN3", "CLI_udfCEILING3", "CLI_udfFLOOR3", c);
+  integerForms("CLI_udfABS4", "CLI_udfSIGN4", "CLI_udfCEILING4", "CLI_udfFLOOR4", e);
+  mod("CLI_udfMOD1", "02", a, b);
+  mod("CLI_udfMOD2", "03", c, d);
+  mod("CLI_udfMOD3", "03", e, f);
+
+  cutDigits("CLI_udfROUND2", "CLI_udfTRUNCATE2", a, n);
+  cutDigits("CLI_udfROUND5", "CLI_udfTRUNCATE5", e, n);
+  // The double forms may overflow to an infinity without a status.
+  call("CLI_udfROUND1", r, false, x, n);
+  call("CLI_udfTRUNCATE1", r, false, x, n);
+
+  // Powers.
+  if (call("CLI_udfPOWER1", r, true, x, y).empty()) {
+    ORV_CHECK("CLI_udfPOWER1", sameDouble(r, std::pow(x, y)));
+    if (std::isfinite(x) && std::isfinite(y)) ORV_CHECK("CLI_udfPOWER1", !std::isinf(r));
+  }
+  if (call("CLI_udfPOWER2", r, true, x, a).empty() && std::isfinite(x)) {
+    ORV_CHECK("CLI_udfPOWER2", !std::isinf(r));
+  }
+  std::int32_t r32 = 0;
+  call("CLI_udfPOWER3", r32, false, a, b);
+  std::int64_t r64 = 0;
+  if (call("CLI_udfPOWER4", r64, false, e, f).empty() && f >= 0) {
+    // Exact: the product stays within 64 bits or the routine fails.
+    I128 p = 1;
+    bool exact = true;
+    if (e == 0 || e == 1) {
+      p = f == 0 ? 1 : e;
+    } else if (e == -1) {
+      p = f % 2 == 0 ? 1 : -1;
+    } else {
+      for (std::int64_t i = 0; i < f && exact; ++i) {
+        p *= e;
+        exact = p >= std::numeric_limits<std::int64_t>::min() &&
+                p <= std::numeric_limits<std::int64_t>::max();
+      }
+    }
+    ORV_CHECK("CLI_udfPOWER4", exact && p == r64);
+  }
+
+  // Elementary functions of the C maths library.
+  elementary(
+      "CLI_udfSIN", [](double v) { return std::sin(v); }, x);
+  elementary(
+      "CLI_udfCOS", [](double v) { return std::cos(v); }, x);
+  elementary(
+      "CLI_udfTAN", [](double v) { return std::tan(v); }, x);
+  elementary(
+      "CLI_udfASIN", [](double v) { return std::asin(v); }, x);
+  elementary(
+      "CLI_udfACOS", [](double v) { return std::acos(v); }, x);
+  elementary(
+      "CLI_udfATAN", [](double v) { return std::atan(v); }, x);
+  elementary(
+      "CLI_udfLOG", [](double v) { return std::log(v); }, x);
+  elementary(
+      "CLI_udfLOG10", [](double v) { return std::log10(v); }, x);
+  elementary(
+      "CLI_udfEXP", [](double v) { return std::exp(v); }, x);
+  elementary(
+      "CLI_udfSQRT", [](double v) { return std::sqrt(v); }, x);
+  call("CLI_udfCOT", r, true, x);  // 1e-310 gives an infinity
+  // ATAN2(a, b) is the standard atan2(b, a).
+  if (call("CLI_udfATAN2", r, true, x, y).empty())
+    ORV_CHECK("CLI_udfATAN2", sameDouble(r, std::atan2(y, x)));
+  call("CLI_udfDEGREES1", r, false, x);
+  call("CLI_udfRADIANS1", r, false, x);
+
+  // DOUBLETOCHAR: 24 bytes, the short text then blanks, no NUL.
+  Call toText("CLI_udfDOUBLETOCHAR");
+  toText.input(numberBlock(x)).result(Block(24));
+  ORV_CHECK(toText.name(), toText.run().empty());
+  const std::string_view shown = toText.out().view();
+  ORV_CHECK(toText.name(), shown.find('\0') == std::string_view::npos);
+  const std::string_view number = shown.substr(0, shown.find(' '));
+  ORV_CHECK(toText.name(), shown.find_first_not_of(' ', number.size()) == std::string_view::npos);
+  if (x == 0) ORV_CHECK(toText.name(), number == "0E0");
+  if (std::isfinite(x) && x != 0) {
+    const std::string copy(number);
+    char *end = nullptr;
+    const double back = std::strtod(copy.c_str(), &end);
+    ORV_CHECK(toText.name(), end == copy.c_str() + copy.size());
+    ORV_CHECK(toText.name(), std::fabs(back - x) <= std::fabs(x) * 1e-14 || std::isinf(back));
+  }
+
+  // CHARTODOUBLE of the text, and of DOUBLETOCHAR's text.
+  for (const std::string_view t : {text, number}) {
+    Call toNumber("CLI_udfCHARTODOUBLE");
+    toNumber.input(textBlock(t), Trim::whiteSpace).result(Block(8));
+    if (!toNumber.run().empty()) continue;
+    const auto got = numberIn<double>(toNumber.out());
+    ORV_CHECK(toNumber.name(), std::isfinite(got));
+    std::string trimmed(t);
+    while (!trimmed.empty() && isWhite(static_cast<unsigned char>(trimmed.back())))
+      trimmed.pop_back();
+    char *end = nullptr;
+    const double want = std::strtod(trimmed.c_str(), &end);
+    ORV_CHECK(toNumber.name(), end == trimmed.c_str() + trimmed.size() && sameDouble(got, want));
+  }
+  return 0;
+}

@@ -1,0 +1,147 @@
+// SQLCACHE_SNAPSHOT over snapshot files made of the fuzzer's bytes.
+//
+// The bytes are written to `<instance>/tmp/cache.sql` in a temporary
+// instance directory of this process, and the table is read through open,
+// fetches until "02000" (at most kFetches) and close, with an unknown call
+// type in between that must change nothing, as open and close must not
+// write a column.  Beyond ASan's checks: every
+// status is "02000" with its terminator or nothing; a row stores 0 into the
+// indicators it fills and leaves column 17's alone; column 17 is a text of
+// at most 8 bytes and column 18's text lies below the limit and occurs in
+// the file, as does a non-empty column 17.
+#include <unistd.h>
+
+#include <cstdint>
+#include <cstdio>
+#include <cstdlib>
+#include <cstring>
+#include <filesystem>
+#include <fstream>
+#include <string>
+#include <string_view>
+#include <vector>
+
+#include "harness.hpp"
+
+namespace {
+
+using namespace orv::fuzz;
+namespace fs = std::filesystem;
+
+constexpr const char *kName = "SQLCACHE_SNAPSHOT";
+constexpr int kFetches = 2000;
+
+fs::path &file() {
+  static fs::path path;
+  return path;
+}
+
+struct Table {
+  std::vector<Block> numbers;
+  Block text{9};
+  Block statement{CLI_LOB_AREA_SIZE(std::size_t{CLI_LOB_LIMIT})};
+  std::vector<Block> indicators;
+  Block scratchpad{100, 0};
+
+  Table() {
+    for (int i = 0; i < 16; ++i) numbers.emplace_back(4);
+  }
+
+  // One call; returns the SQLSTATE's five characters, empty for none.
+  std::string call(std::int32_t callType) {
+    indicators.clear();
+    for (int i = 0; i < 18; ++i) indicators.push_back(numberBlock(kIndicator));
+    for (Block &n : numbers) std::memset(n.data(), kUnwritten, 4);
+    std::memset(text.data(), kUnwritten, text.size());
+    std::memset(statement.data(), kUnwritten, 8);
+    Block sqlstate(CLI_SQLSTATE_SIZE, 'S'), message(CLI_MESSAGE_SIZE, 'M');
+    Block type = numberBlock(callType);
+    std::vector<void *> args;
+    for (Block &n : numbers) args.push_back(n.data());
+    args.push_back(text.data());
+    args.push_back(statement.data());
+    for (Block &i : indicators) args.push_back(i.data());
+    args.insert(args.end(),
+                {sqlstate.data(), const_cast<char *>("FUNCTION"), const_cast<char *>("SPECIFIC"),
+                 message.data(), scratchpad.data(), type.data()});
+    invoke(kName, exportAddress(kName), args);
+    ORV_CHECK(kName, Call::untouched(message, 'M'));
+    if (Call::untouched(sqlstate, 'S')) return {};
+    ORV_CHECK(kName, sqlstate.holds(std::string_view("02000\0", 6)));
+    return "02000";
+  }
+
+  bool nothingWritten() const {
+    for (const Block &n : numbers) {
+      if (!allUnwritten(n.data(), 4)) return false;
+    }
+    for (const Block &i : indicators) {
+      if (numberIn<std::int16_t>(i) != kIndicator) return false;
+    }
+    return allUnwritten(text.data(), text.size()) && allUnwritten(statement.data(), 8);
+  }
+};
+
+}  // namespace
+
+extern "C" int LLVMFuzzerInitialize(int *, char ***) {
+  const fs::path dir =
+      fs::temp_directory_path() / ("orv_fuzz_snapshot_" + std::to_string(::getpid()));
+  fs::create_directories(dir / "tmp");
+  setenv("ORVENGINE_INSTANCE_PATH", dir.c_str(), 1);
+  setenv("ORVENGINE_SNAPSHOT_NAME", "cache", 1);
+  file() = dir / "tmp" / "cache.sql";
+  // The directory goes when the process ends normally.
+  static const struct Remove {
+    fs::path d;
+    ~Remove() {
+      std::error_code ignored;
+      fs::remove_all(d, ignored);
+    }
+  } remove{dir};
+  return 0;
+}
+
+extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t *data, std::size_t size) {
+  keepLastInput(data, size);
+  const std::string_view stream(reinterpret_cast<const char *>(data), size);
+  {
+    std::ofstream out(file(), std::ios::binary | std::ios::trunc);
+    out.write(stream.data(), static_cast<std::streamsize>(stream.size()));
+  }
+  static Table *table = new Table;  // its 1 MiB column is kept across runs
+  Table &t = *table;
+  std::memset(t.scratchpad.data(), 0, t.scratchpad.size());
+
+  ORV_CHECK(kName, t.call(CLI_CALL_OPEN).empty() && t.nothingWritten());
+  for (int i = 0; i < kFetches; ++i) {
+    if (i % 7 == 3) ORV_CHECK(kName, t.call(2).empty() && t.nothingWritten());
+    // A fetch that ends the table may have filled some columns of a
+    // statement before a bad element stopped it.
+    if (!t.call(CLI_CALL_FETCH).empty()) break;
+    // A row: column 17's indicator is left alone, the others are 0 where
+    // their column was filled and untouched where it was not.
+    ORV_CHECK(kName, numberIn<std::int16_t>(t.indicators[16]) == kIndicator);
+    for (int c = 0; c < 16; ++c) {
+      const auto ind = numberIn<std::int16_t>(t.indicators[static_cast<std::size_t>(c)]);
+      ORV_CHECK(kName,
+                ind == 0 || (ind == kIndicator &&
+                             allUnwritten(t.numbers[static_cast<std::size_t>(c)].data(), 4)));
+    }
+    const std::string_view section = textIn(kName, t.text);
+    ORV_CHECK(kName, section.size() <= 8);
+    if (!section.empty()) ORV_CHECK(kName, stream.find(section) != std::string_view::npos);
+    const auto ind18 = numberIn<std::int16_t>(t.indicators[17]);
+    ORV_CHECK(kName, ind18 == 0 || ind18 == kIndicator);
+    if (ind18 == 0) {
+      const std::uint32_t length = lobLength(t.statement);
+      ORV_CHECK(kName, length < CLI_LOB_LIMIT);
+      const std::string_view statement = lobData(t.statement, length);
+      ORV_CHECK(kName, stream.find(statement) != std::string_view::npos);
+      ORV_CHECK(kName, t.statement.data()[CLI_LOB_DATA_OFFSET + length] == 0);
+    }
+  }
+  ORV_CHECK(kName, t.call(CLI_CALL_CLOSE).empty() && t.nothingWritten());
+  ORV_CHECK(kName, t.call(CLI_CALL_CLOSE).empty() && t.nothingWritten());
+  return 0;
+}

@@ -1,0 +1,204 @@
+// CLI_udfFmpThreads and CLI_udfFmpRows with a callback that plays the
+// engine from the fuzzer's bytes.
+//
+// Input: for each of the two routines in turn, an option byte, the open
+// status, the close status and the row count (32-bit words), the selector,
+// then row records.  Option bit 0 hands back no table, bit 1 a status
+// other than 0 on close.  The table handed back holds exactly as many rows
+// as the count says (none for a negative count), each in its own
+// allocation, so that a read past it is caught.
+//
+// Checked: statuses are "38620" / "38660" with "API call failed %d" of
+// the status, or "02000", or nothing; a row gives the record's fields and
+// 0 in all six indicators; past the end nothing is written; close hands
+// back the table it was given, once.
+#include <array>
+#include <cinttypes>
+#include <cstdint>
+#include <cstdio>
+#include <cstring>
+#include <string>
+#include <string_view>
+#include <vector>
+
+#include "harness.hpp"
+
+namespace {
+
+using namespace orv::fuzz;
+
+struct Engine {
+  std::int32_t openStatus = 0, closeStatus = 0, count = 0;
+  bool giveTable = true;
+  Block table;
+  int opens = 0, closes = 0;
+  std::uint64_t closed = 0;
+};
+Engine *engine = nullptr;
+
+std::int32_t callback(std::int32_t slots, void *request) {
+  auto *slot = static_cast<std::uint64_t *>(request);
+  std::int32_t code = 0;
+  std::memcpy(&code, reinterpret_cast<void *>(static_cast<std::uintptr_t>(slot[0])), 4);
+  if (code == 1) {
+    ORV_CHECK("callback", slots == 2);
+    ++engine->closes;
+    engine->closed = slot[1];
+    return engine->closeStatus;
+  }
+  ORV_CHECK("callback", code == 2 || code == 3);
+  const bool threads = code == 3;
+  ORV_CHECK("callback", slots == (threads ? 4 : 3));
+  ++engine->opens;
+  auto *count =
+      reinterpret_cast<std::int32_t *>(static_cast<std::uintptr_t>(slot[threads ? 2 : 1]));
+  ORV_CHECK("callback", *count == 0 && slot[threads ? 3 : 2] == 0);
+  *count = engine->count;
+  if (engine->giveTable)
+    slot[threads ? 3 : 2] = reinterpret_cast<std::uintptr_t>(engine->table.data());
+  return engine->openStatus;
+}
+
+template <typename T>
+T take(const std::uint8_t *&data, std::size_t &size) {
+  T v{};
+  const std::size_t n = size < sizeof v ? size : sizeof v;
+  std::memcpy(&v, data, n);
+  data += n;
+  size -= n;
+  return v;
+}
+
+std::string failed(std::int32_t status) {
+  char text[CLI_MESSAGE_SIZE];
+  static_cast<void>(std::snprintf(text, sizeof text, "API call failed %" PRId32, status));
+  return std::string(text, std::strlen(text) + 1);
+}
+
+void drive(bool threads, const std::uint8_t *&data, std::size_t &size) {
+  const char *name = threads ? "CLI_udfFmpThreads" : "CLI_udfFmpRows";
+  const std::size_t rowSize = threads ? 28 : 16;
+  Engine e;
+  const auto options = take<std::uint8_t>(data, size);
+  e.openStatus = take<std::int32_t>(data, size);
+  e.closeStatus = (options & 2u) != 0 ? take<std::int32_t>(data, size) : 0;
+  e.count = take<std::int32_t>(data, size) % 64;
+  e.giveTable = (options & 1u) == 0;
+  const auto selector = take<std::int32_t>(data, size);
+  const std::size_t rows = e.count > 0 ? static_cast<std::size_t>(e.count) : 0;
+  e.table = Block(rows * rowSize);
+  for (std::size_t i = 0; i < rows * rowSize; ++i)
+    e.table.data()[i] = take<std::uint8_t>(data, size);
+  engine = &e;
+
+  Block scratchpad(100, 0);
+  const auto run = [&](std::int32_t callType, std::array<std::int64_t, 6> &row,
+                       std::array<std::int16_t, 6> &indicators, std::string &state) {
+    std::vector<Block> results;
+    for (int i = 0; i < 6; ++i) results.emplace_back(!threads && i >= 2 ? 2 : 4);
+    std::vector<Block> inds;
+    for (int i = 0; i < 6 + (threads ? 1 : 0); ++i) inds.push_back(numberBlock(kIndicator));
+    Block sqlstate(CLI_SQLSTATE_SIZE, 'S'), message(CLI_MESSAGE_SIZE, 'M');
+    Block input = numberBlock(selector), type = numberBlock(callType);
+    std::vector<void *> args;
+    if (threads) args.push_back(input.data());
+    for (Block &r : results) args.push_back(r.data());
+    for (Block &i : inds) args.push_back(i.data());
+    args.insert(args.end(), {sqlstate.data(), const_cast<char *>("FUNCTION"),
+                             const_cast<char *>("SPECIFIC"), message.data(), scratchpad.data(),
+                             type.data(), reinterpret_cast<void *>(&callback)});
+    invoke(name, exportAddress(name), args);
+    ORV_CHECK(name, input.view() == numberBlock(selector).view());
+    if (threads) ORV_CHECK(name, numberIn<std::int16_t>(inds[0]) == kIndicator);
+    const std::size_t first = threads ? 1 : 0;
+    bool untouched = true;
+    for (std::size_t i = 0; i < 6; ++i) {
+      indicators[i] = numberIn<std::int16_t>(inds[first + i]);
+      row[i] = results[i].size() == 2 ? std::int64_t{numberIn<std::int16_t>(results[i])}
+                                      : std::int64_t{numberIn<std::int32_t>(results[i])};
+      untouched = untouched && allUnwritten(results[i].data(), results[i].size()) &&
+                  indicators[i] == kIndicator;
+    }
+    state.clear();
+    if (Call::untouched(sqlstate, 'S')) {
+      ORV_CHECK(name, Call::untouched(message, 'M'));
+    } else {
+      state = std::string(sqlstate.view().substr(0, 5));
+      ORV_CHECK(name, sqlstate.data()[5] == 0);
+      if (state == "02000") {
+        ORV_CHECK(name, Call::untouched(message, 'M'));
+      } else {
+        ORV_CHECK(name, state == "38620" || state == "38660");
+        const std::string want = failed(state == "38620" ? e.openStatus : e.closeStatus);
+        ORV_CHECK(name, message.view().substr(0, want.size()) == want);
+        ORV_CHECK(name,
+                  message.view().find_first_not_of('M', want.size()) == std::string_view::npos);
+      }
+    }
+    return untouched;
+  };
+
+  std::array<std::int64_t, 6> row{};
+  std::array<std::int16_t, 6> indicators{};
+  std::string state;
+  ORV_CHECK(name, run(CLI_CALL_OPEN, row, indicators, state));
+  ORV_CHECK(name, e.opens == 1);
+  const bool openFailed = e.openStatus != 0 && !(threads && e.openStatus == -3);
+  ORV_CHECK(name, state == (openFailed ? "38620" : ""));
+  // Rows are read only from a table that was handed over with its count.
+  std::size_t expectRows = 0;
+  if (e.giveTable && (!openFailed || threads))
+    expectRows = threads && e.openStatus == -3 ? 0 : rows;
+  for (std::size_t i = 0; i < expectRows + 3; ++i) {
+    const bool untouched = run(i % 5 == 4 ? 9 : CLI_CALL_FETCH, row, indicators, state);
+    if (i % 5 == 4) {
+      ORV_CHECK(name, untouched && state.empty());
+      continue;
+    }
+    if (state == "02000") {
+      ORV_CHECK(name, untouched);
+      continue;
+    }
+    ORV_CHECK(name, state.empty());
+    // A row: which one is the fetch count so far, skipping the unknown types.
+    const std::size_t index = i - i / 5;
+    ORV_CHECK(name, index < rows);
+    const unsigned char *r = e.table.data() + index * rowSize;
+    std::int64_t want[6];
+    if (threads) {
+      for (std::size_t k = 0; k < 6; ++k) {
+        std::int32_t v;
+        std::memcpy(&v, r + 4 + 4 * k, 4);
+        want[k] = v;
+      }
+    } else {
+      std::int32_t a, b;
+      std::int16_t c, d;
+      std::memcpy(&a, r, 4);
+      std::memcpy(&b, r + 4, 4);
+      std::memcpy(&c, r + 8, 2);
+      std::memcpy(&d, r + 10, 2);
+      want[0] = a, want[1] = b, want[2] = c, want[3] = d, want[4] = r[12], want[5] = r[13];
+    }
+    for (std::size_t k = 0; k < 6; ++k) ORV_CHECK(name, row[k] == want[k] && indicators[k] == 0);
+  }
+  run(CLI_CALL_CLOSE, row, indicators, state);
+  const bool held = e.giveTable && (!openFailed || threads) && e.table.data() != nullptr;
+  ORV_CHECK(name, e.closes == (held ? 1 : 0));
+  if (held) {
+    ORV_CHECK(name, e.closed == reinterpret_cast<std::uintptr_t>(e.table.data()));
+    ORV_CHECK(name, state == (e.closeStatus != 0 ? "38660" : ""));
+  }
+  run(CLI_CALL_CLOSE, row, indicators, state);
+  ORV_CHECK(name, e.closes == (held ? 1 : 0) && state.empty());
+  engine = nullptr;
+}
+
+}  // namespace
+
+extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t *data, std::size_t size) {
+  keepLastInput(data, size);
+  drive(true, data, size);
+  drive(false, data, size);
+  return 0;
+}

@@ -1,0 +1,123 @@
+// VEBLOB_CP_LARGE and VEBLOB_CP_SMALL: record-chain objects with code pages
+// and byte-order flags from the bytes.
+//
+// Input: an option byte (bit 0: NULL object; bits 1-2: byte order -1, 0, 1
+// or the raw word), two bytes that pick the source and target code pages
+// from a list (or take the raw words behind them), two raw code-page
+// words, a raw byte-order word, then the object's data.
+//
+// Beyond the frame's checks: a NULL object hands its indicator on and
+// touches nothing else; otherwise the call succeeds with indicator 1 and a
+// result that is a well-formed chain of as many records as the object
+// holds, or stores 38601, 38602 or 38603 with exactly five bytes and the
+// eight bytes "sqlocpcv", leaving the length word and the indicator alone.
+#include <cstdint>
+#include <cstring>
+#include <string>
+#include <string_view>
+
+#include "harness.hpp"
+
+namespace {
+
+using namespace orv::fuzz;
+
+constexpr std::int32_t kCodePages[] = {
+    0,    37,   819,  850,  932,  943,  950,  954,  964,   970,   1200,  1202,  1204,  1208,  1232,
+    1234, 1236, 1252, 1386, 1392, 1394, 5039, 5488, 13488, 13490, 17584, 17586, 65535, 12345, -1};
+
+std::uint32_t lengthAt(std::string_view s, std::size_t at, unsigned width, bool swap) {
+  std::uint32_t v = 0;
+  if (width == 1) return static_cast<unsigned char>(s[at]);
+  if (width == 2) {
+    std::uint16_t h = 0;
+    std::memcpy(&h, s.data() + at, 2);
+    v = swap ? static_cast<std::uint16_t>(__builtin_bswap16(h)) : h;
+  } else {
+    std::memcpy(&v, s.data() + at, 4);
+    if (swap) v = __builtin_bswap32(v);
+  }
+  return v;
+}
+
+unsigned widthOf(unsigned char tag) {
+  return tag == 0x4B ? 1 : tag == 0x8B ? 2 : tag == 0xCB ? 4 : 0;
+}
+
+// Records of a chain that lies wholly inside `s`, or -1 where one does not.
+long records(std::string_view s, bool swap) {
+  long n = 0;
+  std::size_t t = 22;
+  if (s.size() < 23) return 0;
+  while (true) {
+    const unsigned width = widthOf(static_cast<unsigned char>(s[t]));
+    if (width == 0 || t + 1 + width > s.size()) return -1;
+    const std::uint32_t length = lengthAt(s, t + 1, width, swap);
+    if (t + 1 + width + std::size_t{length} > s.size()) return -1;
+    ++n;
+    t += 1 + width + length + 22;
+    if (t + 1 > s.size()) return n;
+  }
+}
+
+}  // namespace
+
+extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t *data, std::size_t size) {
+  keepLastInput(data, size);
+  if (size < 15) return 0;
+  const std::uint8_t options = data[0];
+  std::int32_t source = 0, target = 0, order = 0;
+  std::memcpy(&source, data + 3, 4);
+  std::memcpy(&target, data + 7, 4);
+  std::memcpy(&order, data + 11, 4);
+  constexpr std::size_t kPages = sizeof kCodePages / sizeof kCodePages[0];
+  if (data[1] < 2 * kPages) source = kCodePages[data[1] % kPages];
+  if (data[2] < 2 * kPages) target = kCodePages[data[2] % kPages];
+  const std::int32_t orders[] = {-1, 0, 1, order};
+  order = orders[(options >> 1) & 3u];
+  const bool null = (options & 1u) != 0;
+  const std::string_view object(reinterpret_cast<const char *>(data) + 15, size - 15);
+  // The machine is little-endian: -1 (big-endian) and any value but 0 swap.
+  const bool swap = order != 0;
+
+  for (const auto &[name, capacity] : {std::pair{"CLI_udfVEBLOB_CP_LARGE", 1000000u},
+                                       std::pair{"CLI_udfVEBLOB_CP_SMALL", 500000u}}) {
+    Call c(name);
+    c.input(lobBlock(object))
+        .input(numberBlock(source))
+        .input(numberBlock(target))
+        .input(numberBlock(order))
+        .result(lobArea(capacity), 4);
+    // Reads its first input indicator itself: -1 or 0.
+    c.runRawWithFirstIndicator(null ? std::int16_t{-7} : std::int16_t{0});
+    for (std::size_t i = 0; i < 4; ++i) ORV_CHECK(name, c.in(i).view() == c.inputBefore(i));
+    ORV_CHECK(name, numberIn<std::int16_t>(c.indicator(0)) == (null ? -7 : 0));
+    for (std::size_t i = 1; i < 4; ++i)
+      ORV_CHECK(name, numberIn<std::int16_t>(c.indicator(i)) == kIndicator);
+    const auto resultIndicator = numberIn<std::int16_t>(c.indicator(4));
+    if (null) {
+      ORV_CHECK(name, resultIndicator == -7 && c.resultUntouched());
+      ORV_CHECK(name, Call::untouched(c.sqlstate(), 'S') && Call::untouched(c.message(), 'M'));
+      continue;
+    }
+    if (Call::untouched(c.sqlstate(), 'S')) {
+      ORV_CHECK(name, Call::untouched(c.message(), 'M'));
+      ORV_CHECK(name, resultIndicator == 1);
+      const std::uint32_t length = lobLength(c.out());
+      ORV_CHECK(name, length <= capacity);
+      const std::string_view result = lobData(c.out(), length);
+      const long in = records(object, swap), out = records(result, swap);
+      ORV_CHECK(name, in >= 0 && in == out);
+      // Nothing follows the last record's string in the result.
+      if (length > 0) ORV_CHECK(name, length >= 23);
+      continue;
+    }
+    const std::string_view state = c.sqlstate().view(), message = c.message().view();
+    ORV_CHECK(name, state == "38601S" || state == "38602S" || state == "38603S");
+    ORV_CHECK(name, message.substr(0, 8) == "sqlocpcv" &&
+                        message.find_first_not_of('M', 8) == std::string_view::npos);
+    ORV_CHECK(name, resultIndicator == kIndicator);
+    ORV_CHECK(name, lobLength(c.out()) == capacity);
+  }
+  return 0;
+}
