@@ -64,8 +64,8 @@ std::vector<Bytes> poolFor(const cat::Slot &slot) {
   const std::string_view name = slot.name;
   std::vector<std::string_view> texts;
   if (name == "date" || name == "value") {
-    texts = {"2001-09-27", "2000-02-29-23.59.59.999999", "1999-12-31   ", "2001-9-7",
-             "2001-02-29", "9999-12-31-24.00.00", "0001-01-01 00:00:00", "not a date"};
+    texts = {"2001-09-27", "2000-02-29-23.59.59.999999", "1999-12-31   ",       "2001-9-7",
+             "2001-02-29", "9999-12-31-24.00.00",        "0001-01-01 00:00:00", "not a date"};
   }
   if (name == "time" || name == "value") {
     texts.insert(texts.end(), {"13:30:15", "24:00:00", "1:2:3", "25:00:00", "13.30.15 "});
@@ -75,7 +75,12 @@ std::vector<Bytes> poolFor(const cat::Slot &slot) {
   }
   if (name == "text") texts = {"1.5", "-2e10", "  42  ", "1e999", "abc", ""};
   if (texts.empty()) {
-    texts = {"", "Hello World", "  padded \t ", "aaaabaaabaab", "Robert", "Tymczak",
+    texts = {"",
+             "Hello World",
+             "  padded \t ",
+             "aaaabaaabaab",
+             "Robert",
+             "Tymczak",
              "ab",
              "The quick brown fox jumps over the lazy dog, and again, and again, and again"};
   }
@@ -83,7 +88,8 @@ std::vector<Bytes> poolFor(const cat::Slot &slot) {
   switch (slot.layout) {
     case cat::Layout::text:
     case cat::Layout::lob:
-      for (std::string_view t : texts) pool.push_back(textBytes(t, slot.layout == cat::Layout::lob));
+      for (std::string_view t : texts)
+        pool.push_back(textBytes(t, slot.layout == cat::Layout::lob));
       break;
     case cat::Layout::int16:
       for (std::int16_t v : {std::int16_t{-32768}, std::int16_t{-7}, std::int16_t{0},
