@@ -1,6 +1,7 @@
 // What differs between the platforms the library is built for, in one
-// place: how an export is marked, the system clock, the path separator and
-// the range of the C library's rand.  Everything else in the library is the
+// place: how an export is marked, the system clock, the path separator,
+// the range of the C library's rand and the powers of ten of ROUND and
+// TRUNCATE.  Everything else in the library is the
 // same source on every platform.
 //
 // `long` is 32 bits on 64-bit Windows and 64 bits on Linux; the library
@@ -8,6 +9,7 @@
 // depends on its width.
 #pragma once
 
+#include <cmath>
 #include <cstdlib>
 #include <ctime>
 
@@ -52,5 +54,22 @@ inline constexpr int kRandomBits = [] {
 }();
 static_assert(kRandomBits >= 15 && (RAND_MAX & (RAND_MAX + 1ULL)) == 0,
               "rand must give a whole number of random bits, at least 15");
+
+// 10 to the power `e`, as the C library's pow gives it.  glibc's pow is
+// correctly rounded here; mingw-w64's is one unit in the last place off for
+// some negative whole exponents (10^-2 among them).  On Windows whole
+// exponents from -22 to 22 are therefore computed from the exact powers
+// 10^0 to 10^22, a division giving the correctly rounded 10^-k, so that
+// ROUND and TRUNCATE give the same bits on both platforms.
+inline double powerOfTen(double e) noexcept {
+#if defined(_WIN32)
+  if (e == std::floor(e) && std::fabs(e) <= 22.0) {
+    double exact = 1.0;
+    for (int k = static_cast<int>(std::fabs(e)); k > 0; --k) exact *= 10.0;  // exact up to 10^22
+    return e < 0.0 ? 1.0 / exact : exact;
+  }
+#endif
+  return std::pow(10.0, e);
+}
 
 }  // namespace cli::platform
