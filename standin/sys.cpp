@@ -21,16 +21,41 @@ constexpr std::uint16_t kUtf8 = 1208;
 
 // ---- Names of months and days ------------------------------------------
 
+// A name as a thread's cache keeps it.  The cache is trivially
+// destructible: mingw-w64 runs the destructors of a DLL's thread_local
+// objects after it has freed their storage, so a thread_local std::string
+// there crashes each thread that ends.
+struct Name {
+  std::size_t size = 0;  // the whole name's length, also beyond what is kept
+  std::array<unsigned char, 255> bytes{};
+
+  Name &operator=(const std::string &name) {
+    size = name.size();
+    std::copy_n(name.begin(), std::min(name.size(), bytes.size()), bytes.begin());
+    return *this;
+  }
+};
+
 // The names of the locale last asked for, looked up once per thread.
-struct Names : orv::standin::Names {
-  std::string locale;
+struct Names {
+  std::array<char, 128> locale{};  // empty when the locale was too long to keep
+  std::array<Name, 12> months{};
+  std::array<Name, 7> days{};  // Sunday first
 };
 
 const Names &namesOf(const char *locale) {
   thread_local Names names;
-  if (names.locale == locale && !names.months[0].empty()) return names;
-  names.locale = locale;
-  if (!orv::standin::namesOf(locale, names)) names.months = {};
+  if (std::strcmp(names.locale.data(), locale) == 0 && names.months[0].size != 0) return names;
+  const std::size_t length = std::strlen(locale);
+  names.locale[0] = '\0';
+  if (length < names.locale.size()) std::copy_n(locale, length + 1, names.locale.begin());
+  orv::standin::Names found;
+  if (!orv::standin::namesOf(locale, found)) {
+    for (Name &m : names.months) m.size = 0;
+    return names;
+  }
+  std::copy(found.months.begin(), found.months.end(), names.months.begin());
+  std::copy(found.days.begin(), found.days.end(), names.days.begin());
   return names;
 }
 
@@ -39,12 +64,12 @@ const char *serverLocale() {
   return locale != nullptr && *locale != '\0' ? locale : "en_US";
 }
 
-std::uint8_t giveName(const std::string &name, std::uint32_t size, unsigned char *out,
+std::uint8_t giveName(const Name &name, std::uint32_t size, unsigned char *out,
                       std::uint16_t *codePage) {
-  if (name.empty() || name.size() > size || name.size() > 255) return 0;
-  std::copy(name.begin(), name.end(), out);  // no terminator: the length is returned
+  if (name.size == 0 || name.size > size || name.size > 255) return 0;
+  std::copy_n(name.bytes.begin(), name.size, out);  // no terminator: the length is returned
   *codePage = kUtf8;
-  return static_cast<std::uint8_t>(name.size());
+  return static_cast<std::uint8_t>(name.size);
 }
 
 // ---- Number text -------------------------------------------------------
