@@ -1,6 +1,7 @@
 # Reads the catalogue's rows that this build has (Built::yes) and writes the
 # linker's list of exports from them: those routines and the data export,
-# nothing else.
+# nothing else.  On Linux the list is a version script, on Windows a module
+# definition (.def) file.
 set(ORV_CATALOGUE ${PROJECT_SOURCE_DIR}/src/catalogue/catalogue.hpp)
 set_property(DIRECTORY ${PROJECT_SOURCE_DIR} APPEND PROPERTY CMAKE_CONFIGURE_DEPENDS ${ORV_CATALOGUE})
 
@@ -25,5 +26,17 @@ function(orv_write_version_script path)
     string(APPEND body "    ${name};\n")
   endforeach()
   string(APPEND body "  local:\n    *;\n};\n")
+  file(CONFIGURE OUTPUT ${path} CONTENT "${body}" @ONLY)
+endfunction()
+
+# Writes a module definition file: the listed names exported undecorated,
+# the data export marked DATA so that it is exported as data, not code.
+# No LIBRARY line: the linker takes the name of the file it writes.
+function(orv_write_module_definition path)
+  orv_built_exports(names)
+  set(body "EXPORTS\n    sqlzThisIsAORVLibrary DATA\n")
+  foreach(name IN LISTS names)
+    string(APPEND body "    ${name}\n")
+  endforeach()
   file(CONFIGURE OUTPUT ${path} CONTENT "${body}" @ONLY)
 endfunction()

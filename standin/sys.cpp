@@ -1,12 +1,5 @@
 // ORVSYS64 stand-in: code pages, names, number text, collation names,
 // the instance path, files, memory blocks and the diagnostic log.
-#include <fcntl.h>
-#include <unicode/dtfmtsym.h>
-#include <unicode/locid.h>
-#include <unicode/ucol.h>
-#include <unicode/unistr.h>
-#include <unistd.h>
-
 #include <algorithm>
 #include <array>
 #include <cerrno>
@@ -18,46 +11,51 @@
 #include <cstring>
 #include <string>
 
-#include "codepages.hpp"
 #include "engine/services.h"
+#include "platform.hpp"
+#include "services_data.hpp"
 
 namespace {
-
-using orv::standin::converterFor;
 
 constexpr std::uint16_t kUtf8 = 1208;
 
 // ---- Names of months and days ------------------------------------------
 
-// The full names of the months and weekdays of one locale, as UTF-8,
-// looked up once per thread for the locale last asked for.
+// A name as a thread's cache keeps it.  The cache is trivially
+// destructible: mingw-w64 runs the destructors of a DLL's thread_local
+// objects after it has freed their storage, so a thread_local std::string
+// there crashes each thread that ends.
+struct Name {
+  std::size_t size = 0;  // the whole name's length, also beyond what is kept
+  std::array<unsigned char, 255> bytes{};
+
+  Name &operator=(const std::string &name) {
+    size = name.size();
+    std::copy_n(name.begin(), std::min(name.size(), bytes.size()), bytes.begin());
+    return *this;
+  }
+};
+
+// The names of the locale last asked for, looked up once per thread.
 struct Names {
-  std::string locale;
-  std::array<std::string, 12> months;
-  std::array<std::string, 7> days;  // Sunday first
+  std::array<char, 128> locale{};  // empty when the locale was too long to keep
+  std::array<Name, 12> months{};
+  std::array<Name, 7> days{};  // Sunday first
 };
 
 const Names &namesOf(const char *locale) {
   thread_local Names names;
-  if (names.locale == locale && !names.months[0].empty()) return names;
-  names.locale = locale;
-  UErrorCode status = U_ZERO_ERROR;
-  const icu::DateFormatSymbols symbols(icu::Locale(locale), status);
-  if (U_FAILURE(status)) {
-    names.months = {};
+  if (std::strcmp(names.locale.data(), locale) == 0 && names.months[0].size != 0) return names;
+  const std::size_t length = std::strlen(locale);
+  names.locale[0] = '\0';
+  if (length < names.locale.size()) std::copy_n(locale, length + 1, names.locale.begin());
+  orv::standin::Names found;
+  if (!orv::standin::namesOf(locale, found)) {
+    for (Name &m : names.months) m.size = 0;
     return names;
   }
-  int32_t count = 0;
-  const icu::UnicodeString *months = symbols.getMonths(count);
-  for (int32_t i = 0; i < 12 && i < count; ++i) {
-    names.months[static_cast<std::size_t>(i)].clear();
-    months[i].toUTF8String(names.months[static_cast<std::size_t>(i)]);
-  }
-  const icu::UnicodeString *days = symbols.getWeekdays(count);  // [1] is Sunday
-  for (int32_t i = 1; i <= 7 && i < count; ++i) {
-    names.days[static_cast<std::size_t>(i - 1)].clear();
-    days[i].toUTF8String(names.days[static_cast<std::size_t>(i - 1)]);
-  }
+  std::copy(found.months.begin(), found.months.end(), names.months.begin());
+  std::copy(found.days.begin(), found.days.end(), names.days.begin());
   return names;
 }
 
@@ -66,12 +64,12 @@ const char *serverLocale() {
   return locale != nullptr && *locale != '\0' ? locale : "en_US";
 }
 
-std::uint8_t giveName(const std::string &name, std::uint32_t size, unsigned char *out,
+std::uint8_t giveName(const Name &name, std::uint32_t size, unsigned char *out,
                       std::uint16_t *codePage) {
-  if (name.empty() || name.size() > size || name.size() > 255) return 0;
-  std::copy(name.begin(), name.end(), out);  // no terminator: the length is returned
+  if (name.size == 0 || name.size > size || name.size > 255) return 0;
+  std::copy_n(name.bytes.begin(), name.size, out);  // no terminator: the length is returned
   *codePage = kUtf8;
-  return static_cast<std::uint8_t>(name.size());
+  return static_cast<std::uint8_t>(name.size);
 }
 
 // ---- Number text -------------------------------------------------------
@@ -129,23 +127,8 @@ extern "C" {
 
 int32_t sqlocpcv(const unsigned char **source, uint32_t sourceLength, uint32_t sourceCodePage,
                  uint32_t targetCodePage, int32_t, CLI_conversionRecord *record, int32_t *) {
-  UConverter *from = converterFor(sourceCodePage, 0);
-  UConverter *to = converterFor(targetCodePage, 1);
-  if (from == nullptr || to == nullptr) return -1;
-  ucnv_reset(from);
-  ucnv_reset(to);
-  char *target = reinterpret_cast<char *>(record->target);
-  char *const start = target;
-  const char *in = reinterpret_cast<const char *>(*source);
-  std::array<UChar, 256> pivot{};
-  UChar *pivotSource = pivot.data();
-  UChar *pivotTarget = pivot.data();
-  UErrorCode status = U_ZERO_ERROR;
-  ucnv_convertEx(to, from, &target, target + record->space, &in, in + sourceLength, pivot.data(),
-                 &pivotSource, &pivotTarget, pivot.data() + pivot.size(), 1, 1, &status);
-  record->space -= static_cast<uint32_t>(target - start);
-  if (status == U_BUFFER_OVERFLOW_ERROR) return -2;
-  return U_FAILURE(status) ? -3 : 0;
+  return orv::standin::convert(*source, sourceLength, sourceCodePage, targetCodePage,
+                               record->target, record->space);
 }
 
 uint8_t sqloNLSGetServerMonthName(const CLI_nlsTimeRecord *time, uint32_t size, unsigned char *name,
@@ -206,7 +189,7 @@ int32_t sqlrxf2a(const double *value, int32_t digits, char *text, uint32_t value
 }
 
 // Identifiers (see standin/README.md): all zeros is IDENTITY; 0x01, a
-// 16-bit little-endian index into ICU's collation locales, a strength of
+// 16-bit little-endian index into the collation locales, a strength of
 // 0 to 4 and four zeros is ICU_<locale>_S<strength>.
 int32_t sqlnlsCollIDMapIDToName(char *name, uint32_t size, const unsigned char *id, int32_t) {
   static const unsigned char kZeros[8] = {};
@@ -215,9 +198,9 @@ int32_t sqlnlsCollIDMapIDToName(char *name, uint32_t size, const unsigned char *
     text = "IDENTITY";
   } else if (id[0] == 0x01 && id[3] <= 4 && std::memcmp(id + 4, kZeros, 4) == 0) {
     const int32_t index = id[1] | (id[2] << 8);
-    if (index >= ucol_countAvailable()) return 0;
-    text = std::string("ICU_") + ucol_getAvailable(index) + "_S" +
-           static_cast<char>('0' + (id[3] == 0 ? 3 : id[3]));
+    std::string locale;
+    if (!orv::standin::collationLocale(index, locale)) return 0;
+    text = "ICU_" + locale + "_S" + static_cast<char>('0' + (id[3] == 0 ? 3 : id[3]));
   } else {
     return 0;
   }
@@ -248,7 +231,7 @@ int32_t sqleinstancepath(int32_t, char *path) {
 }
 
 int32_t sqloopenp(const char *path, int32_t, int32_t, CLI_fileHandle *handle, int32_t) {
-  std::FILE *f = std::fopen(path, "rbe");  // e: close on exec
+  std::FILE *f = std::fopen(path, orv::standin::kReadBinary);
   if (f == nullptr) return 1;
   std::memset(handle->bytes, 0, sizeof handle->bytes);
   std::memcpy(handle->bytes, &f, sizeof(std::FILE *));
@@ -263,7 +246,7 @@ int32_t sqloread(CLI_fileHandle handle, void *destination, uint32_t count, uint3
 
 int32_t sqlochgfileptr(CLI_fileHandle handle, int64_t offset, int32_t origin, int32_t) {
   const int whence = origin == 0 ? SEEK_SET : origin == 2 ? SEEK_END : SEEK_CUR;
-  return ::fseeko(streamOf(handle), static_cast<off_t>(offset), whence) != 0 ? 1 : 0;
+  return orv::standin::seek(streamOf(handle), offset, whence) != 0 ? 1 : 0;
 }
 
 int32_t sqloclose(CLI_fileHandle handle) { return std::fclose(streamOf(handle)) == 0 ? 0 : 1; }

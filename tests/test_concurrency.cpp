@@ -7,7 +7,6 @@
 // values from a pool chosen by its layout and name, so a routine added to
 // the catalogue is covered without a new line here.  RAND is left out: its
 // generator is the C library's, shared by the process by design.
-#include <dlfcn.h>
 #include <gtest/gtest.h>
 
 #include <algorithm>
@@ -27,6 +26,7 @@
 
 #include "catalogue/catalogue.hpp"
 #include "frame/cliudf.h"
+#include "support/platform.hpp"
 
 namespace {
 
@@ -229,7 +229,7 @@ std::vector<Case> allCases(void *library) {
   for (const cat::Routine &r : cat::kRoutines) {
     const bool scalar = r.frame == cat::Frame::plain || r.frame == cat::Frame::dbinfo;
     if (r.built != cat::Built::yes || !scalar || std::string_view(r.sqlName) == "RAND") continue;
-    void *fn = dlsym(library, r.symbol);
+    void *fn = orv::test::findExport(library, r.symbol);
     EXPECT_NE(fn, nullptr) << r.symbol;
     if (fn == nullptr) continue;
     std::vector<std::vector<Bytes>> pools;
@@ -255,8 +255,8 @@ std::vector<Case> allCases(void *library) {
 }
 
 TEST(Concurrency, EightThreadsGiveWhatOneThreadGives) {
-  void *library = dlopen(ORV_LIBRARY_PATH, RTLD_NOW | RTLD_LOCAL);
-  ASSERT_NE(library, nullptr) << dlerror();
+  void *library = orv::test::openLibrary(ORV_LIBRARY_PATH);
+  ASSERT_NE(library, nullptr) << orv::test::loaderError();
   const std::vector<Case> cases = allCases(library);
   ASSERT_GT(cases.size(), 500U);
 
@@ -298,7 +298,7 @@ TEST(Concurrency, EightThreadsGiveWhatOneThreadGives) {
     for (const std::string &m : firstMismatch) all += m.empty() ? "" : m + "; ";
     return all;
   }();
-  dlclose(library);
+  orv::test::closeLibrary(library);
 }
 
 }  // namespace

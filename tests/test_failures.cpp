@@ -2,7 +2,6 @@
 // copy of the library linked to fake services (tests/fakes): what the
 // routines hand each service, and what they do when it fails.
 #include <gtest/gtest.h>
-#include <unistd.h>
 
 #include <array>
 #include <cstdint>
@@ -17,6 +16,7 @@
 #include "frame/cliudf.h"
 #include "snapshot.hpp"
 #include "support/frame_call.hpp"
+#include "support/platform.hpp"
 
 namespace {
 
@@ -27,8 +27,11 @@ class Fakes : public ::testing::Test {
   void SetUp() override {
     using Get = OrvFakes *(*)();
     using Reset = void (*)();
-    fakes = reinterpret_cast<Get>(exportAddress("orv_fakes"))();
-    reinterpret_cast<Reset>(exportAddress("orv_fakes_reset"))();
+    // The control block is the fake services' own, not the library's.
+    void *services = openLibrary(ORV_FAKE_SERVICES_PATH);
+    ASSERT_NE(services, nullptr) << loaderError();
+    fakes = reinterpret_cast<Get>(findExport(services, "orv_fakes"))();
+    reinterpret_cast<Reset>(findExport(services, "orv_fakes_reset"))();
   }
   LibraryInUse use{ORV_FAKES_LIBRARY_PATH};
   OrvFakes *fakes = nullptr;
@@ -168,9 +171,9 @@ class FakeSnapshot : public Fakes {
  protected:
   void SetUp() override {
     Fakes::SetUp();
-    dir = std::filesystem::temp_directory_path() / ("orv_fakes_" + std::to_string(::getpid()));
+    dir = std::filesystem::temp_directory_path() / ("orv_fakes_" + std::to_string(processId()));
     std::filesystem::create_directories(dir / "tmp");
-    std::snprintf(fakes->instancePath, sizeof fakes->instancePath, "%s", dir.c_str());
+    std::snprintf(fakes->instancePath, sizeof fakes->instancePath, "%s", dir.string().c_str());
   }
   void TearDown() override { std::filesystem::remove_all(dir); }
   void write(const std::string &stream) {

@@ -1,7 +1,6 @@
 // SQLCACHE_SNAPSHOT over snapshot files written with the snapshot writer,
 // through open, fetch and close, against the stand-in services.
 #include <gtest/gtest.h>
-#include <unistd.h>
 
 #include <array>
 #include <cstdint>
@@ -16,6 +15,7 @@
 #include "frame/cliudf.h"
 #include "snapshot.hpp"
 #include "support/frame_call.hpp"
+#include "support/platform.hpp"
 
 namespace {
 
@@ -38,15 +38,15 @@ struct Row {
 class Snapshot : public ::testing::Test {
  protected:
   void SetUp() override {
-    dir = fs::temp_directory_path() / ("orv_snapshot_" + std::to_string(::getpid()));
+    dir = fs::temp_directory_path() / ("orv_snapshot_" + std::to_string(orv::test::processId()));
     fs::create_directories(dir / "tmp");
-    setenv("ORVENGINE_INSTANCE_PATH", dir.c_str(), 1);
-    setenv("ORVENGINE_SNAPSHOT_NAME", "cache", 1);
+    orv::test::setEnvironment("ORVENGINE_INSTANCE_PATH", dir.string().c_str());
+    orv::test::setEnvironment("ORVENGINE_SNAPSHOT_NAME", "cache");
   }
   void TearDown() override {
     fs::remove_all(dir);
-    unsetenv("ORVENGINE_INSTANCE_PATH");
-    unsetenv("ORVENGINE_SNAPSHOT_NAME");
+    orv::test::unsetEnvironment("ORVENGINE_INSTANCE_PATH");
+    orv::test::unsetEnvironment("ORVENGINE_SNAPSHOT_NAME");
   }
   void write(const std::string &stream) {
     std::ofstream(dir / "tmp" / "cache.sql", std::ios::binary) << stream;
@@ -192,11 +192,12 @@ TEST_F(Snapshot, ReadsPairsAtOddOffsets) {
 
 TEST_F(Snapshot, EndsTheTableWhenTheFileCannotBeFound) {
   write(statement(numbered(1, "a")));
-  setenv("ORVENGINE_SNAPSHOT_NAME", std::string(300, 'n').c_str(), 1);  // the path would not fit
+  orv::test::setEnvironment("ORVENGINE_SNAPSHOT_NAME",
+                            std::string(300, 'n').c_str());  // the path would not fit
   EXPECT_EQ(texts().size(), 0u);
-  setenv("ORVENGINE_SNAPSHOT_NAME", "missing", 1);
+  orv::test::setEnvironment("ORVENGINE_SNAPSHOT_NAME", "missing");
   EXPECT_EQ(texts().size(), 0u);
-  unsetenv("ORVENGINE_INSTANCE_PATH");
+  orv::test::unsetEnvironment("ORVENGINE_INSTANCE_PATH");
   scratchpad.fill(0);
   EXPECT_EQ(call(CLI_CALL_OPEN).second, "02000");
   EXPECT_EQ(call(CLI_CALL_FETCH).second, "02000");

@@ -23,13 +23,7 @@ constexpr char kNoFraction[] = ".000000";
 // Writes today's date in Coordinated Universal Time as "yyyy-mm-dd-".
 // The clock is read once per call.
 char *writeToday(char *out) noexcept {
-  const std::time_t now = std::time(nullptr);
-  std::tm parts{};
-#if defined(_WIN32)
-  gmtime_s(&parts, &now);
-#else
-  gmtime_r(&now, &parts);
-#endif
+  const std::tm parts = cli::platform::utcNow();
   const auto put = [&](int value, int digits) {
     for (int i = digits - 1; i >= 0; --i, value /= 10) out[i] = static_cast<char>('0' + value % 10);
     out += digits;

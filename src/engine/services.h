@@ -20,7 +20,12 @@
 extern "C" {
 #endif
 
-#if defined(_WIN32)
+/* Marks a service.  On Windows the libraries that provide the services
+ * (built with CLI_SERVICE_BUILD) export them; the library imports them by
+ * name through their import libraries. */
+#if defined(_WIN32) && defined(CLI_SERVICE_BUILD)
+#define CLI_SERVICE_API __declspec(dllexport)
+#elif defined(_WIN32)
 #define CLI_SERVICE_API
 #else
 #define CLI_SERVICE_API __attribute__((visibility("default")))

@@ -21,11 +21,7 @@ namespace {
 using cli::Ind;
 using cli::NameArg;
 
-#if defined(_WIN32)
-constexpr const char *kSeparator = "\\";
-#else
-constexpr const char *kSeparator = "/";
-#endif
+using cli::platform::kPathSeparator;
 
 constexpr std::uint16_t kStatement = 19, kSection = 30, kSectionText = 321, kSectionData = 322;
 constexpr std::uint32_t kTextRoom = 8, kDataRoom = 264;
@@ -79,7 +75,7 @@ void open(Scratch &s, const void *staticData, char *sqlstate) {
   char path[256];
   const int n = name == nullptr ? -1
                                 : std::snprintf(path, sizeof path, "%s%s%s%s%s.%s", instance,
-                                                kSeparator, "tmp", kSeparator, name, "sql");
+                                                kPathSeparator, "tmp", kPathSeparator, name, "sql");
   // A path that does not fit its area is a file that cannot be opened.
   if (n < 0 || static_cast<std::size_t>(n) >= sizeof path) return;
   sqlm_filter_file_name(path);

@@ -11,15 +11,7 @@
 #include <cstring>
 
 #include "cliudf.h"
-
-// Marks a definition as one of the library's exports.  The build also hands
-// the linker the exact list of exports, so a missing mark or an extra
-// symbol is caught either way.
-#if defined(_WIN32)
-#define CLI_EXPORT extern "C" __declspec(dllexport)
-#else
-#define CLI_EXPORT extern "C" __attribute__((visibility("default")))
-#endif
+#include "platform.hpp"
 
 namespace cli {
 

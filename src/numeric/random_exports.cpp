@@ -18,13 +18,8 @@ using cli::NameArg;
 // rand's values reduced to 0..32767.  Where RAND_MAX is larger, as on
 // glibc (2^31 - 1), the top 15 bits are kept: RAND_MAX + 1 is a power of
 // two on the platforms we build for, so every value stays equally likely.
-constexpr int kRandomBits = [] {
-  int bits = 0;
-  for (unsigned long long m = RAND_MAX; m != 0; m >>= 1) ++bits;
-  return bits;
-}();
-static_assert(kRandomBits >= 15 && (RAND_MAX & (RAND_MAX + 1ULL)) == 0,
-              "rand must give a whole number of random bits, at least 15");
+// Where it is 32767 (Windows) the shift is 0 and the value is used as is.
+using cli::platform::kRandomBits;
 
 double next() noexcept {
   // The C library's generator is the one whose sequence srand sets.

@@ -1,7 +1,8 @@
 // ROUND and TRUNCATE to n decimal places (n < 0: places left of the point).
 //
 // Each width has its own method.  The double and 32-bit forms work with a
-// power of ten that pow returns, never one from a table, and evaluate every
+// power of ten that pow returns (cli::platform::powerOfTen), never one from a
+// table, and evaluate every
 // product and quotient in the grouping written here, which decides the last
 // bits.  Negative values go through their magnitude and a sign factor, so
 // that floor serves both signs.  The 64-bit forms use no floating point and
@@ -24,12 +25,14 @@ constexpr double signFactor(double x) { return 0.0 > x ? -1.0 : 1.0; }
 
 // 10 to the power |n|, with n converted to double before its sign is
 // dropped, so that -2147483648 gives 2147483648.0.
-double powerOfTen(std::int32_t n) { return std::pow(10.0, std::fabs(static_cast<double>(n))); }
+double powerOfTen(std::int32_t n) {
+  return cli::platform::powerOfTen(std::fabs(static_cast<double>(n)));
+}
 
 // A half-way value goes away from zero.  Half-way is judged on m / p, with
 // the inexact p of pow: 0.125 at n = 2 gives 0.12.
 Answer<double> roundDouble(double x, std::int32_t n) {
-  const double p = std::pow(10.0, -static_cast<double>(n));
+  const double p = cli::platform::powerOfTen(-static_cast<double>(n));
   if (CLI_isOutOfRange(p) || p == 0.0) return failure<double>(Sysfun::overflow);
   const double m = std::fmod(x, p);
   const double q = std::fabs(m / p);
@@ -43,7 +46,7 @@ Answer<double> roundDouble(double x, std::int32_t n) {
 Answer<double> truncateDouble(double x, std::int32_t n) {
   const double s = signFactor(x);
   const double a = std::fabs(x);
-  const double p = n >= 0 ? std::pow(10.0, static_cast<double>(n)) : powerOfTen(n);
+  const double p = n >= 0 ? cli::platform::powerOfTen(static_cast<double>(n)) : powerOfTen(n);
   if (CLI_isOutOfRange(p)) return failure<double>(Sysfun::overflow);
   if (n >= 0) return success(s * (std::floor(a * p) / p));
   return success((std::floor(a / p) * p) * s);

@@ -2,13 +2,12 @@
 // where the control block says, and keeps what it was handed.
 #include "fakes/fakes.h"
 
-#include <fcntl.h>
-#include <unistd.h>
-
 #include <algorithm>
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
+
+#include "support/platform.hpp"
 
 namespace {
 
@@ -113,7 +112,7 @@ int32_t sqleinstancepath(int32_t, char *path) {
 }
 
 int32_t sqloopenp(const char *path, int32_t, int32_t, CLI_fileHandle *handle, int32_t) {
-  const int fd = ::open(path, O_RDONLY | O_CLOEXEC);
+  const int fd = orv::test::openForReading(path);
   if (fd < 0) return 1;
   ++fakes.opens;
   std::memcpy(handle->bytes, &fd, sizeof fd);
@@ -125,19 +124,19 @@ int32_t sqloopenp(const char *path, int32_t, int32_t, CLI_fileHandle *handle, in
 int32_t sqloread(CLI_fileHandle handle, void *out, uint32_t count, uint32_t *read) {
   *read = 0;
   if (++fakes.reads == fakes.failReadAt) return 1;
-  const ssize_t got = ::read(descriptorOf(handle), out, count);
-  *read = got < 0 ? 0 : static_cast<uint32_t>(got);
-  return got == static_cast<ssize_t>(count) ? 0 : 1;
+  const bool whole = orv::test::readExactly(descriptorOf(handle), out, count);
+  *read = whole ? count : 0;
+  return whole ? 0 : 1;
 }
 
 int32_t sqlochgfileptr(CLI_fileHandle handle, int64_t offset, int32_t, int32_t) {
   if (fakes.seekFails != 0) return 1;
-  return ::lseek(descriptorOf(handle), static_cast<off_t>(offset), SEEK_CUR) < 0 ? 1 : 0;
+  return orv::test::seekBy(descriptorOf(handle), offset) ? 0 : 1;
 }
 
 int32_t sqloclose(CLI_fileHandle handle) {
   ++fakes.closes;
-  return ::close(descriptorOf(handle));
+  return orv::test::closeFile(descriptorOf(handle));
 }
 
 int32_t sqlogmblkEx(void *, uint64_t size, int32_t, void **block, const char *, int32_t, int32_t) {

@@ -1,6 +1,5 @@
 #include "support/frame_call.hpp"
 
-#include <dlfcn.h>
 #include <gtest/gtest.h>
 
 #include <algorithm>
@@ -10,6 +9,8 @@
 #include <iomanip>
 #include <map>
 #include <utility>
+
+#include "support/platform.hpp"
 
 namespace orv::test {
 namespace {
@@ -27,8 +28,8 @@ void *library() {
   static std::map<std::string, void *> handles;
   auto [at, fresh] = handles.try_emplace(currentLibrary, nullptr);
   if (fresh) {
-    at->second = dlopen(currentLibrary, RTLD_NOW | RTLD_LOCAL);
-    if (at->second == nullptr) ADD_FAILURE() << dlerror();
+    at->second = openLibrary(currentLibrary);
+    if (at->second == nullptr) ADD_FAILURE() << currentLibrary << ": " << loaderError();
   }
   return at->second;
 }
@@ -131,7 +132,7 @@ LibraryInUse::LibraryInUse(const char *path) : previous_(currentLibrary) { curre
 LibraryInUse::~LibraryInUse() { currentLibrary = previous_; }
 
 void *exportAddress(const char *name) {
-  return library() == nullptr ? nullptr : dlsym(library(), name);
+  return library() == nullptr ? nullptr : findExport(library(), name);
 }
 
 void PrintTo(const Outcome &o, std::ostream *os) {

@@ -1,8 +1,15 @@
-#include "codepages.hpp"
+// The stand-ins' code pages, names and collations by ICU, on Linux.
+#include <unicode/dtfmtsym.h>
+#include <unicode/locid.h>
+#include <unicode/ucnv.h>
+#include <unicode/ucol.h>
+#include <unicode/unistr.h>
 
 #include <array>
 #include <cstdio>
 #include <utility>
+
+#include "services_data.hpp"
 
 namespace orv::standin {
 namespace {
@@ -89,11 +96,37 @@ class Cache {
   std::array<std::size_t, 2> next_{};
 };
 
-}  // namespace
-
-UConverter *converterFor(std::uint32_t codePage, int role) {
+// The ICU converter for an engine code page, opened for this thread and
+// kept open; null for a code page that is not known.  A conversion takes
+// one converter for its source and another for its target (role 0 and 1),
+// also when both are the same code page.
+UConverter *converterFor(std::uint32_t codePage, int role = 0) {
   thread_local Cache cache;
   return cache.get(codePage, role);
+}
+
+}  // namespace
+
+std::int32_t convert(const unsigned char *source, std::uint32_t length,
+                     std::uint32_t sourceCodePage, std::uint32_t targetCodePage,
+                     unsigned char *target, std::uint32_t &space) {
+  UConverter *from = converterFor(sourceCodePage, 0);
+  UConverter *to = converterFor(targetCodePage, 1);
+  if (from == nullptr || to == nullptr) return -1;
+  ucnv_reset(from);
+  ucnv_reset(to);
+  char *out = reinterpret_cast<char *>(target);
+  char *const start = out;
+  const char *in = reinterpret_cast<const char *>(source);
+  std::array<UChar, 256> pivot{};
+  UChar *pivotSource = pivot.data();
+  UChar *pivotTarget = pivot.data();
+  UErrorCode status = U_ZERO_ERROR;
+  ucnv_convertEx(to, from, &out, out + space, &in, in + length, pivot.data(), &pivotSource,
+                 &pivotTarget, pivot.data() + pivot.size(), 1, 1, &status);
+  space -= static_cast<std::uint32_t>(out - start);
+  if (status == U_BUFFER_OVERFLOW_ERROR) return -2;
+  return U_FAILURE(status) ? -3 : 0;
 }
 
 EncodingClass encodingClassOf(std::uint32_t codePage) {
@@ -123,6 +156,34 @@ EncodingClass encodingClassOf(std::uint32_t codePage) {
   return U_SUCCESS(status) && n == 1 && static_cast<unsigned char>(out[0]) == 0xC1
              ? kSingleByteEbcdic
              : kSingleByte;
+}
+
+}  // namespace orv::standin
+
+namespace orv::standin {
+
+bool namesOf(const char *locale, Names &names) {
+  UErrorCode status = U_ZERO_ERROR;
+  const icu::DateFormatSymbols symbols(icu::Locale(locale), status);
+  if (U_FAILURE(status)) return false;
+  int32_t count = 0;
+  const icu::UnicodeString *months = symbols.getMonths(count);
+  for (int32_t i = 0; i < 12 && i < count; ++i) {
+    names.months[static_cast<std::size_t>(i)].clear();
+    months[i].toUTF8String(names.months[static_cast<std::size_t>(i)]);
+  }
+  const icu::UnicodeString *days = symbols.getWeekdays(count);  // [1] is Sunday
+  for (int32_t i = 1; i <= 7 && i < count; ++i) {
+    names.days[static_cast<std::size_t>(i - 1)].clear();
+    days[i].toUTF8String(names.days[static_cast<std::size_t>(i - 1)]);
+  }
+  return true;
+}
+
+bool collationLocale(std::int32_t index, std::string &locale) {
+  if (index >= ucol_countAvailable()) return false;
+  locale = ucol_getAvailable(index);
+  return true;
 }
 
 }  // namespace orv::standin

@@ -1,0 +1,78 @@
+// What the tests do differently by platform, in one place: loading the
+// library and finding its exports by name (dlopen and dlsym, or
+// LoadLibraryA and GetProcAddress on Windows), the environment, the
+// process id, and the raw file calls of the fake services.
+#pragma once
+
+#include <cstdint>
+#include <string>
+
+#if defined(_WIN32)
+#include <fcntl.h>
+#include <io.h>
+#else
+#include <fcntl.h>
+#include <unistd.h>
+#endif
+
+namespace orv::test {
+
+// Opens a shared library by path (on Windows also by file name, found
+// beside the test program); null on failure, with the reason in
+// loaderError().
+void *openLibrary(const char *path);
+
+// The address of an export of an opened library, or null.
+void *findExport(void *library, const char *name);
+
+// Lets go of a library opened with openLibrary.
+void closeLibrary(void *library);
+
+// Why the last openLibrary failed.
+std::string loaderError();
+
+// The path of the file an opened library was loaded from.
+std::string libraryFile(void *library);
+
+void setEnvironment(const char *name, const char *value);
+void unsetEnvironment(const char *name);
+
+int processId();
+
+// A file descriptor opened for binary reading, or -1.  Header-only, for the
+// fake services, which link nothing of the tests.
+inline int openForReading(const char *path) {
+#if defined(_WIN32)
+  return ::_open(path, _O_RDONLY | _O_BINARY);
+#else
+  return ::open(path, O_RDONLY | O_CLOEXEC);
+#endif
+}
+
+// True when exactly `count` bytes were read.
+inline bool readExactly(int fd, void *out, std::uint32_t count) {
+#if defined(_WIN32)
+  return ::_read(fd, out, count) == static_cast<int>(count);
+#else
+  return ::read(fd, out, count) == static_cast<ssize_t>(count);
+#endif
+}
+
+// Moves the position by `offset` from where it is; false on failure.
+inline bool seekBy(int fd, std::int64_t offset) {
+#if defined(_WIN32)
+  return ::_lseeki64(fd, offset, SEEK_CUR) >= 0;
+#else
+  return ::lseek(fd, static_cast<off_t>(offset), SEEK_CUR) >= 0;
+#endif
+}
+
+inline int closeFile(int fd) {
+#if defined(_WIN32)
+  return ::_close(fd);
+#else
+  return ::close(fd);
+#endif
+}
+
+}  // namespace orv::test
