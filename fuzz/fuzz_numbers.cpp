@@ -24,16 +24,6 @@ namespace {
 using namespace orv::fuzz;
 using I128 = __int128;
 
-template <typename T>
-T take(const std::uint8_t *&data, std::size_t &size) {
-  T v{};
-  const std::size_t n = size < sizeof v ? size : sizeof v;
-  std::memcpy(&v, data, n);
-  data += n;
-  size -= n;
-  return v;
-}
-
 std::uint64_t bits(double d) {
   std::uint64_t b;
   std::memcpy(&b, &d, 8);

@@ -59,16 +59,6 @@ std::int32_t callback(std::int32_t slots, void *request) {
   return engine->openStatus;
 }
 
-template <typename T>
-T take(const std::uint8_t *&data, std::size_t &size) {
-  T v{};
-  const std::size_t n = size < sizeof v ? size : sizeof v;
-  std::memcpy(&v, data, n);
-  data += n;
-  size -= n;
-  return v;
-}
-
 std::string failed(std::int32_t status) {
   char text[CLI_MESSAGE_SIZE];
   static_cast<void>(std::snprintf(text, sizeof text, "API call failed %" PRId32, status));

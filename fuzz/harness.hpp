@@ -117,6 +117,18 @@ class Block {
 };
 
 // Value layouts, laid out into blocks of their exact size.
+// The next value of type T from the fuzzer's bytes, zero-filled where the
+// bytes run out.
+template <typename T>
+T take(const std::uint8_t *&data, std::size_t &size) {
+  T v{};
+  const std::size_t n = size < sizeof v ? size : sizeof v;
+  std::memcpy(&v, data, n);
+  data += n;
+  size -= n;
+  return v;
+}
+
 inline Block textBlock(std::string_view s) {
   Block b(s.size() + 1);
   std::memcpy(b.data(), s.data(), s.size());
