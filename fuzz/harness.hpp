@@ -179,13 +179,33 @@ inline std::string_view textIn(const char *routine, const Block &b) {
   return {b.chars(), static_cast<std::size_t>(static_cast<const unsigned char *>(end) - b.data())};
 }
 
-// The address of an export of the linked library, looked up by name as an
-// engine finds it.
-inline void *exportAddress(const char *name) {
-  void *fn = dlsym(RTLD_DEFAULT, name);
-  if (fn == nullptr) broken(name, "not exported");
-  return fn;
+// An export of the linked library, looked up by name as an engine finds
+// it, with its catalogue entry.
+struct Export {
+  const cli::catalogue::Routine *routine = nullptr;
+  void *address = nullptr;
+};
+
+// Lookups are kept by the address of the name, which is almost always a
+// literal, with the name itself to confirm a hit; a run makes hundreds of
+// calls and the lookup would otherwise cost as much as the routine.
+inline Export lookUp(const char *name) {
+  struct Seen {
+    const char *at;
+    std::string name;
+    Export found;
+  };
+  static auto *seen = new std::vector<Seen>;  // never destroyed: see Pool
+  for (const Seen &s : *seen) {
+    if (s.at == name && s.name == name) return s.found;
+  }
+  Export e{cli::catalogue::find(name), dlsym(RTLD_DEFAULT, name)};
+  if (e.address == nullptr) broken(name, "not exported");
+  if (seen->size() < 256) seen->push_back({name, name, e});
+  return e;
 }
+
+inline void *exportAddress(const char *name) { return lookUp(name).address; }
 
 // Every frame argument is a pointer, so a pointer type taking K void *
 // parameters serves for any routine with a frame of K arguments.
@@ -253,8 +273,15 @@ inline bool trimmedOrSame(std::string_view before, std::string_view after, Trim 
 // block, with indicators and status buffers of their exact sizes.
 class Call {
  public:
-  explicit Call(const char *name) : name_(name), routine_(cli::catalogue::find(name)) {
-    if (routine_ == nullptr) broken(name, "not in the catalogue");
+  explicit Call(const char *name) : name_(name), export_(lookUp(name)) {
+    if (export_.routine == nullptr) broken(name, "not in the catalogue");
+    inputs_.reserve(4);
+    results_.reserve(2);
+    indicators_.reserve(6);
+    trims_.reserve(4);
+    heads_.reserve(2);
+    before_.reserve(4);
+    resultsBefore_.reserve(2);
   }
 
   Call &input(Block b, Trim trim = Trim::none) {
@@ -325,6 +352,7 @@ class Call {
     sqlstate_ = Block(CLI_SQLSTATE_SIZE, 'S');
     message_ = Block(CLI_MESSAGE_SIZE, 'M');
     std::vector<void *> args;
+    args.reserve(inputs_.size() + results_.size() + indicators_.size() + 4 + extras_.size());
     for (const Block &b : inputs_) args.push_back(b.data());
     for (const Block &b : results_) args.push_back(b.data());
     for (const Block &b : indicators_) args.push_back(b.data());
@@ -333,7 +361,7 @@ class Call {
     args.push_back(const_cast<char *>("SPECIFIC"));
     args.push_back(message_.data());
     args.insert(args.end(), extras_.begin(), extras_.end());
-    invoke(name_, exportAddress(name_), args);
+    invoke(name_, export_.address, args);
   }
 
   // The SYSFUN code of the call, after checking the exact form of the
@@ -352,7 +380,8 @@ class Call {
     static constexpr std::string_view kKnown[] = {"01", "02", "03", "04", "05",
                                                   "06", "07", "08", "10", "11"};
     ORV_CHECK(name_, std::find(std::begin(kKnown), std::end(kKnown), code) != std::end(kKnown));
-    ORV_CHECK(name_, std::string_view(routine_->sysfunCodes).find(code) != std::string_view::npos);
+    ORV_CHECK(name_,
+              std::string_view(export_.routine->sysfunCodes).find(code) != std::string_view::npos);
     return code;
   }
 
@@ -376,7 +405,7 @@ class Call {
 
  private:
   const char *name_;
-  const cli::catalogue::Routine *routine_;
+  Export export_;
   std::vector<Block> inputs_, results_, indicators_;
   std::vector<Trim> trims_;
   std::vector<std::size_t> heads_;
