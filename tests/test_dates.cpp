@@ -13,6 +13,7 @@
 #include <string>
 #include <string_view>
 
+#include "models/duration.hpp"
 #include "support/frame_call.hpp"
 
 namespace {
@@ -454,62 +455,9 @@ TEST(Timestamp, JoinsTheTextAsWrittenWithMidnightOrToday) {
   }
 }
 
-// TIMESTAMPDIFF computed again with exact integers from the text's fields.
 Outcome durationModel(std::int32_t code, const std::string &text) {
-  std::string s = text;
-  while (s.size() > 1 && s.back() == ' ') s.pop_back();
-  const bool negative = !s.empty() && s[0] == '-';
-  if (!s.empty() && (s[0] == '-' || s[0] == '+')) s.erase(0, 1);
-  const auto point = s.find('.');
-  const std::string whole = s.substr(0, point);
-  const std::string fraction = point == std::string::npos ? "" : s.substr(point + 1);
-  for (const std::string &part : {whole, fraction}) {
-    if (part.find_first_not_of("0123456789") != std::string::npos) return fails("07");
-  }
-  if (whole.size() > 14 || fraction.size() > 6) return fails("10");
-  const std::string digits = std::string(14 - whole.size(), '0') + whole;
-  const auto at = [&](std::size_t from, std::size_t n) {
-    return std::stoll(digits.substr(from, n));
-  };
-  const long long y = at(0, 4), mo = at(4, 2), d = at(6, 2), h = at(8, 2), mi = at(10, 2),
-                  sec = at(12, 2), f = std::stoll((fraction + "000000").substr(0, 6));
-  const long long minutes = ((y * 365 + mo * 30 + d) * 24 + h) * 60 + mi;
-  long long value = 0;
-  switch (code) {
-    case 1:
-      value = (minutes * 60 + sec) * 1000000 + f;
-      break;
-    case 2:
-      value = minutes * 60 + sec;
-      break;
-    case 4:
-      value = minutes;
-      break;
-    case 8:
-      value = (y * 365 + mo * 30 + d) * 24 + h;
-      break;
-    case 16:
-      value = y * 365 + mo * 30 + d;
-      break;
-    case 32:
-      value = y * 52 + (mo * 30 + d) / 7;
-      break;
-    case 64:
-      value = y * 12 + mo;
-      break;
-    case 128:
-      value = y * 4 + mo / 3;
-      break;
-    case 256:
-      value = y;
-      break;
-    default:
-      return fails("08");
-  }
-  // Minutes have no overflow test: their sum is kept in 32 bits.
-  if (code != 4 && value > 2147483647) return fails("03");
-  const long long signedValue = negative ? -value : value;
-  return ok(std::int64_t{static_cast<std::int32_t>(static_cast<std::uint32_t>(signedValue))});
+  const orv::model::Duration want = orv::model::timestampDiff(code, text);
+  return want.code.empty() ? ok(want.value) : fails(want.code);
 }
 
 TEST(TimestampDiff, ConvertsDurationsByFixedRatios) {
