@@ -81,24 +81,34 @@ void drive(bool threads, const std::uint8_t *&data, std::size_t &size) {
     e.table.data()[i] = take<std::uint8_t>(data, size);
   engine = &e;
 
+  // Each argument has a block of its own for the whole table, laid out
+  // afresh before every call: a table makes up to 70 calls, and new blocks
+  // for each would cost far more than the routine.
   Block scratchpad(100, 0);
+  std::vector<Block> results;
+  for (int i = 0; i < 6; ++i) results.emplace_back(!threads && i >= 2 ? 2 : 4);
+  std::vector<Block> inds;
+  for (int i = 0; i < 6 + (threads ? 1 : 0); ++i) inds.emplace_back(2);
+  Block sqlstate(CLI_SQLSTATE_SIZE), message(CLI_MESSAGE_SIZE), input(4), type(4);
+  std::vector<void *> args;
+  if (threads) args.push_back(input.data());
+  for (Block &r : results) args.push_back(r.data());
+  for (Block &i : inds) args.push_back(i.data());
+  args.insert(args.end(), {sqlstate.data(), const_cast<char *>("FUNCTION"),
+                           const_cast<char *>("SPECIFIC"), message.data(), scratchpad.data(),
+                           type.data(), reinterpret_cast<void *>(&callback)});
+  void *const address = exportAddress(name);
+
   const auto run = [&](std::int32_t callType, std::array<std::int64_t, 6> &row,
                        std::array<std::int16_t, 6> &indicators, std::string &state) {
-    std::vector<Block> results;
-    for (int i = 0; i < 6; ++i) results.emplace_back(!threads && i >= 2 ? 2 : 4);
-    std::vector<Block> inds;
-    for (int i = 0; i < 6 + (threads ? 1 : 0); ++i) inds.push_back(numberBlock(kIndicator));
-    Block sqlstate(CLI_SQLSTATE_SIZE, 'S'), message(CLI_MESSAGE_SIZE, 'M');
-    Block input = numberBlock(selector), type = numberBlock(callType);
-    std::vector<void *> args;
-    if (threads) args.push_back(input.data());
-    for (Block &r : results) args.push_back(r.data());
-    for (Block &i : inds) args.push_back(i.data());
-    args.insert(args.end(), {sqlstate.data(), const_cast<char *>("FUNCTION"),
-                             const_cast<char *>("SPECIFIC"), message.data(), scratchpad.data(),
-                             type.data(), reinterpret_cast<void *>(&callback)});
-    invoke(name, exportAddress(name), args);
-    ORV_CHECK(name, input.view() == numberBlock(selector).view());
+    for (Block &r : results) std::memset(r.data(), kUnwritten, r.size());
+    for (Block &i : inds) std::memcpy(i.data(), &kIndicator, 2);
+    std::memset(sqlstate.data(), 'S', sqlstate.size());
+    std::memset(message.data(), 'M', message.size());
+    std::memcpy(input.data(), &selector, 4);
+    std::memcpy(type.data(), &callType, 4);
+    invoke(name, address, args);
+    ORV_CHECK(name, numberIn<std::int32_t>(input) == selector);
     if (threads) ORV_CHECK(name, numberIn<std::int16_t>(inds[0]) == kIndicator);
     const std::size_t first = threads ? 1 : 0;
     bool untouched = true;
