@@ -36,27 +36,20 @@ fs::path &file() {
   return path;
 }
 
+// Each argument has a block of its own, kept across calls and runs and
+// laid out afresh before every call.
 struct Table {
   std::vector<Block> numbers;
   Block text{9};
   Block statement{CLI_LOB_AREA_SIZE(std::size_t{CLI_LOB_LIMIT})};
   std::vector<Block> indicators;
   Block scratchpad{100, 0};
+  Block sqlstate{CLI_SQLSTATE_SIZE}, message{CLI_MESSAGE_SIZE}, type{4};
+  std::vector<void *> args;
 
   Table() {
     for (int i = 0; i < 16; ++i) numbers.emplace_back(4);
-  }
-
-  // One call; returns the SQLSTATE's five characters, empty for none.
-  std::string call(std::int32_t callType) {
-    indicators.clear();
-    for (int i = 0; i < 18; ++i) indicators.push_back(numberBlock(kIndicator));
-    for (Block &n : numbers) std::memset(n.data(), kUnwritten, 4);
-    std::memset(text.data(), kUnwritten, text.size());
-    std::memset(statement.data(), kUnwritten, 8);
-    Block sqlstate(CLI_SQLSTATE_SIZE, 'S'), message(CLI_MESSAGE_SIZE, 'M');
-    Block type = numberBlock(callType);
-    std::vector<void *> args;
+    for (int i = 0; i < 18; ++i) indicators.emplace_back(2);
     for (Block &n : numbers) args.push_back(n.data());
     args.push_back(text.data());
     args.push_back(statement.data());
@@ -64,7 +57,19 @@ struct Table {
     args.insert(args.end(),
                 {sqlstate.data(), const_cast<char *>("FUNCTION"), const_cast<char *>("SPECIFIC"),
                  message.data(), scratchpad.data(), type.data()});
-    invoke(kName, exportAddress(kName), args);
+  }
+
+  // One call; returns the SQLSTATE's five characters, empty for none.
+  std::string call(std::int32_t callType) {
+    for (Block &i : indicators) std::memcpy(i.data(), &kIndicator, 2);
+    for (Block &n : numbers) std::memset(n.data(), kUnwritten, 4);
+    std::memset(text.data(), kUnwritten, text.size());
+    std::memset(statement.data(), kUnwritten, 8);
+    std::memset(sqlstate.data(), 'S', sqlstate.size());
+    std::memset(message.data(), 'M', message.size());
+    std::memcpy(type.data(), &callType, 4);
+    static void *const address = exportAddress(kName);
+    invoke(kName, address, args);
     ORV_CHECK(kName, Call::untouched(message, 'M'));
     if (Call::untouched(sqlstate, 'S')) return {};
     ORV_CHECK(kName, sqlstate.holds(std::string_view("02000\0", 6)));
@@ -85,8 +90,12 @@ struct Table {
 }  // namespace
 
 extern "C" int LLVMFuzzerInitialize(int *, char ***) {
-  const fs::path dir =
-      fs::temp_directory_path() / ("orv_fuzz_snapshot_" + std::to_string(::getpid()));
+  // In memory where the system has such a place: rewriting a file on disk
+  // on every run makes the file system flush it to the device on close.
+  std::error_code error;
+  const fs::path base =
+      fs::is_directory("/dev/shm", error) ? fs::path("/dev/shm") : fs::temp_directory_path();
+  const fs::path dir = base / ("orv_fuzz_snapshot_" + std::to_string(::getpid()));
   fs::create_directories(dir / "tmp");
   setenv("ORVENGINE_INSTANCE_PATH", dir.c_str(), 1);
   setenv("ORVENGINE_SNAPSHOT_NAME", "cache", 1);
