@@ -157,9 +157,9 @@ enum class Family : std::uint8_t {
   insert,
   locate,
   ascii,
-  spaceChar,
+  spaceChar,  // the last
 };
-constexpr std::uint8_t kFamilies = 9;
+constexpr unsigned kFamilies = static_cast<unsigned>(Family::spaceChar) + 1;
 
 }  // namespace
 
@@ -198,8 +198,7 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t *data, std::size_t size
   }
   std::string big(part[0]);
   // Growing to 1 MiB makes a call thousands of times slower.
-  const bool grow = (hash & 1023u) == 0 && !big.empty();
-  if (grow) {
+  if ((hash & 1023u) == 0 && !big.empty()) {
     const std::size_t target = kLob - 2 + (capacity >> 8) % 5;
     while (big.size() < target) big.append(big.substr(0, target - big.size()));
   }
