@@ -68,8 +68,7 @@ struct Table {
     std::memset(sqlstate.data(), 'S', sqlstate.size());
     std::memset(message.data(), 'M', message.size());
     std::memcpy(type.data(), &callType, 4);
-    static void *const address = exportAddress(kName);
-    invoke(kName, address, args);
+    invoke(kName, exportAddress(kName), args);
     ORV_CHECK(kName, Call::untouched(message, 'M'));
     if (Call::untouched(sqlstate, 'S')) return {};
     ORV_CHECK(kName, sqlstate.holds(std::string_view("02000\0", 6)));
