@@ -9,6 +9,7 @@
 #include <vector>
 
 #include "support/frame_call.hpp"
+#include "support/platform.hpp"
 
 namespace {
 
@@ -176,8 +177,9 @@ TEST(LocateReplaceInsert, AgreeWithNaiveModelsOnSmallAlphabets) {
 
 // ---- SOUNDEX and DIFFERENCE ---------------------------------------------
 
-// The code as its steps tell it, with the groups looked up by name.
-std::string soundexModel(const std::string &text) {
+// The code as its steps tell it, with the groups looked up by name, before
+// it is filled up with zeros: four characters once it is complete.
+std::string soundexSoFar(const std::string &text) {
   const auto value = [](unsigned char c) -> int {
     if (!((c >= 'A' && c <= 'Z') || (c >= 'a' && c <= 'z'))) return -1;
     const std::string groups[] = {"AEHIOUWY", "BFPV", "CGJKQSXZ", "DT", "L", "MN", "R"};
@@ -188,7 +190,7 @@ std::string soundexModel(const std::string &text) {
   };
   std::size_t i = 0;
   while (i < text.size() && value(static_cast<unsigned char>(text[i])) < 0) ++i;
-  if (i == text.size()) return "Z000";
+  if (i == text.size()) return "";
   std::string code(1, static_cast<char>(std::toupper(static_cast<unsigned char>(text[i]))));
   int last = value(static_cast<unsigned char>(text[i]));
   for (++i; i < text.size() && code.size() < 4; ++i) {
@@ -197,7 +199,12 @@ std::string soundexModel(const std::string &text) {
     last = v;
     if (v != 0) code += static_cast<char>('0' + v);
   }
-  return code + std::string(4 - code.size(), '0');
+  return code;
+}
+
+std::string soundexModel(const std::string &text) {
+  const std::string code = soundexSoFar(text);
+  return code.empty() ? "Z000" : code + std::string(4 - code.size(), '0');
 }
 
 TEST(Soundex, CodesNamesAsTheRulesSay) {
@@ -254,6 +261,40 @@ TEST(Soundex, AgreesWithTheModelOnRandomBytes) {
       same += a[static_cast<std::size_t>(i)] == b[static_cast<std::size_t>(i)];
     ASSERT_EQ(call("CLI_udfDIFFERENCE", {text(s), text(other)}, intArea()), n(same));
   }
+}
+
+// Once the code has four characters the rest of the text is not read: a
+// text cut right behind the byte that completes its code, with no
+// terminator, against a page that can't be read, gives the whole text's
+// code, alone and in both places of DIFFERENCE.
+TEST(Soundex, ReadsNothingBehindTheByteThatCompletesTheCode) {
+  orv::test::BytesBeforeAGuardPage first, second;
+  std::mt19937 rng(4242);
+  std::vector<std::string> texts = {"Robert",    "Rupert",    "Ashcraft",
+                                    "Tymczak",   "a b c d e", "abcdefghijklmnopqrstuvwxyz",
+                                    "Gutierrez", "McDonald"};
+  for (int i = 0; i < 3000; ++i) {
+    std::string s(1 + rng() % 14, ' ');
+    for (char &c : s) c = "BbFfPpAaHhWwCcDdLlMmRrTt -1\xE9"[rng() % 28];
+    texts.push_back(s);
+  }
+  int placed = 0;
+  for (const std::string &name : texts) {
+    std::size_t cut = 1;
+    while (cut <= name.size() && soundexSoFar(name.substr(0, cut)).size() < 4) ++cut;
+    if (cut > name.size()) continue;  // the code is never complete: the terminator is read
+    const std::string head = name.substr(0, cut), code = soundexModel(name);
+    ++placed;
+    ASSERT_EQ(call("CLI_udfSOUNDEX", {placedAt(first.place(head))}, textArea(5)), ok(code)) << name;
+    const std::string other = name.substr(cut - 1) + "q";
+    int same = 0;
+    for (std::size_t k = 0; k < 4; ++k) same += code[k] == soundexModel(other)[k] ? 1 : 0;
+    ASSERT_EQ(call("CLI_udfDIFFERENCE", {placedAt(first.place(head)), text(other)}, intArea()),
+              n(same));
+    ASSERT_EQ(call("CLI_udfDIFFERENCE", {text(other), placedAt(second.place(head))}, intArea()),
+              n(same));
+  }
+  EXPECT_GT(placed, 1000);
 }
 
 }  // namespace

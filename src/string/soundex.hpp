@@ -37,7 +37,9 @@ inline void CLI_soundexCode(const char *text, char *code) noexcept {
   code[0] = static_cast<char>(*p & ~0x20);  // upper case by the ASCII rule
   std::uint8_t last = kSoundexValues[*p];
   int n = 1;
-  for (++p; *p != 0 && n < 4; ++p) {
+  // The count is tested before the byte: once the code is complete,
+  // nothing behind the byte that completed it is read.
+  for (++p; n < 4 && *p != 0; ++p) {
     const std::uint8_t value = kSoundexValues[*p];
     if (value == kNoLetter || value == last) continue;
     last = value;

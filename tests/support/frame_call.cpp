@@ -186,7 +186,10 @@ Outcome callFrame(const char *name, const std::vector<Value> &inputs, const Valu
 
   std::vector<void *> args;
   args.reserve(2 * inputs.size() + 6);
-  for (auto &v : in) args.push_back(v.data());
+  for (std::size_t i = 0; i < in.size(); ++i) {
+    args.push_back(inputs[i].placed != nullptr ? const_cast<void *>(inputs[i].placed)
+                                               : in[i].data());
+  }
   args.push_back(out.data());
   for (auto &i : indicators) args.push_back(&i);
   args.push_back(sqlstate);

@@ -18,10 +18,11 @@ namespace orv::test {
 // An input or the shape of a result, in one of the frame's layouts.
 struct Value {
   enum class Layout { int16, int32, int64, real, text, lob, fixed } layout;
-  std::int64_t number = 0;  // an integer, or the bits of a double
-  std::string bytes;        // text without its terminator, or CLI_udfLob data
-  std::uint32_t size = 0;   // result area: text area bytes, CLI_udfLob capacity, fixed bytes
-  bool null = false;        // for routines that read their input indicators
+  std::int64_t number = 0;       // an integer, or the bits of a double
+  std::string bytes;             // text without its terminator, or CLI_udfLob data
+  std::uint32_t size = 0;        // result area: text area bytes, CLI_udfLob capacity, fixed bytes
+  bool null = false;             // for routines that read their input indicators
+  const void *placed = nullptr;  // an input laid out by the caller, passed as it is
 };
 
 inline std::uint64_t bitsOf(double d) { return std::bit_cast<std::uint64_t>(d); }
@@ -37,6 +38,13 @@ inline Value lob(std::string s) { return {Value::Layout::lob, 0, std::move(s), 0
 // Fixed bytes as an input; as a result, an area of exactly `size` bytes.
 inline Value fixed(std::string s) { return {Value::Layout::fixed, 0, std::move(s), 0}; }
 inline Value fixedArea(std::uint32_t size) { return {Value::Layout::fixed, 0, {}, size}; }
+// Terminated text (or any input) that the caller has laid out at `at`, in a
+// place of its choosing: against a page that can't be read, say.
+inline Value placedAt(const void *at) {
+  Value v{Value::Layout::text, 0, {}, 0};
+  v.placed = at;
+  return v;
+}
 inline Value nullOf(Value v) {
   v.null = true;
   return v;

@@ -8,10 +8,13 @@
 #else
 #include <dlfcn.h>
 #include <link.h>
+#include <sys/mman.h>
 #include <unistd.h>
 
 #include <cstdlib>
 #endif
+
+#include <cstring>
 
 namespace orv::test {
 
@@ -42,6 +45,20 @@ void unsetEnvironment(const char *name) { ::_putenv_s(name, ""); }
 
 int processId() { return ::_getpid(); }
 
+BytesBeforeAGuardPage::BytesBeforeAGuardPage() {
+  SYSTEM_INFO info;
+  ::GetSystemInfo(&info);
+  page_ = info.dwPageSize;
+  pages_ = static_cast<unsigned char *>(
+      ::VirtualAlloc(nullptr, 2 * page_, MEM_RESERVE | MEM_COMMIT, PAGE_READWRITE));
+  DWORD was = 0;
+  if (pages_ == nullptr || !::VirtualProtect(pages_ + page_, page_, PAGE_NOACCESS, &was)) {
+    std::abort();
+  }
+}
+
+BytesBeforeAGuardPage::~BytesBeforeAGuardPage() { ::VirtualFree(pages_, 0, MEM_RELEASE); }
+
 #else
 
 void *openLibrary(const char *path) { return ::dlopen(path, RTLD_NOW | RTLD_LOCAL); }
@@ -67,6 +84,23 @@ void unsetEnvironment(const char *name) { ::unsetenv(name); }
 
 int processId() { return static_cast<int>(::getpid()); }
 
+BytesBeforeAGuardPage::BytesBeforeAGuardPage()
+    : page_(static_cast<std::size_t>(::sysconf(_SC_PAGESIZE))) {
+  void *at = ::mmap(nullptr, 2 * page_, PROT_READ | PROT_WRITE, MAP_PRIVATE | MAP_ANONYMOUS, -1, 0);
+  if (at == MAP_FAILED || ::mprotect(static_cast<char *>(at) + page_, page_, PROT_NONE) != 0) {
+    std::abort();
+  }
+  pages_ = static_cast<unsigned char *>(at);
+}
+
+BytesBeforeAGuardPage::~BytesBeforeAGuardPage() { ::munmap(pages_, 2 * page_); }
+
 #endif
+
+const char *BytesBeforeAGuardPage::place(const std::string &bytes) {
+  unsigned char *at = pages_ + page_ - bytes.size();
+  std::memcpy(at, bytes.data(), bytes.size());
+  return reinterpret_cast<const char *>(at);
+}
 
 }  // namespace orv::test

@@ -39,6 +39,23 @@ void unsetEnvironment(const char *name);
 
 int processId();
 
+// Bytes placed so that their last one is the last readable byte before a
+// page that can't be read: a routine that reads one byte too many dies.
+class BytesBeforeAGuardPage {
+ public:
+  BytesBeforeAGuardPage();
+  ~BytesBeforeAGuardPage();
+  BytesBeforeAGuardPage(const BytesBeforeAGuardPage &) = delete;
+  BytesBeforeAGuardPage &operator=(const BytesBeforeAGuardPage &) = delete;
+
+  // Copies `bytes` (at most a page) to end at the guard; returns their start.
+  const char *place(const std::string &bytes);
+
+ private:
+  unsigned char *pages_;
+  std::size_t page_;
+};
+
 // A file descriptor opened for binary reading, or -1.  Header-only, for the
 // fake services, which link nothing of the tests.
 inline int openForReading(const char *path) {
