@@ -7,6 +7,7 @@
 #include <unistd.h>
 
 #include <algorithm>
+#include <chrono>
 #include <cmath>
 #include <cstdint>
 #include <cstdio>
@@ -14,6 +15,7 @@
 #include <cstring>
 #include <filesystem>
 #include <fstream>
+#include <map>
 #include <string>
 #include <utility>
 #include <vector>
@@ -74,8 +76,10 @@ void invoke(void *fn, void *const *args, std::index_sequence<Is...>) {
 // Calls `name` with the inputs and one result in a loop.  A CLI_udfLob
 // result's length word is set to its capacity before each call, as an
 // engine hands it.
-void run(benchmark::State &state, const char *name, std::vector<std::vector<unsigned char>> inputs,
-         std::vector<unsigned char> result, std::int64_t bytesPerCall = 0) {
+// Returns the time of one call in nanoseconds, by the wall clock.
+double run(benchmark::State &state, const char *name,
+           std::vector<std::vector<unsigned char>> inputs, std::vector<unsigned char> result,
+           std::int64_t bytesPerCall = 0) {
   void *fn = exportNamed(name);
   std::int16_t indicators[5] = {};
   char sqlstate[6] = {};
@@ -89,6 +93,7 @@ void run(benchmark::State &state, const char *name, std::vector<std::vector<unsi
   // Text and integer areas start zeroed, so only a CLI_udfLob has one.
   std::uint32_t capacity = 0;
   std::memcpy(&capacity, result.data(), 4);
+  const auto start = std::chrono::steady_clock::now();
   for (auto _ : state) {
     if (capacity != 0) std::memcpy(result.data(), &capacity, 4);
     switch (args.size()) {
@@ -110,12 +115,14 @@ void run(benchmark::State &state, const char *name, std::vector<std::vector<unsi
     benchmark::DoNotOptimize(result.data());
     benchmark::ClobberMemory();
   }
+  const std::chrono::duration<double, std::nano> spent = std::chrono::steady_clock::now() - start;
   if (sqlstate[0] != '\0') state.SkipWithError("the routine reported a status");
   if (bytesPerCall != 0) state.SetBytesProcessed(state.iterations() * bytesPerCall);
+  return spent.count() / static_cast<double>(state.iterations());
 }
 
 const std::string k20 = "  Mixed Case Text   ";  // 20 bytes, blanks at both ends
-const std::string kMiB(1 << 20, 'Q');
+const std::string kMiBOfQ(1 << 20, 'Q');
 
 void space(benchmark::State &s) { run(s, "CLI_udfSPACE", {int32(20)}, textArea()); }
 void lcase1(benchmark::State &s) { run(s, "CLI_udfLCASE1", {text(k20)}, textArea()); }
@@ -128,7 +135,7 @@ void rtrim2(benchmark::State &s) { run(s, "CLI_udfRTRIM2", {lob(k20)}, lobArea(6
 void charCode(benchmark::State &s) { run(s, "CLI_udfCHAR", {int32(65)}, textArea()); }
 void ascii1(benchmark::State &s) { run(s, "CLI_udfASCII1", {text(k20)}, int32(0)); }
 
-void lcase2MiB(benchmark::State &s) { run(s, "CLI_udfLCASE2", {lob(kMiB)}, lobArea(), 1 << 20); }
+void lcase2MiB(benchmark::State &s) { run(s, "CLI_udfLCASE2", {lob(kMiBOfQ)}, lobArea(), 1 << 20); }
 void repeat2MiB(benchmark::State &s) {
   run(s, "CLI_udfREPEAT2", {lob("0123456789abcdef"), int32(65536)}, lobArea(), 1 << 20);
 }
@@ -292,88 +299,166 @@ const bool kMathRowsRegistered = [] {
 }();
 
 // Searching and rebuilding.  The 1 MiB rows report bytes of the searched
-// string per second; the needle rows of 'a' are the inputs that make a
-// left-to-right search quadratic.
-std::string words(std::size_t size) {
-  const std::string line = "the quick brown fox jumps over the lazy dog, then naps by the river. ";
+// string per second, and their time as a ratio to two rivals measured in
+// the same run: `x memmove`, to a memmove of 1 MiB (the cost of touching
+// the data at all), and `x memmem`, to the C library's memmem on the same
+// search string and text.  The shapes are those that make searches slow:
+// needles of 'a' with one 'b' (quadratic when searched naively), periodic
+// text with a needle that breaks the period at one end, and small
+// alphabets.
+std::string repeated(const std::string &unit, std::size_t size) {
   std::string out;
-  while (out.size() < size) out += line;
+  while (out.size() < size) out += unit;
   out.resize(size);
   return out;
+}
+std::string words(std::size_t size) {
+  return repeated("the quick brown fox jumps over the lazy dog, then naps by the river. ", size);
 }
 std::string everyHundred(std::size_t size) {  // "x" once in every 100 bytes
   std::string out = words(size);
   for (std::size_t i = 50; i < size; i += 100) out[i] = 'x';
   return out;
 }
-const std::string kAs(1 << 20, 'a');
+std::string randomOver(const char *alphabet, std::size_t size, unsigned seed) {
+  std::uint64_t state = seed;  // a fixed generator, so every run has the same text
+  std::string out(size, ' ');
+  const std::size_t k = std::strlen(alphabet);
+  for (char &c : out) {
+    state = state * 6364136223846793005ULL + 1442695040888963407ULL;
+    c = alphabet[(state >> 33) % k];
+  }
+  return out;
+}
+constexpr std::size_t kMiB = 1 << 20;
 
+// The reference times of this run, in nanoseconds, by row.
+std::map<std::string, double> &referenceTimes() {
+  static std::map<std::string, double> times;
+  return times;
+}
+
+void memmoveMiB(benchmark::State &state) {
+  std::vector<char> from(kMiB, 'a'), to(kMiB);
+  const auto start = std::chrono::steady_clock::now();
+  for (auto _ : state) {
+    std::memmove(to.data(), from.data(), kMiB);
+    benchmark::DoNotOptimize(to.data());
+    benchmark::ClobberMemory();
+  }
+  const std::chrono::duration<double, std::nano> spent = std::chrono::steady_clock::now() - start;
+  referenceTimes()["memmove"] = spent.count() / static_cast<double>(state.iterations());
+  state.SetBytesProcessed(state.iterations() * static_cast<std::int64_t>(kMiB));
+}
+
+struct SearchShape {
+  const char *name;
+  std::string needle, text;
+};
+const SearchShape kShapes[] = {
+    {"text, no match", "quartz", words(kMiB)},
+    {"text, no match, 40-byte needle", "the quick brown fox jumps over the cat!!", words(kMiB)},
+    {"a, 3999 a and a b", std::string(3999, 'a') + "b", std::string(kMiB, 'a')},
+    {"a, a b and 3999 a", "b" + std::string(3999, 'a'), std::string(kMiB, 'a')},
+    {"a, aab", "aab", std::string(kMiB, 'a')},
+    {"a, b and 15 a", "b" + std::string(15, 'a'), std::string(kMiB, 'a')},
+    {"abab, ab..abb", repeated("ab", 14) + "b", repeated("ab", kMiB)},
+    {"aabaab, aab..aaa", repeated("aab", 15) + "aaa", repeated("aab", kMiB)},
+    {"abcabc, abc..abd..abc", repeated("abc", 24) + "abd" + repeated("abc", 24),
+     repeated("abc", kMiB)},
+    {"random ab, 32 bytes", randomOver("ab", 32, 7), randomOver("ab", kMiB, 8)},
+    {"random acgt, 20 bytes", randomOver("acgt", 20, 9), randomOver("acgt", kMiB, 10)},
+};
+
+void memmemRow(benchmark::State &state, const SearchShape *shape) {
+  const auto start = std::chrono::steady_clock::now();
+  for (auto _ : state) {
+    benchmark::DoNotOptimize(::memmem(shape->text.data(), shape->text.size(), shape->needle.data(),
+                                      shape->needle.size()));
+  }
+  const std::chrono::duration<double, std::nano> spent = std::chrono::steady_clock::now() - start;
+  const double ns = spent.count() / static_cast<double>(state.iterations());
+  referenceTimes()[std::string("memmem ") + shape->name] = ns;
+  state.counters["x memmove"] = ns / referenceTimes()["memmove"];
+  state.SetBytesProcessed(state.iterations() * static_cast<std::int64_t>(shape->text.size()));
+}
+
+// A 1 MiB row with its ratios; `shape` names the memmem row beside it.
+void ratioRow(benchmark::State &state, const char *routine,
+              const std::vector<std::vector<unsigned char>> &inputs,
+              const std::vector<unsigned char> &result, const char *shape) {
+  const double ns = run(state, routine, inputs, result, kMiB);
+  state.counters["x memmove"] = ns / referenceTimes()["memmove"];
+  if (shape != nullptr) {
+    state.counters["x memmem"] = ns / referenceTimes()[std::string("memmem ") + shape];
+  }
+}
+
+const bool kShapeRowsRegistered = [] {
+  benchmark::RegisterBenchmark("memmove/1 MiB (reference)", memmoveMiB);
+  for (const SearchShape &shape : kShapes) {
+    const std::string name = std::string("1 MiB of ") + shape.name;
+    benchmark::RegisterBenchmark(("memmem/" + name).c_str(), memmemRow, &shape);
+    benchmark::RegisterBenchmark(("LOCATE4/" + name).c_str(), [&shape](benchmark::State &s) {
+      ratioRow(s, "CLI_udfLOCATE4", {lob(shape.needle), lob(shape.text)}, number(0), shape.name);
+    });
+    benchmark::RegisterBenchmark(("REPLACE2/" + name).c_str(), [&shape](benchmark::State &s) {
+      ratioRow(s, "CLI_udfREPLACE2", {lob(shape.text), lob(shape.needle), lob("yz")}, lobArea(),
+               shape.name);
+    });
+  }
+  // Many matches: one every 100 bytes, and one at every byte, replaced by
+  // one byte and by none.
+  const std::string as(kMiB, 'a');
+  benchmark::RegisterBenchmark("REPLACE2/1 MiB, a match every 100 bytes", [](benchmark::State &s) {
+    ratioRow(s, "CLI_udfREPLACE2", {lob(everyHundred(kMiB)), lob("x"), lob("y")}, lobArea(),
+             nullptr);
+  });
+  benchmark::RegisterBenchmark(
+      "REPLACE2/1 MiB, a match at every byte, by one byte", [as](benchmark::State &s) {
+        ratioRow(s, "CLI_udfREPLACE2", {lob(as), lob("a"), lob("b")}, lobArea(), nullptr);
+      });
+  benchmark::RegisterBenchmark(
+      "REPLACE2/1 MiB, a match at every byte, by none", [as](benchmark::State &s) {
+        ratioRow(s, "CLI_udfREPLACE2", {lob(as), lob("a"), lob("")}, lobArea(), nullptr);
+      });
+  // Here the result is the 1 MiB.
+  benchmark::RegisterBenchmark(
+      "REPLACE2/512 KiB, a match at every byte, by two bytes", [](benchmark::State &s) {
+        ratioRow(s, "CLI_udfREPLACE2", {lob(std::string(kMiB / 2, 'a')), lob("a"), lob("bc")},
+                 lobArea(), nullptr);
+      });
+  return true;
+}();
+
+// Short texts, as SQL hands them row by row.
 struct SearchRow {
   const char *name, *routine;
   std::vector<std::vector<unsigned char>> inputs;
   std::vector<unsigned char> result;
-  std::int64_t bytes;
 };
 const SearchRow kSearchRows[] = {
-    {"LOCATE4/1 MiB of text, no match",
-     "CLI_udfLOCATE4",
-     {lob("quartz"), lob(words(1 << 20))},
-     number(0),
-     1 << 20},
-    {"LOCATE4/1 MiB of text, no match, 40-byte needle",
-     "CLI_udfLOCATE4",
-     {lob("the quick brown fox jumps over the cat!!"), lob(words(1 << 20))},
-     number(0),
-     1 << 20},
-    {"LOCATE4/1 MiB of a, 3999 a and a b",
-     "CLI_udfLOCATE4",
-     {lob(std::string(3999, 'a').append("b")), lob(kAs)},
-     number(0),
-     1 << 20},
-    {"LOCATE4/1 MiB of a, a b and 3999 a",
-     "CLI_udfLOCATE4",
-     {lob(std::string("b").append(3999, 'a')), lob(kAs)},
-     number(0),
-     1 << 20},
-    {"LOCATE4/1 MiB of a, aab", "CLI_udfLOCATE4", {lob("aab"), lob(kAs)}, number(0), 1 << 20},
-    {"REPLACE2/1 MiB, a match every 100 bytes",
-     "CLI_udfREPLACE2",
-     {lob(everyHundred(1 << 20)), lob("x"), lob("y")},
-     lobArea(),
-     1 << 20},
-    {"REPLACE2/1 MiB, no match",
-     "CLI_udfREPLACE2",
-     {lob(words(1 << 20)), lob("quartz"), lob("yz")},
-     lobArea(),
-     1 << 20},
     {"LOCATE1/20-byte text",
      "CLI_udfLOCATE1",
      {text("fox"), text(words(20)), number(1)},
-     number(0),
-     0},
-    {"LOCATE3/20-byte text", "CLI_udfLOCATE3", {text("fox"), text(words(20))}, number(0), 0},
+     number(0)},
+    {"LOCATE3/20-byte text", "CLI_udfLOCATE3", {text("fox"), text(words(20))}, number(0)},
     {"REPLACE1/20-byte text",
      "CLI_udfREPLACE1",
      {text(words(20)), text("o"), text("00")},
-     textArea(),
-     0},
+     textArea()},
     {"INSERT1/20-byte text",
      "CLI_udfINSERT1",
      {text(words(20)), number(5), number(3), text("XYZ")},
-     textArea(),
-     0},
-    {"SOUNDEX/10-byte name", "CLI_udfSOUNDEX", {text("Washington")}, textArea(), 0},
-    {"DIFFERENCE/two names",
-     "CLI_udfDIFFERENCE",
-     {text("Ashcraft"), text("Ashcroft")},
-     number(0),
-     0},
+     textArea()},
+    {"SOUNDEX/10-byte name", "CLI_udfSOUNDEX", {text("Washington")}, textArea()},
+    {"DIFFERENCE/two names", "CLI_udfDIFFERENCE", {text("Ashcraft"), text("Ashcroft")}, number(0)},
 };
 
 const bool kSearchRowsRegistered = [] {
   for (const SearchRow &r : kSearchRows) {
     benchmark::RegisterBenchmark(
-        r.name, [&r](benchmark::State &s) { run(s, r.routine, r.inputs, r.result, r.bytes); });
+        r.name, [&r](benchmark::State &s) { run(s, r.routine, r.inputs, r.result); });
   }
   return true;
 }();

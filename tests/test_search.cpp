@@ -8,6 +8,7 @@
 #include <string>
 #include <vector>
 
+#include "string/search.hpp"
 #include "support/frame_call.hpp"
 #include "support/platform.hpp"
 
@@ -173,6 +174,126 @@ TEST(LocateReplaceInsert, AgreeWithNaiveModelsOnSmallAlphabets) {
           insertModel(true, lobHay, p, l, by, capacity), what + " insert " + std::to_string(l));
   }
   EXPECT_EQ(failures, 0);
+}
+
+// ---- The search on every filter kernel, and REPLACE at scale -------------
+
+// The filter kernels that run on this machine.
+std::vector<const cli::str::FilterKernel *> kernelsHere() {
+  std::vector<const cli::str::FilterKernel *> out = {&cli::str::kPortableKernel};
+#if defined(__x86_64__) || defined(_M_X64)
+  out.push_back(&cli::str::kSse2Kernel);
+  if (&cli::str::bestFilterKernel() == &cli::str::kAvx2Kernel)
+    out.push_back(&cli::str::kAvx2Kernel);
+#endif
+  return out;
+}
+
+// A haystack and needle of the shapes that make a search slow or wrong:
+// periodic text with a needle that breaks the period somewhere, small
+// alphabets, copies of the needle with a byte changed, runs of one byte;
+// short, and long enough for the search to change its filter on the way.
+std::pair<std::string, std::string> searchCase(std::mt19937 &rng, int round) {
+  const auto pick = [&](std::size_t k) { return static_cast<std::size_t>(rng() % k); };
+  const std::size_t length = round % 5 == 0 ? 1000 + pick(40000) : pick(300);
+  const char *alphabet = round % 2 == 0 ? "ab" : "acgt";
+  std::size_t m = 1 + pick(round % 7 == 0 ? 600 : 40);
+  std::string hay, needle;
+  switch (round % 4) {
+    case 0: {  // a period, and a needle cut from it with a byte changed
+      const std::string unit = randomText(rng, alphabet, 6) + "a";
+      while (hay.size() < length + m + unit.size()) hay += unit;
+      const std::size_t from = pick(unit.size());
+      needle = hay.substr(from, m);
+      hay.resize(length);
+      if (pick(4) != 0) needle[pick(m)] = pick(2) == 0 ? 'c' : 'b';
+      break;
+    }
+    case 1:  // random text over a small alphabet
+      hay = randomText(rng, alphabet, length);
+      needle = hay.size() > m && pick(2) == 0 ? hay.substr(pick(hay.size() - m), m)
+                                              : randomText(rng, alphabet, m);
+      break;
+    case 2: {  // copies of the needle, nearly all with one byte changed
+      needle = randomText(rng, alphabet, m) + "b";
+      while (hay.size() < length) {
+        std::string copy = needle;
+        if (pick(10) != 0) copy[pick(copy.size())] ^= 1;
+        hay += copy.substr(0, copy.size() - pick(2));
+      }
+      break;
+    }
+    default:  // a run of one byte, now and then another
+      hay.assign(length, 'a');
+      for (std::size_t i = 0; i < length / 97; ++i) hay[pick(length)] = 'b';
+      needle.assign(m, 'a');
+      if (pick(3) != 0) needle[pick(m)] = 'b';
+  }
+  return {hay, needle};
+}
+
+TEST(Search, EveryKernelFindsWhatALeftToRightSearchFinds) {
+  std::mt19937 rng(8086);
+  const auto bytes = [](const std::string &s) {
+    return cli::Bytes{reinterpret_cast<const cli::Byte *>(s.data()), s.size()};
+  };
+  for (int round = 0; round < 1500; ++round) {
+    const auto [hay, needle] = searchCase(rng, round);
+    // Every match of a left-to-right search that starts again behind each.
+    std::vector<std::size_t> want;
+    for (std::size_t at = 0; (at = hay.find(needle, at)) != std::string::npos;
+         at += needle.size()) {
+      want.push_back(at);
+      if (needle.empty()) break;
+    }
+    const std::size_t from = rng() % (hay.size() + 2);
+    const std::size_t firstFrom = hay.find(needle, from);
+    for (const cli::str::FilterKernel *kernel : kernelsHere()) {
+      const cli::str::Searcher searcher(bytes(needle), *kernel);
+      cli::str::Searcher::Scan scan(searcher, bytes(hay));
+      std::vector<std::size_t> got;
+      for (std::size_t at = 0; (at = scan.next(at)) != cli::str::kNotFound; at += needle.size()) {
+        got.push_back(at);
+        if (needle.empty()) break;
+      }
+      ASSERT_EQ(got, want) << "round " << round << ", " << kernel->lanes << " lanes";
+      ASSERT_EQ(searcher.find(bytes(hay), from),
+                firstFrom == std::string::npos ? cli::str::kNotFound : firstFrom)
+          << "round " << round << " from " << from;
+    }
+  }
+}
+
+// REPLACE over large periodic and dense inputs, through the exports: a
+// single byte with replacements of every length, and longer search
+// strings matching at every place they can.
+TEST(LocateReplaceInsert, ReplaceAgreesWithTheModelAtScale) {
+  std::mt19937 rng(1999);
+  for (int round = 0; round < 60; ++round) {
+    auto [hay, needle] = searchCase(rng, round * 5);  // the long ones
+    if (round % 3 == 0) needle = needle.substr(0, 1);
+    const std::string by = randomText(rng, "xyz", round % 4 == 0 ? 20 : 3);
+    const std::string want = replaceModel(hay, needle, by);
+    EXPECT_EQ(call("CLI_udfREPLACE2", {lob(hay), lob(needle), lob(by)}, lobArea()), ok(want))
+        << "round " << round;
+    const std::string head = hay.substr(0, 4000);
+    const std::string headWant = replaceModel(head, needle, by);
+    if (headWant.size() <= 4000) {
+      EXPECT_EQ(call("CLI_udfREPLACE1", {text(head), text(needle), text(by)}, textArea()),
+                ok(headWant));
+    }
+  }
+  // Nothing but matches of one byte, replaced by none, one and two bytes.
+  const std::string as(1 << 19, 'a');
+  for (const std::string by : {"", "b", "bc"}) {
+    EXPECT_EQ(call("CLI_udfREPLACE2", {lob(as), lob("a"), lob(by)}, lobArea()),
+              ok(replaceModel(as, "a", by)));
+  }
+  // One byte whose result passes the limit: built piece by piece up to the
+  // failure, as for any search string.
+  EXPECT_EQ(call("CLI_udfREPLACE1", {text("ab" + std::string(3998, 'x')), text("x"), text("yy")},
+                 textArea()),
+            failsLeaving("10", "ab" + std::string(3998, 'y')));
 }
 
 // ---- SOUNDEX and DIFFERENCE ---------------------------------------------

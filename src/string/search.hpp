@@ -1,24 +1,46 @@
-// Finding one byte string in another in linear time and constant space.
+// Finding one byte string in another, near the speed of memory whatever the
+// search string, in linear time and constant space.
 //
-// The routines are defined as left-to-right searches (try each position,
-// a failed comparison moves on by one byte), which is quadratic on inputs
-// such as a needle of 3999 'a' and a 'b' in a megabyte of 'a'.  The
-// Two-Way algorithm of Crochemore and Perrin finds the same first match in
-// at most about 2n comparisons with O(1) memory, so nothing is allocated.
-// memchr on the first byte that each attempt compares skips positions that
-// cannot match; it only moves forward, so the bound holds.  Comparisons go
-// a word at a time, on little-endian machines (all that we build for).
+// LOCATE and REPLACE are defined as left-to-right searches: try each
+// position, and a failed comparison moves on by one byte.  Done literally
+// that is quadratic (3999 'a' and a 'b' in a megabyte of 'a'), and the
+// Two-Way algorithm alone, linear as it is, crawls through periodic text a
+// few bytes per attempt.  The search here finds the same first match in
+// stages; each stage counts what its failed attempts cost and hands over
+// to the next once that passes what the scan itself costs, so the whole
+// stays linear:
 //
-// The C library's memmem would do, but is not linear on every platform and
-// missing on some, so the library carries its own.
+//  1. The needle's rarest byte, by a rough table of how often bytes occur
+//     in text, is looked for with the C library's memchr, the fastest scan
+//     there is while that byte is rare in the haystack too; each place
+//     found is tried.
+//  2. A filter tests 16 or 32 positions at once: do the haystack's bytes at
+//     a few chosen offsets of the needle equal the needle's there?  Only
+//     the positions that pass are compared in full.  The first two offsets
+//     are the rarest byte's last place and the rarest other byte's first,
+//     so that a needle that breaks its period at either end is told apart
+//     from the period.
+//  3. Text can defeat any fixed choice: `aab..aaa` in `aabaab..` passes a
+//     filter on its 'b' and its first 'a' at every third position.  Then
+//     the offsets are chosen from the haystack at hand, twice at most: the
+//     ones at which the fewest of the next 64 positions agree with the
+//     needle, enough to rule them all out the first time, eight the second.
+//  4. Text that defeats even that (made to, or with a needle whose telling
+//     bytes the sample can't see) goes to Two-Way (Crochemore and Perrin),
+//     which compares at most about 2n bytes with O(1) memory.
+//
+// Nothing is allocated.  The filter's inner loop is a kernel for the widest
+// instruction set the processor has (search_kernels.hpp).
 #pragma once
 
+#include <array>
 #include <bit>
 #include <cstddef>
 #include <cstdint>
 #include <cstring>
 
 #include "frame/frame.hpp"
+#include "string/search_kernels.hpp"
 
 namespace cli::str {
 
@@ -26,155 +48,407 @@ inline constexpr std::size_t kNotFound = static_cast<std::size_t>(-1);
 
 static_assert(std::endian::native == std::endian::little, "word compares assume little-endian");
 
+namespace search_detail {
+
+inline std::uint64_t word(const Byte *p) noexcept {
+  std::uint64_t w = 0;
+  std::memcpy(&w, p, sizeof w);
+  return w;
+}
+
+// The first i in [from, to) where a[i] and b[i] differ, or `to`; a word at
+// a time.
+inline std::size_t mismatch(const Byte *a, const Byte *b, std::size_t from,
+                            std::size_t to) noexcept {
+  std::size_t i = from;
+  for (; i + 8 <= to; i += 8) {
+    const std::uint64_t d = word(a + i) ^ word(b + i);
+    if (d != 0) return i + static_cast<std::size_t>(std::countr_zero(d)) / 8;
+  }
+  while (i < to && a[i] == b[i]) ++i;
+  return i;
+}
+
+// Going down from `from` (exclusive) to `floor`: the highest i below `from`
+// where a[i] and b[i] differ, or floor - 1 (wrapping) when all agree.
+inline std::size_t mismatchDown(const Byte *a, const Byte *b, std::size_t from,
+                                std::size_t floor) noexcept {
+  std::size_t i = from;
+  for (; i >= floor + 8; i -= 8) {
+    const std::uint64_t d = word(a + i - 8) ^ word(b + i - 8);
+    if (d != 0) return i - 1 - static_cast<std::size_t>(std::countl_zero(d)) / 8;
+  }
+  while (i > floor && a[i - 1] == b[i - 1]) --i;
+  return i - 1;
+}
+
+// How common each byte is in text, coarsely: higher is more common.  Only
+// the order matters.  Letters follow English, and the bytes of other
+// scripts' UTF-8 sit in the middle.
+inline constexpr std::array<std::uint8_t, 256> kByteRank = [] {
+  std::array<std::uint8_t, 256> r{};
+  for (std::size_t c = 0; c < 256; ++c) {
+    r[c] = c < 0x20 ? 20 : c < 0x80 ? 110 : c < 0xC0 ? 130 : 90;  // controls, ASCII, UTF-8
+  }
+  r[0] = 60;
+  r['\n'] = 180;
+  r['\t'] = 120;
+  const char *byFrequency = "etaoinshrdlcumwfgypbvkjxqz";  // most common first
+  for (std::size_t i = 0; byFrequency[i] != '\0'; ++i) {
+    const auto lower = static_cast<unsigned char>(byFrequency[i]);
+    r[lower] = static_cast<std::uint8_t>(250 - 4 * i);
+    r[lower - 'a' + 'A'] = static_cast<std::uint8_t>(170 - 2 * i);
+  }
+  for (char c = '0'; c <= '9'; ++c) r[static_cast<unsigned char>(c)] = 150;
+  r[' '] = 255;
+  for (const char c : {',', '.', '-', '_', '/', '"', '\'', '(', ')', ':', '=', ';'}) {
+    r[static_cast<unsigned char>(c)] = 160;
+  }
+  return r;
+}();
+
+}  // namespace search_detail
+
 class Searcher {
  public:
-  explicit Searcher(Bytes needle) noexcept : x_(needle.data), m_(needle.size) {
-    if (m_ < 2) return;
-    // The critical factorization: the later of the two maximal suffixes,
-    // under the byte order and under its reverse.
-    const Suffix forward = maximalSuffix(false);
-    const Suffix reverse = maximalSuffix(true);
-    const Suffix &critical = reverse.start + 1 < forward.start + 1 ? forward : reverse;
-    suffix_ = critical.start + 1;
-    period_ = critical.period;
-    periodic_ = std::memcmp(x_, x_ + period_, suffix_) == 0;
-    if (!periodic_) period_ = (suffix_ > m_ - suffix_ ? suffix_ : m_ - suffix_) + 1;
+  class Scan;
+
+  // The filter runs on `kernel`, by default the fastest one here.
+  explicit Searcher(Bytes needle, const FilterKernel &kernel = bestFilterKernel()) noexcept
+      : x_(needle.data), m_(needle.size), kernel_(&kernel) {
+    if (m_ >= 2) pickByRank();
   }
 
   // The first position at or after `from` where the needle stands in
   // `haystack` in full, or kNotFound.  An empty needle stands at `from`.
   [[nodiscard]] std::size_t find(Bytes haystack, std::size_t from) const noexcept {
-    if (from > haystack.size || m_ > haystack.size - from) return kNotFound;
-    const Byte *h = haystack.data + from;
-    const std::size_t n = haystack.size - from;
-    if (m_ == 0) return from;
-    if (m_ == 1) {
-      const void *hit = std::memchr(h, x_[0], n);
-      return hit == nullptr ? kNotFound
-                            : from + static_cast<std::size_t>(static_cast<const Byte *>(hit) - h);
-    }
-    const std::size_t at = periodic_ ? findPeriodic(h, n) : findAperiodic(h, n);
-    return at == kNotFound ? kNotFound : from + at;
+    return Scan(*this, haystack).next(from);
   }
 
- private:
-  struct Suffix {
-    std::size_t start;  // one before the suffix; kNotFound (as -1) for the whole needle
-    std::size_t period;
+  // A search for successive matches in one haystack, each call starting at
+  // or behind where the last one ended; what the scan has learnt of the
+  // haystack carries over from call to call.
+  class Scan {
+   public:
+    Scan(const Searcher &searcher, Bytes haystack) noexcept
+        : s_(searcher), h_(haystack.data), n_(haystack.size) {
+      if (s_.m_ >= 2) load(s_.first_);
+    }
+
+    // The first match at or after `from`, which is never below the `from`
+    // of an earlier call; kNotFound when there is none.
+    [[nodiscard]] std::size_t next(std::size_t from) noexcept {
+      const std::size_t m = s_.m_;
+      if (from > n_ || m > n_ - from) return kNotFound;
+      if (m == 0) return from;
+      if (m == 1) {
+        const void *hit = std::memchr(h_ + from, s_.x_[0], n_ - from);
+        return hit == nullptr ? kNotFound
+                              : static_cast<std::size_t>(static_cast<const Byte *>(hit) - h_);
+      }
+      switch (stage_) {
+        case Stage::rareByte:
+          return rareByte(from);
+        case Stage::filter:
+          return filtered(from);
+        default:
+          return twoWayFind(from);
+      }
+    }
+
+   private:
+    enum class Stage : std::uint8_t { rareByte, filter, twoWay };
+
+    // What one place that the current stage tries but that fails in full
+    // counts, in bytes of scanning, besides the bytes it compares: a
+    // mispredicted branch and a comparison cost about as much as the filter
+    // takes for 256 positions.
+    static constexpr std::size_t kMissCost = 256;
+    // What one call of memchr that ends in a match counts.
+    static constexpr std::size_t kCallCost = 64;
+    // Scanning allowed before a stage is judged.
+    static constexpr std::size_t kGrace = 1024;
+    // How often the offsets may be chosen from the haystack, and how many
+    // misses the last choice may cost before Two-Way, which compares about
+    // two bytes per haystack byte, would be the faster.
+    static constexpr int kChoices = 2;
+    static constexpr std::size_t kLastChoiceAllowance = 16;
+
+    [[nodiscard]] bool overBudget(std::size_t at) const noexcept {
+      const std::size_t allowance = choices_ == kChoices ? kLastChoiceAllowance : 1;
+      return spent_ > (at - since_) * allowance + kGrace;
+    }
+
+    // Stages 2 and 3: the kernel finds blocks with positions that pass the
+    // probes, and each such position is compared in full.  A match leaves
+    // the rest of its block for the next call.
+    std::size_t filtered(std::size_t from) noexcept {
+      const std::size_t m = s_.m_, last = n_ - m, lanes = s_.kernel_->lanes;
+      std::size_t base = from, next = from;
+      std::uint64_t mask = 0;
+      if (pendingValid_ && from >= pendingBase_ && from - pendingBase_ < lanes) {
+        base = pendingBase_;
+        mask = pending_ & (~std::uint64_t{0} << (from - pendingBase_));
+        next = base + lanes;
+      }
+      pendingValid_ = false;
+      for (;;) {
+        while (mask != 0) {
+          const std::size_t at = base + static_cast<std::size_t>(std::countr_zero(mask));
+          mask &= mask - 1;
+          const std::size_t i = search_detail::mismatch(s_.x_, h_ + at, 0, m);
+          if (i == m) {
+            pending_ = mask;
+            pendingBase_ = base;
+            pendingValid_ = true;
+            return at;
+          }
+          spent_ += kMissCost + i;
+          if (overBudget(at)) return adapt(at + 1);
+        }
+        if (next > last) return kNotFound;
+        base = s_.kernel_->scan(h_, next, last, probes_, mask);
+        if (base == kNotFound) return kNotFound;
+        next = base + lanes;
+      }
+    }
+
+    // Stage 1, while the needle's rarest byte is rare in the haystack too:
+    // the C library's memchr finds its next place, the fastest scan there
+    // is, and only those places are tried.
+    std::size_t rareByte(std::size_t from) noexcept {
+      const std::size_t m = s_.m_, last = n_ - m;
+      const std::size_t a = probes_.offset[0], b = probes_.offset[1];
+      for (std::size_t j = from; j <= last;) {
+        const void *hit = std::memchr(h_ + j + a, probes_.byte[0], last - j + 1);
+        if (hit == nullptr) return kNotFound;
+        const std::size_t at = static_cast<std::size_t>(static_cast<const Byte *>(hit) - h_) - a;
+        std::size_t i = 0;
+        if (h_[at + b] == probes_.byte[1]) {
+          i = search_detail::mismatch(s_.x_, h_ + at, 0, m);
+          if (i == m) {
+            // A call per match is dear where matches lie close together:
+            // the filter then finds the next ones in the same block.
+            spent_ += kCallCost;
+            if (overBudget(at)) leave(Stage::filter, at + 1);
+            return at;
+          }
+        }
+        spent_ += kMissCost + i;
+        if (overBudget(at)) return adapt(at + 1);
+        j = at + 1;
+      }
+      return kNotFound;
+    }
+
+    // The current stage passes too many places that fail from `from` on:
+    // go on to the filter, choose its offsets again from the haystack there,
+    // or leave the rest to Two-Way.
+    std::size_t adapt(std::size_t from) noexcept {
+      const std::size_t last = n_ - s_.m_;
+      if (stage_ == Stage::rareByte) {
+        leave(Stage::filter, from);
+        return filtered(from);
+      }
+      spent_ = 0;
+      since_ = from;
+      if (choices_ < kChoices && from <= last && last - from + 1 >= kSample) {
+        // The first choice stops once the sample is ruled out; should that
+        // prove too few offsets, the second takes all eight.
+        pickFromSample(from, choices_ == 0 ? 2 : kMaxProbes);
+        ++choices_;
+        return filtered(from);
+      }
+      leave(Stage::twoWay, from);
+      return twoWayFind(from);
+    }
+
+    // Goes on to `stage` with nothing spent from `from` on.
+    void leave(Stage stage, std::size_t from) noexcept {
+      stage_ = stage;
+      spent_ = 0;
+      since_ = from;
+    }
+
+    // ---- Choosing offsets from the haystack -----------------------------
+
+    static constexpr std::size_t kSample = 64;  // positions, one bit each
+    static constexpr std::size_t kSampledOffsets = 256;
+
+    // The offsets of the needle whose bytes the fewest of the positions
+    // [from, from + 64) agree with, added one at a time while each still
+    // rules out more of them, at least `least` and up to eight.
+    void pickFromSample(std::size_t from, std::size_t least) noexcept {
+      const std::size_t m = s_.m_;
+      std::size_t offsets[kSampledOffsets];
+      std::uint64_t agree[kSampledOffsets];
+      // Every offset of a short needle; of a long one the 64 at each end
+      // and 128 spread between them.
+      const std::size_t k = m <= kSampledOffsets ? m : kSampledOffsets;
+      for (std::size_t c = 0; c < k; ++c) {
+        offsets[c] = m <= kSampledOffsets ? c
+                     : c < 64             ? c
+                     : c >= 192           ? m - 256 + c
+                                          : 64 + (c - 64) * (m - 128) / 128;
+        agree[c] = s_.kernel_->agree64(h_ + from + offsets[c], s_.x_[offsets[c]]);
+      }
+      // Each round takes the unused offset that leaves the fewest positions
+      // alive, the rarer byte in the sample on a tie.
+      std::uint64_t alive = ~std::uint64_t{0};
+      bool used[kSampledOffsets] = {};
+      std::size_t chosen[kMaxProbes];
+      std::size_t n = 0;
+      while (n < kMaxProbes && !(n >= least && alive == 0)) {
+        std::size_t best = kNotFound;
+        int fewest = 0;
+        for (std::size_t c = 0; c < k; ++c) {
+          const int key = std::popcount(alive & agree[c]) * 128 + std::popcount(agree[c]);
+          if (!used[c] && (best == kNotFound || key < fewest)) {
+            fewest = key;
+            best = c;
+          }
+        }
+        if (best == kNotFound) break;  // every offset taken
+        // Positions that no offset rules out are matches: stop there.
+        if (n >= 2 && alive != 0 && (alive & agree[best]) == alive) break;
+        used[best] = true;
+        chosen[n++] = offsets[best];
+        alive &= agree[best];
+      }
+      setProbes(chosen, n);
+    }
+
+    // ---- The filter's offsets -------------------------------------------
+
+    static constexpr std::size_t kMaxProbes = Probes::kMax;
+
+    void load(const std::array<std::size_t, 2> &pair) noexcept {
+      const std::size_t offsets[2] = {pair[0], pair[1]};
+      setProbes(offsets, 2);
+    }
+    void setProbes(const std::size_t *offsets, std::size_t n) noexcept {
+      probes_.count = n;
+      for (std::size_t k = 0; k < n; ++k) {
+        probes_.offset[k] = offsets[k];
+        probes_.byte[k] = s_.x_[offsets[k]];
+      }
+    }
+
+    // ---- Two-Way --------------------------------------------------------
+
+    std::size_t twoWayFind(std::size_t from) noexcept {
+      if (n_ - from < s_.m_) return kNotFound;
+      if (!factored_) factor();
+      const Byte *h = h_ + from;
+      const std::size_t n = n_ - from, m = s_.m_;
+      const Byte *x = s_.x_;
+      std::size_t j = 0, memory = 0;
+      while (j <= n - m) {
+        const std::size_t start = suffix_ > memory ? suffix_ : memory;
+        std::size_t i = start < m && x[start] != h[j + start]
+                            ? start
+                            : search_detail::mismatch(x, h + j, start, m);
+        if (i < m) {
+          j += i - suffix_ + 1;
+          memory = 0;
+          continue;
+        }
+        i = search_detail::mismatchDown(x, h + j, suffix_, memory);
+        if (i + 1 < memory + 1) return from + j;
+        j += period_;
+        memory = periodic_ ? m - period_ : 0;
+      }
+      return kNotFound;
+    }
+
+    // The critical factorization: the later of the two maximal suffixes,
+    // under the byte order and under its reverse.  Without a period of the
+    // whole needle, any shift up to the longer part's length plus one is
+    // safe and no memory is kept.
+    void factor() noexcept {
+      const std::size_t m = s_.m_;
+      const Suffix forward = maximalSuffix(false);
+      const Suffix reverse = maximalSuffix(true);
+      const Suffix &critical = reverse.start + 1 < forward.start + 1 ? forward : reverse;
+      suffix_ = critical.start + 1;
+      period_ = critical.period;
+      periodic_ = std::memcmp(s_.x_, s_.x_ + period_, suffix_) == 0;
+      if (!periodic_) period_ = (suffix_ > m - suffix_ ? suffix_ : m - suffix_) + 1;
+      factored_ = true;
+    }
+
+    struct Suffix {
+      std::size_t start;  // one before the suffix; kNotFound (as -1) for the whole needle
+      std::size_t period;
+    };
+    // The maximal suffix of the needle and its period, by Crochemore and
+    // Perrin; unsigned arithmetic wraps start from -1 on purpose.
+    [[nodiscard]] Suffix maximalSuffix(bool reversed) const noexcept {
+      const Byte *x = s_.x_;
+      std::size_t start = kNotFound, j = 0, k = 1, p = 1;
+      while (j + k < s_.m_) {
+        const Byte a = x[j + k], b = x[start + k];
+        if (reversed ? b < a : a < b) {
+          j += k;
+          k = 1;
+          p = j - start;
+        } else if (a == b) {
+          if (k != p) {
+            ++k;
+          } else {
+            j += p;
+            k = 1;
+          }
+        } else {
+          start = j++;
+          k = p = 1;
+        }
+      }
+      return {start, p};
+    }
+
+    const Searcher &s_;
+    const Byte *h_;
+    std::size_t n_;
+
+    Probes probes_{};
+
+    std::size_t spent_ = 0;  // bytes' worth of failed full comparisons since `since_`
+    std::size_t since_ = 0;
+    int choices_ = 0;
+
+    std::uint64_t pending_ = 0;  // positions of the last block not yet tried
+    std::size_t pendingBase_ = 0;
+    bool pendingValid_ = false;
+
+    Stage stage_ = Stage::rareByte;
+    bool factored_ = false;
+    std::size_t suffix_ = 0, period_ = 1;
+    bool periodic_ = false;
   };
 
-  // The maximal suffix of the needle and its period, by Crochemore and
-  // Perrin; unsigned arithmetic wraps start from -1 on purpose.
-  [[nodiscard]] Suffix maximalSuffix(bool reversed) const noexcept {
-    std::size_t start = kNotFound, j = 0, k = 1, p = 1;
-    while (j + k < m_) {
-      const Byte a = x_[j + k], b = x_[start + k];
-      if (reversed ? b < a : a < b) {
-        j += k;
-        k = 1;
-        p = j - start;
-      } else if (a == b) {
-        if (k != p) {
-          ++k;
-        } else {
-          j += p;
-          k = 1;
-        }
-      } else {
-        start = j++;
-        k = p = 1;
-      }
+ private:
+  // The first pair of offsets: the rarest byte's last place, and the first
+  // place of the rarest other byte (of the same byte where there is no
+  // other, at the far end).
+  void pickByRank() noexcept {
+    const auto &rank = search_detail::kByteRank;
+    std::size_t a = 0;
+    for (std::size_t i = 1; i < m_; ++i) {
+      if (rank[x_[i]] <= rank[x_[a]]) a = i;
     }
-    return {start, p};
-  }
-
-  // The first i in [from, m) where the needle and the haystack at j
-  // differ, or m; compared a word at a time.
-  [[nodiscard]] std::size_t mismatchForward(const Byte *h, std::size_t from) const noexcept {
-    std::size_t i = from;
-    for (; i + 8 <= m_; i += 8) {
-      const std::uint64_t d = word(x_ + i) ^ word(h + i);
-      if (d != 0) return i + lowestByte(d);
+    std::size_t b = kNotFound;
+    for (std::size_t i = 0; i < m_; ++i) {
+      if (x_[i] != x_[a] && (b == kNotFound || rank[x_[i]] < rank[x_[b]])) b = i;
     }
-    while (i < m_ && x_[i] == h[i]) ++i;
-    return i;
-  }
-
-  // Going down from `from` (exclusive) to `floor`: the highest i below
-  // `from` where they differ, or floor - 1 (wrapping) when all match.
-  [[nodiscard]] std::size_t mismatchBackward(const Byte *h, std::size_t from,
-                                             std::size_t floor) const noexcept {
-    std::size_t i = from;
-    for (; i >= floor + 8; i -= 8) {
-      const std::uint64_t d = word(x_ + i - 8) ^ word(h + i - 8);
-      if (d != 0) return i - 1 - highestByte(d);
-    }
-    while (i > floor && x_[i - 1] == h[i - 1]) --i;
-    return i - 1;
-  }
-
-  static std::uint64_t word(const Byte *p) noexcept {
-    std::uint64_t w = 0;
-    std::memcpy(&w, p, sizeof w);
-    return w;
-  }
-  // Byte offsets, in memory order, of the lowest and highest differing
-  // byte of a non-zero XOR of two little-endian words.
-  static std::size_t lowestByte(std::uint64_t d) noexcept {
-    return static_cast<std::size_t>(std::countr_zero(d)) / 8;
-  }
-  static std::size_t highestByte(std::uint64_t d) noexcept {
-    return static_cast<std::size_t>(std::countl_zero(d)) / 8;
-  }
-
-  // Moves j to the next position whose first compared byte matches, or
-  // gives false when no position is left.
-  bool skip(const Byte *h, std::size_t n, std::size_t &j) const noexcept {
-    const void *hit = std::memchr(h + j + suffix_, x_[suffix_], n - m_ - j + 1);
-    if (hit == nullptr) return false;
-    j = static_cast<std::size_t>(static_cast<const Byte *>(hit) - h) - suffix_;
-    return true;
-  }
-
-  std::size_t findPeriodic(const Byte *h, std::size_t n) const noexcept {
-    std::size_t j = 0, memory = 0;
-    while (j <= n - m_) {
-      if (memory == 0 && !skip(h, n, j)) return kNotFound;
-      std::size_t i = mismatchForward(h + j, suffix_ > memory ? suffix_ : memory);
-      if (i >= m_) {
-        i = mismatchBackward(h + j, suffix_, memory);
-        if (i + 1 < memory + 1) return j;
-        j += period_;
-        memory = m_ - period_;
-      } else {
-        j += i - suffix_ + 1;
-        memory = 0;
-      }
-    }
-    return kNotFound;
-  }
-
-  std::size_t findAperiodic(const Byte *h, std::size_t n) const noexcept {
-    std::size_t j = 0;
-    while (j <= n - m_) {
-      if (!skip(h, n, j)) return kNotFound;
-      std::size_t i = mismatchForward(h + j, suffix_);
-      if (i >= m_) {
-        i = mismatchBackward(h + j, suffix_, 0);
-        if (i == kNotFound) return j;
-        j += period_;
-      } else {
-        j += i - suffix_ + 1;
-      }
-    }
-    return kNotFound;
+    if (b == kNotFound) b = a == 0 ? m_ - 1 : 0;
+    first_ = {a, b};
   }
 
   const Byte *x_;
   std::size_t m_;
-  std::size_t suffix_ = 0;
-  std::size_t period_ = 1;
-  bool periodic_ = false;
+  const FilterKernel *kernel_;
+  std::array<std::size_t, 2> first_ = {0, 0};
 };
 
 }  // namespace cli::str

@@ -3,7 +3,9 @@
 // LOCATE and REPLACE find their matches with the linear-time Searcher; the
 // results are those of the left-to-right definitions (the first match, then
 // the next one behind it, never overlapping).  Every routine builds its
-// result in one pass, appending each piece once.
+// result in one pass, appending each piece once; REPLACE of a single byte
+// has a path of its own for text full of matches.
+#include <bit>
 #include <cstdint>
 #include <cstring>
 #include <type_traits>
@@ -33,18 +35,39 @@ std::int32_t locate(Bytes search, Bytes searched, std::size_t start) noexcept {
   return at == kNotFound ? 0 : positionOf(at);
 }
 
-// Appends pieces to a result area of `limit` bytes, failing before a piece
-// would pass the limit.  Terminated text keeps its terminator behind every
-// piece, so that a failure leaves the pieces so far as terminated text.
-template <class Form>
+// Copies n bytes, reading and writing none outside the two ranges: short
+// pieces, the common case between matches, as two overlapping moves of
+// one width instead of a call.
+inline void copyPiece(cli::Byte *to, const cli::Byte *from, std::size_t n) noexcept {
+  const auto move = [&]<class Word>(Word) {
+    Word head, tail;
+    std::memcpy(&head, from, sizeof head);
+    std::memcpy(&tail, from + n - sizeof tail, sizeof tail);
+    std::memcpy(to, &head, sizeof head);
+    std::memcpy(to + n - sizeof tail, &tail, sizeof tail);
+  };
+  if (n > 16) {
+    std::memcpy(to, from, n);
+  } else if (n >= 8) {
+    move(std::uint64_t{});
+  } else if (n >= 4) {
+    move(std::uint32_t{});
+  } else if (n >= 2) {
+    move(std::uint16_t{});
+  } else if (n == 1) {
+    *to = *from;
+  }
+}
+
+// Appends pieces to a result area of `limit` bytes, refusing a piece that
+// would pass the limit.
 class Builder {
  public:
   Builder(cli::Byte *area, std::size_t limit) noexcept : area_(area), limit_(limit) {}
   bool append(const cli::Byte *data, std::size_t size) noexcept {
     if (size > limit_ - length_) return false;
-    if (size != 0) std::memcpy(area_ + length_, data, size);
+    copyPiece(area_ + length_, data, size);
     length_ += size;
-    if constexpr (std::is_same_v<Form, Text>) area_[length_] = 0;
     return true;
   }
   [[nodiscard]] std::size_t length() const noexcept { return length_; }
@@ -55,9 +78,86 @@ class Builder {
   std::size_t length_ = 0;
 };
 
+// REPLACE of a single byte, when the result fits.  The matches are counted
+// first, so that the result is known to
+// fit and no piece needs a check.  Then the filter kernel marks the matches
+// of 64 source bytes at a time: the bytes between matches are copied in
+// one piece each, however many blocks they span, and a block of nothing but
+// matches is written at once where the replacement is 16 bytes or fewer.
+// Returns false, with nothing written, when the result would pass `limit`;
+// the caller then builds it piece by piece up to the failure.
+bool replaceByte(Bytes source, cli::Byte search, Bytes replacement, cli::Byte *area,
+                 std::size_t limit, std::size_t &length) noexcept {
+  const cli::str::FilterKernel &kernel = cli::str::bestFilterKernel();
+  constexpr std::size_t kBlock = 64;
+  const cli::Byte *from = source.data;
+  const std::size_t n = source.size, r = replacement.size;
+  std::size_t matches = 0;
+  if (n >= kBlock) {
+    matches = kernel.count(from, n, search);
+  } else {
+    for (std::size_t i = 0; i < n; ++i) matches += from[i] == search ? 1 : 0;
+  }
+  // n - matches + matches * r, without overflow for any r.
+  if (n - matches > limit || (matches != 0 && r > (limit - (n - matches)) / matches)) return false;
+  length = n - matches + matches * r;
+
+  cli::Byte *to = area;
+  cli::Byte *const end = area + length;
+  // A replacement of up to 8 bytes is stored as one word where the result
+  // has room behind it; the bytes past the replacement are written over by
+  // what follows.
+  std::uint64_t word = 0;
+  std::memcpy(&word, replacement.data, r < 8 ? r : 8);
+  const auto replaceOne = [&] {
+    if (r <= 8 && end - to >= 8) {
+      std::memcpy(to, &word, 8);
+    } else {
+      copyPiece(to, replacement.data, r);
+    }
+    to += r;
+  };
+  std::size_t copied = 0;  // the source bytes before this are in the result
+  const auto match = [&](std::size_t at) {
+    copyPiece(to, from + copied, at - copied);
+    to += at - copied;
+    replaceOne();
+    copied = at + 1;
+  };
+  constexpr std::size_t kPatterned = 16;
+  cli::Byte pattern[kBlock * kPatterned];
+  std::size_t patterned = 0;
+  const std::size_t whole = n - n % kBlock;
+  for (std::size_t i = 0; i < whole; i += kBlock) {
+    std::uint64_t mask = kernel.agree64(from + i, search);
+    if (mask == 0) continue;
+    if (mask == ~std::uint64_t{0} && r <= kPatterned && copied == i) {
+      if (r == 1) {
+        std::memset(to, replacement.data[0], kBlock);
+      } else if (r > 1) {
+        if (patterned == 0) {  // the replacement 64 times over, made once
+          for (std::size_t k = 0; k < kBlock; ++k) copyPiece(pattern + k * r, replacement.data, r);
+          patterned = kBlock * r;
+        }
+        std::memcpy(to, pattern, patterned);
+      }
+      to += kBlock * r;
+      copied = i + kBlock;
+      continue;
+    }
+    for (; mask != 0; mask &= mask - 1) match(i + static_cast<std::size_t>(std::countr_zero(mask)));
+  }
+  for (std::size_t i = whole; i < n; ++i) {
+    if (from[i] == search) match(i);
+  }
+  copyPiece(to, from + copied, n - copied);
+  return true;
+}
+
 // REPLACE: every match of `search`, left to right and not overlapping,
 // replaced; an empty search string matches nothing.  Raises 10 as soon as a
-// piece would take the result past the limit; the pieces so far stay.
+// piece would take the result past the limit; the pieces so far stay, as
+// terminated text in the text form.
 template <class Form, std::size_t Limit>
 void replace(const typename Form::Value *sourceValue, const typename Form::Value *searchValue,
              const typename Form::Value *replacementValue, typename Form::Value *out,
@@ -68,18 +168,28 @@ void replace(const typename Form::Value *sourceValue, const typename Form::Value
   // What a failure leaves in the result: an empty text, or the source's
   // length in the length word.
   Form::finish(out, std::is_same_v<Form, Text> ? 0 : source.size);
-  Builder<Form> result(Form::area(out), Limit);
+  std::size_t length = 0;
+  if (search.size == 1 &&
+      replaceByte(source, search.data[0], replacement, Form::area(out), Limit, length)) {
+    return Form::finish(out, length);
+  }
+  Builder result(Form::area(out), Limit);
+  const auto fail = [&] {
+    if constexpr (std::is_same_v<Form, Text>) Form::finish(out, result.length());
+    status.raise(Sysfun::tooLong);
+  };
   std::size_t scan = 0;
   if (search.size != 0) {
     const Searcher searcher(search);
-    for (std::size_t at; (at = searcher.find(source, scan)) != kNotFound; scan = at + search.size) {
+    Searcher::Scan matches(searcher, source);
+    for (std::size_t at; (at = matches.next(scan)) != kNotFound; scan = at + search.size) {
       if (!result.append(source.data + scan, at - scan) ||
           !result.append(replacement.data, replacement.size)) {
-        return status.raise(Sysfun::tooLong);
+        return fail();
       }
     }
   }
-  if (!result.append(source.data + scan, source.size - scan)) return status.raise(Sysfun::tooLong);
+  if (!result.append(source.data + scan, source.size - scan)) return fail();
   Form::finish(out, result.length());
 }
 
@@ -88,7 +198,7 @@ void replace(const typename Form::Value *sourceValue, const typename Form::Value
 template <class Form>
 void insert(Bytes source, std::int64_t p, std::int64_t l, Bytes added,
             typename Form::Value *out) noexcept {
-  Builder<Form> result(Form::area(out), static_cast<std::size_t>(-1));
+  Builder result(Form::area(out), static_cast<std::size_t>(-1));
   const auto head = static_cast<std::size_t>(p - 1);
   result.append(source.data, head);
   result.append(added.data, added.size);
