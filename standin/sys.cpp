@@ -231,7 +231,7 @@ int32_t sqleinstancepath(int32_t, char *path) {
 }
 
 int32_t sqloopenp(const char *path, int32_t, int32_t, CLI_fileHandle *handle, int32_t) {
-  std::FILE *f = std::fopen(path, orv::standin::kReadBinary);
+  std::FILE *f = orv::standin::openRegularFile(path);
   if (f == nullptr) return 1;
   std::memset(handle->bytes, 0, sizeof handle->bytes);
   std::memcpy(handle->bytes, &f, sizeof(std::FILE *));

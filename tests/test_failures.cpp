@@ -215,8 +215,9 @@ TEST_F(FakeSnapshot, EndsTheTableOnAFailedReadInEachStepOfTheSectionScan) {
   write(element(30, "") + statement(st) + element(321, "T") + element(322, "dd"));
   ASSERT_EQ(rows(), 1);
   // Reads in order: 30, the statement's header, 321 and its text, 322 and its
-  // data, then the statement again.
-  for (int failing = 1; failing <= 8; ++failing) {
+  // data, the statement's header again, the last byte of its data (to see
+  // that the file holds it), then its data.
+  for (int failing = 1; failing <= 9; ++failing) {
     fakes->reads = 0;
     fakes->failReadAt = failing;
     EXPECT_EQ(rows(), 0) << "read " << failing;
@@ -237,6 +238,27 @@ TEST_F(FakeSnapshot, LogsAFailedAllocationAndKeepsNoBlock) {
   EXPECT_EQ(fakes->logStatus, 7);
   step(CLI_CALL_CLOSE);
   EXPECT_EQ(fakes->frees, 0);
+  EXPECT_EQ(fakes->closes, 1);
+}
+
+// A statement that claims more than the rest of the file is refused before
+// a block is asked for, and logged as a block that can't be had; the block
+// of the statements before it goes back as it does before any new block.
+TEST_F(FakeSnapshot, RefusesAStatementLargerThanTheFileAndLogsIt) {
+  std::string huge = orv::snapshot::element(19, "12345678");
+  huge.replace(0, 4, "\xF0\xFF\xFF\xDD", 4);  // 3.7 GB in a file of a few bytes
+  write(orv::snapshot::statement({{}, "s"}) + huge);
+  scratchpad.fill(0);
+  step(CLI_CALL_OPEN);
+  EXPECT_EQ(step(CLI_CALL_FETCH), "");
+  EXPECT_EQ(step(CLI_CALL_FETCH), "02000");
+  EXPECT_EQ(fakes->logCalls, 1);
+  EXPECT_STREQ(fakes->logMessage, "SQLCACHE_SNAPSHOT: unable to allocate temporary sqlcache stmt");
+  EXPECT_EQ(fakes->logStatus, -1);
+  EXPECT_EQ(fakes->allocations, 1);
+  EXPECT_EQ(fakes->frees, 1);
+  step(CLI_CALL_CLOSE);
+  EXPECT_EQ(fakes->frees, 1);
   EXPECT_EQ(fakes->closes, 1);
 }
 

@@ -3,15 +3,20 @@
 #include <gtest/gtest.h>
 
 #include <array>
+#include <chrono>
+#include <condition_variable>
 #include <cstdint>
 #include <cstdlib>
 #include <cstring>
 #include <filesystem>
 #include <fstream>
+#include <mutex>
 #include <string>
+#include <thread>
 #include <utility>
 #include <vector>
 
+#include "engine/services.h"
 #include "frame/cliudf.h"
 #include "snapshot.hpp"
 #include "support/frame_call.hpp"
@@ -202,6 +207,77 @@ TEST_F(Snapshot, EndsTheTableWhenTheFileCannotBeFound) {
   EXPECT_EQ(call(CLI_CALL_OPEN).second, "02000");
   EXPECT_EQ(call(CLI_CALL_FETCH).second, "02000");
   call(CLI_CALL_CLOSE);
+}
+
+// Should a call wait in the open of the FIFO at `fifo`, writers are let in
+// after a minute, so that the test fails instead of hanging.
+class Watchdog {
+ public:
+  explicit Watchdog(std::string fifo)
+      : fifo_(std::move(fifo)), thread_([this] {
+          std::unique_lock<std::mutex> lock(mutex_);
+          auto wait = std::chrono::milliseconds(60000);
+          while (!done_.wait_for(lock, wait, [this] { return finished_; })) {
+            stepped_ = true;
+            orv::test::letAWriterIn(fifo_);
+            wait = std::chrono::milliseconds(100);  // and again for every open behind it
+          }
+        }) {}
+  ~Watchdog() { finish(); }
+  Watchdog(const Watchdog &) = delete;
+  Watchdog &operator=(const Watchdog &) = delete;
+  // True when a call had to be let go.
+  bool finish() {
+    {
+      const std::lock_guard<std::mutex> lock(mutex_);
+      finished_ = true;
+    }
+    done_.notify_one();
+    if (thread_.joinable()) thread_.join();
+    return stepped_;
+  }
+
+ private:
+  std::string fifo_;
+  std::mutex mutex_;
+  std::condition_variable done_;
+  bool finished_ = false, stepped_ = false;
+  std::thread thread_;
+};
+
+// The stand-in's file service opens a regular file and nothing else, at
+// once: a FIFO that nobody writes to, a device and a folder are refused, so
+// that the table ends as it does for a missing file.
+TEST_F(Snapshot, OpensOnlyARegularFileAndNeverWaits) {
+  void *services = orv::test::openLibrary(ORV_STANDIN_SYS_PATH);
+  ASSERT_NE(services, nullptr) << orv::test::loaderError();
+  const auto open =
+      reinterpret_cast<decltype(&sqloopenp)>(orv::test::findExport(services, "sqloopenp"));
+  const auto close =
+      reinterpret_cast<decltype(&sqloclose)>(orv::test::findExport(services, "sqloclose"));
+  ASSERT_TRUE(open != nullptr && close != nullptr);
+  const std::string file = (dir / "tmp" / "cache.sql").string();
+  write(statement(numbered(1, "a")));
+  CLI_fileHandle handle{};
+  ASSERT_EQ(open(file.c_str(), 20, 1024, &handle, 0), 0);
+  close(handle);
+
+  std::vector<std::pair<const char *, std::string>> refused = {
+      {"a folder", (dir / "tmp").string()},
+      {"a device", orv::test::aDevice()},
+      {"nothing", (dir / "missing").string()}};
+  fs::remove(file);
+  const bool fifo = orv::test::makeFifo(file);
+  if (fifo) refused.emplace_back("a FIFO with no writer", file);
+  Watchdog watchdog(file);
+  for (const auto &[what, path] : refused) {
+    EXPECT_NE(open(path.c_str(), 20, 1024, &handle, 0), 0) << what;
+  }
+  if (fifo) {
+    EXPECT_EQ(texts().size(), 0u) << "the table over a FIFO";
+  }
+  EXPECT_FALSE(watchdog.finish()) << "an open waited for a writer";
+  orv::test::closeLibrary(services);
 }
 
 }  // namespace

@@ -25,10 +25,9 @@ using cli::platform::kPathSeparator;
 
 constexpr std::uint16_t kStatement = 19, kSection = 30, kSectionText = 321, kSectionData = 322;
 constexpr std::uint32_t kTextRoom = 8, kDataRoom = 264;
-// The largest statement element taken: far above what its columns can
-// hold (a text below 1 MiB and a few numbers), so that a size word from a
-// damaged file can't ask for gigabytes before its read fails.
-constexpr std::uint32_t kStatementRoom = 64u << 20;
+// What the log line carries as the status when a statement is refused
+// because the file ends before it would: no block was asked for.
+constexpr std::int32_t kRefusedStatus = -1;
 constexpr std::size_t kColumns = 18;
 constexpr const char *kModule = "cliudf";
 
@@ -135,6 +134,21 @@ bool scanSection(Scratch &s, sqlm_header_info &h) {
   return readHeader(s, h) && h.element == kStatement;
 }
 
+enum class Room : std::uint8_t { enough, tooLittle, lost };
+
+// Whether the file holds `size` (at least 1) more bytes from where it
+// stands: the last of them is read, and the position is put back.  A move
+// that fails leaves the position where it was; a read that fails at the
+// end of the file leaves it where the move took it.
+Room fileHolds(const Scratch &s, std::uint32_t size) {
+  if (sqlochgfileptr(s.file, std::int64_t{size} - 1, 1, 0) != 0) return Room::tooLittle;
+  unsigned char last = 0;
+  const bool there = readBytes(s, &last, 1);
+  const std::int64_t back = there ? std::int64_t{size} : std::int64_t{size} - 1;
+  if (sqlochgfileptr(s.file, -back, 1, 0) != 0) return Room::lost;
+  return there ? Room::enough : Room::tooLittle;
+}
+
 bool has(const sqlm_header_info &h, std::uint32_t bytes) { return h.size >= bytes; }
 
 // The 32-bit integer at the start of a child element's data.  Elements lie
@@ -210,14 +224,26 @@ void fetch(Scratch &s, const Row &row, char *sqlstate) {
   } else if (h.element != kStatement) {
     return endTable(sqlstate);
   }
-  if (h.size > kStatementRoom) return endTable(sqlstate);
   // One block serves every statement; it is replaced only by a larger one.
   if (s.capacity < h.size) {
     if (s.capacity > 0) sqlofmblkEx(kModule, __LINE__, s.block);
     s.block = nullptr;
     s.capacity = 0;
+    // A size word that claims more than the rest of the file is refused
+    // before a block of that size is asked for, and logged as a block that
+    // can't be had, so that a damaged file never costs gigabytes and the
+    // administrator sees why the table ended.
     void *block = nullptr;
-    const std::int32_t status = sqlogmblkEx(nullptr, h.size, 0, &block, kModule, __LINE__, 0);
+    std::int32_t status = kRefusedStatus;
+    switch (fileHolds(s, h.size)) {
+      case Room::enough:
+        status = sqlogmblkEx(nullptr, h.size, 0, &block, kModule, __LINE__, 0);
+        break;
+      case Room::tooLittle:
+        break;
+      case Room::lost:  // the file position could not be put back
+        return endTable(sqlstate);
+    }
     if (status != 0) {
       endTable(sqlstate);
       sqlt_logerr_data("SQLCACHE_SNAPSHOT: unable to allocate temporary sqlcache stmt", &status, 4,

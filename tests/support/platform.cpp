@@ -7,8 +7,10 @@
 #include <cstdlib>
 #else
 #include <dlfcn.h>
+#include <fcntl.h>
 #include <link.h>
 #include <sys/mman.h>
+#include <sys/stat.h>
 #include <unistd.h>
 
 #include <cstdlib>
@@ -44,6 +46,12 @@ void setEnvironment(const char *name, const char *value) { ::_putenv_s(name, val
 void unsetEnvironment(const char *name) { ::_putenv_s(name, ""); }
 
 int processId() { return ::_getpid(); }
+
+const char *aDevice() { return "NUL"; }
+
+bool makeFifo(const std::string &) { return false; }
+
+void letAWriterIn(const std::string &) {}
 
 BytesBeforeAGuardPage::BytesBeforeAGuardPage() {
   SYSTEM_INFO info;
@@ -83,6 +91,15 @@ void setEnvironment(const char *name, const char *value) { ::setenv(name, value,
 void unsetEnvironment(const char *name) { ::unsetenv(name); }
 
 int processId() { return static_cast<int>(::getpid()); }
+
+const char *aDevice() { return "/dev/null"; }
+
+bool makeFifo(const std::string &path) { return ::mkfifo(path.c_str(), 0600) == 0; }
+
+void letAWriterIn(const std::string &path) {
+  const int fd = ::open(path.c_str(), O_WRONLY | O_NONBLOCK | O_CLOEXEC);
+  if (fd >= 0) ::close(fd);
+}
 
 BytesBeforeAGuardPage::BytesBeforeAGuardPage()
     : page_(static_cast<std::size_t>(::sysconf(_SC_PAGESIZE))) {

@@ -39,6 +39,16 @@ void unsetEnvironment(const char *name);
 
 int processId();
 
+// A device that opens like a file: /dev/null, or NUL on Windows.
+const char *aDevice();
+
+// Makes a FIFO at `path`; false where the system has none (Windows).
+bool makeFifo(const std::string &path);
+
+// Opens the FIFO at `path` for writing without waiting and closes it again,
+// which lets a reader that waits in its open go on.
+void letAWriterIn(const std::string &path);
+
 // Bytes placed so that their last one is the last readable byte before a
 // page that can't be read: a routine that reads one byte too many dies.
 class BytesBeforeAGuardPage {
