@@ -78,6 +78,9 @@ class Builder {
   std::size_t length_ = 0;
 };
 
+// Source bytes that REPLACE of a single byte takes at a time.
+constexpr std::size_t kByteBlock = 64;
+
 // REPLACE of a single byte, when the result fits.  The matches are counted
 // first, so that the result is known to
 // fit and no piece needs a check.  Then the filter kernel marks the matches
@@ -89,15 +92,10 @@ class Builder {
 bool replaceByte(Bytes source, cli::Byte search, Bytes replacement, cli::Byte *area,
                  std::size_t limit, std::size_t &length) noexcept {
   const cli::str::FilterKernel &kernel = cli::str::bestFilterKernel();
-  constexpr std::size_t kBlock = 64;
+  constexpr std::size_t kBlock = kByteBlock;
   const cli::Byte *from = source.data;
   const std::size_t n = source.size, r = replacement.size;
-  std::size_t matches = 0;
-  if (n >= kBlock) {
-    matches = kernel.count(from, n, search);
-  } else {
-    for (std::size_t i = 0; i < n; ++i) matches += from[i] == search ? 1 : 0;
-  }
+  const std::size_t matches = kernel.count(from, n, search);
   // n - matches + matches * r, without overflow for any r.
   if (n - matches > limit || (matches != 0 && r > (limit - (n - matches)) / matches)) return false;
   length = n - matches + matches * r;
@@ -169,7 +167,8 @@ void replace(const typename Form::Value *sourceValue, const typename Form::Value
   // length in the length word.
   Form::finish(out, std::is_same_v<Form, Text> ? 0 : source.size);
   std::size_t length = 0;
-  if (search.size == 1 &&
+  // A short source is served as well by memchr from match to match.
+  if (search.size == 1 && source.size >= kByteBlock &&
       replaceByte(source, search.data[0], replacement, Form::area(out), Limit, length)) {
     return Form::finish(out, length);
   }
