@@ -250,11 +250,10 @@ class Searcher {
         leave(Stage::filter, from);
         return filtered(from);
       }
-      spent_ = 0;
-      since_ = from;
       if (choices_ < kChoices && from <= last && last - from + 1 >= kSample) {
         // The first choice stops once the sample is ruled out; should that
         // prove too few offsets, the second takes all eight.
+        leave(Stage::filter, from);
         pickFromSample(from, choices_ == 0 ? 2 : kMaxProbes);
         ++choices_;
         return filtered(from);

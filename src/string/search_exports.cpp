@@ -82,17 +82,16 @@ class Builder {
 constexpr std::size_t kByteBlock = 64;
 
 // REPLACE of a single byte, when the result fits.  The matches are counted
-// first, so that the result is known to
-// fit and no piece needs a check.  Then the filter kernel marks the matches
-// of 64 source bytes at a time: the bytes between matches are copied in
-// one piece each, however many blocks they span, and a block of nothing but
-// matches is written at once where the replacement is 16 bytes or fewer.
+// first, so that the result is known to fit and no piece needs a check.
+// Then the filter kernel marks the matches of 64 source bytes at a time:
+// the bytes between matches are copied in one piece each, however many
+// blocks they span, and a block of nothing but matches is written at once
+// where the replacement is 16 bytes or fewer.
 // Returns false, with nothing written, when the result would pass `limit`;
 // the caller then builds it piece by piece up to the failure.
 bool replaceByte(Bytes source, cli::Byte search, Bytes replacement, cli::Byte *area,
                  std::size_t limit, std::size_t &length) noexcept {
   const cli::str::FilterKernel &kernel = cli::str::bestFilterKernel();
-  constexpr std::size_t kBlock = kByteBlock;
   const cli::Byte *from = source.data;
   const std::size_t n = source.size, r = replacement.size;
   const std::size_t matches = kernel.count(from, n, search);
@@ -123,24 +122,25 @@ bool replaceByte(Bytes source, cli::Byte search, Bytes replacement, cli::Byte *a
     copied = at + 1;
   };
   constexpr std::size_t kPatterned = 16;
-  cli::Byte pattern[kBlock * kPatterned];
+  cli::Byte pattern[kByteBlock * kPatterned];
   std::size_t patterned = 0;
-  const std::size_t whole = n - n % kBlock;
-  for (std::size_t i = 0; i < whole; i += kBlock) {
+  const std::size_t whole = n - n % kByteBlock;
+  for (std::size_t i = 0; i < whole; i += kByteBlock) {
     std::uint64_t mask = kernel.agree64(from + i, search);
     if (mask == 0) continue;
     if (mask == ~std::uint64_t{0} && r <= kPatterned && copied == i) {
       if (r == 1) {
-        std::memset(to, replacement.data[0], kBlock);
+        std::memset(to, replacement.data[0], kByteBlock);
       } else if (r > 1) {
         if (patterned == 0) {  // the replacement 64 times over, made once
-          for (std::size_t k = 0; k < kBlock; ++k) copyPiece(pattern + k * r, replacement.data, r);
-          patterned = kBlock * r;
+          for (std::size_t k = 0; k < kByteBlock; ++k)
+            copyPiece(pattern + k * r, replacement.data, r);
+          patterned = kByteBlock * r;
         }
         std::memcpy(to, pattern, patterned);
       }
-      to += kBlock * r;
-      copied = i + kBlock;
+      to += kByteBlock * r;
+      copied = i + kByteBlock;
       continue;
     }
     for (; mask != 0; mask &= mask - 1) match(i + static_cast<std::size_t>(std::countr_zero(mask)));
