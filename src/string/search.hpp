@@ -132,7 +132,12 @@ class Searcher {
    public:
     Scan(const Searcher &searcher, Bytes haystack) noexcept
         : s_(searcher), h_(haystack.data), n_(haystack.size) {
-      if (s_.m_ >= 2) load(s_.first_);
+      // The first pair only: the other probes are set when they are chosen.
+      probes_.count = 2;
+      for (std::size_t k = 0; k < 2; ++k) {
+        probes_.offset[k] = s_.first_.offset[k];
+        probes_.byte[k] = s_.first_.byte[k];
+      }
     }
 
     // The first match at or after `from`, which is never below the `from`
@@ -186,12 +191,12 @@ class Searcher {
       const std::size_t m = s_.m_, last = n_ - m, lanes = s_.kernel_->lanes;
       std::size_t base = from, next = from;
       std::uint64_t mask = 0;
-      if (pendingValid_ && from >= pendingBase_ && from - pendingBase_ < lanes) {
+      if (pending_ != 0 && from >= pendingBase_ && from - pendingBase_ < lanes) {
         base = pendingBase_;
         mask = pending_ & (~std::uint64_t{0} << (from - pendingBase_));
         next = base + lanes;
       }
-      pendingValid_ = false;
+      pending_ = 0;
       for (;;) {
         while (mask != 0) {
           const std::size_t at = base + static_cast<std::size_t>(std::countr_zero(mask));
@@ -200,7 +205,6 @@ class Searcher {
           if (i == m) {
             pending_ = mask;
             pendingBase_ = base;
-            pendingValid_ = true;
             return at;
           }
           spent_ += kMissCost + i;
@@ -321,10 +325,6 @@ class Searcher {
 
     static constexpr std::size_t kMaxProbes = Probes::kMax;
 
-    void load(const std::array<std::size_t, 2> &pair) noexcept {
-      const std::size_t offsets[2] = {pair[0], pair[1]};
-      setProbes(offsets, 2);
-    }
     void setProbes(const std::size_t *offsets, std::size_t n) noexcept {
       probes_.count = n;
       for (std::size_t k = 0; k < n; ++k) {
@@ -416,9 +416,8 @@ class Searcher {
     std::size_t since_ = 0;
     int choices_ = 0;
 
-    std::uint64_t pending_ = 0;  // positions of the last block not yet tried
+    std::uint64_t pending_ = 0;  // positions of the last block not yet tried, if any
     std::size_t pendingBase_ = 0;
-    bool pendingValid_ = false;
 
     Stage stage_ = Stage::rareByte;
     bool factored_ = false;
@@ -441,13 +440,17 @@ class Searcher {
       if (x_[i] != x_[a] && (b == kNotFound || rank[x_[i]] < rank[x_[b]])) b = i;
     }
     if (b == kNotFound) b = a == 0 ? m_ - 1 : 0;
-    first_ = {a, b};
+    first_.count = 2;
+    first_.offset[0] = a;
+    first_.offset[1] = b;
+    first_.byte[0] = x_[a];
+    first_.byte[1] = x_[b];
   }
 
   const Byte *x_;
   std::size_t m_;
   const FilterKernel *kernel_;
-  std::array<std::size_t, 2> first_ = {0, 0};
+  Probes first_{};  // the first pair of offsets, and the needle's bytes there
 };
 
 }  // namespace cli::str
