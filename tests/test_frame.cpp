@@ -17,7 +17,7 @@ TEST(RaiseSysfun, StoresStateAndCodeAndNothingElse) {
   char message[16];
   std::memset(sqlstate, '#', sizeof sqlstate);
   std::memset(message, '#', sizeof message);
-  CLI_raiseSysfun(sqlstate, message, CLI_SYSFUN_TOO_LONG);
+  CLI_raiseSysfun(sqlstate, message, "10");
   EXPECT_EQ(std::string(sqlstate, 8), std::string("38552\0##", 8));
   EXPECT_EQ(std::string(message, 16), std::string("SYSFUN:10\0######", 16));
 }

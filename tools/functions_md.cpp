@@ -160,24 +160,12 @@ int main(int argc, char **argv) {
   for (const Routine &r : kRoutines) {
     const bool table =
         r.frame == cli::catalogue::Frame::table || r.frame == cli::catalogue::Frame::tableCallback;
-    if (!table || r.built != cli::catalogue::Built::yes) continue;
+    if (!table) continue;
     const std::string plain = orv::host::lowerCase(r.sqlName);
     out << "| `" << r.symbol << "` | `" << orv::host::kPrefix << plain << "`, `" << plain << "` | "
         << arguments(r) << " | " << results(r) << " | " << r.summary << " |\n";
   }
 
-  bool pending = false;
-  for (const Routine &r : kRoutines) pending = pending || r.built != cli::catalogue::Built::yes;
-  if (pending) {
-    out << "\n## Not yet in this build\n\n"
-        << "| Export | SQL name | Arguments | Result | SYSFUN errors | What it gives |\n"
-        << "|---|---|---|---|---|---|\n";
-    for (const Routine &r : kRoutines) {
-      if (r.built == cli::catalogue::Built::yes) continue;
-      out << "| `" << r.symbol << "` | " << r.sqlName << " | " << arguments(r) << " | "
-          << results(r) << " | " << codes(r) << " | " << r.summary << " |\n";
-    }
-  }
   sqlite3_close(db);
 
   if (argc < 2) {

@@ -24,7 +24,6 @@
 
 namespace orv::host {
 
-using cli::catalogue::Built;
 using cli::catalogue::Frame;
 using cli::catalogue::kRoutines;
 using cli::catalogue::Layout;
@@ -36,7 +35,7 @@ constexpr bool hostable(const Routine &r) {
   // A database information block is the extension's own, for UTF-8.
   const bool frameKnown = r.frame == Frame::plain || r.frame == Frame::dbinfo ||
                           (r.frame == Frame::scratchpad && inputCount(r) >= 1);
-  return r.built == Built::yes && frameKnown && resultCount(r) == 1;
+  return frameKnown && resultCount(r) == 1;
 }
 
 constexpr bool isNumber(Layout l) {

@@ -41,7 +41,7 @@ using cli::catalogue::Routine;
 // ---- The engine's side of the Fmp callback --------------------------------
 
 // Rows of 16 bytes: index, frame argument count, inputs, results, frame
-// variant and whether the export is built, for every catalogue routine.
+// variant and the property bits, for every catalogue routine.
 std::vector<unsigned char> routineRows() {
   std::vector<unsigned char> out;
   std::int32_t index = 0;
@@ -55,7 +55,7 @@ std::vector<unsigned char> routineRows() {
     std::memcpy(row + 8, &inputs, 2);
     std::memcpy(row + 10, &results, 2);
     row[12] = static_cast<unsigned char>(r.frame);
-    row[13] = r.built == cli::catalogue::Built::yes ? 1 : 0;
+    row[13] = static_cast<unsigned char>(r.properties);
     out.insert(out.end(), row, row + 16);
     ++index;
   }
@@ -406,7 +406,7 @@ int registerTables(sqlite3 *db, void *library, char **error) {
   for (std::size_t row = 0; row < std::size(kRoutines); ++row) {
     const Routine &r = kRoutines[row];
     const bool table = r.frame == Frame::table || r.frame == Frame::tableCallback;
-    if (!table || r.built != cli::catalogue::Built::yes) continue;
+    if (!table) continue;
     void *routine = dlsym(library, r.symbol);
     if (routine == nullptr) {
       *error = sqlite3_mprintf("orvclifn: the library has no export %s", r.symbol);

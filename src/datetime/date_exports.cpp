@@ -11,31 +11,34 @@
 #include "calendar/parse.hpp"
 #include "datetime/numbers.hpp"
 #include "frame/frame.hpp"
+#include "routines.hpp"
 
 namespace {
 
-using cli::Ind;
-using cli::NameArg;
-using cli::Status;
+using cli::Answer;
+using cli::success;
+using cli::Sysfun;
 using DateNumber = std::int32_t (*)(std::int32_t, std::int32_t, std::int32_t);
 
 // Reads only the date at the head of the text; every failure is 04.
 template <DateNumber compute>
-void fromDatePart(char *text, std::int32_t *result, Status status) noexcept {
+Answer<std::int32_t> fromDatePart(cli::TextIn text) noexcept {
   std::int32_t y = 0, m = 0, d = 0;
-  if (cli::CLI_parseDatePart(text, &y, &m, &d) == 0) return status.raise(cli::Sysfun::badDate);
-  *result = compute(y, m, d);
+  if (cli::CLI_parseDatePart(text.chars(), &y, &m, &d) == 0) {
+    return cli::failure<std::int32_t>(Sysfun::badDate);
+  }
+  return success(compute(y, m, d));
 }
 
 // Validates the whole text, a time of day included; fails with 04 or 06.
 template <DateNumber compute>
-void fromDateText(char *text, std::int32_t *result, Status status) noexcept {
+Answer<std::int32_t> fromDateText(cli::TextIn text) noexcept {
   std::int32_t y = 0, m = 0, d = 0;
   char code[3];
-  if (cli::CLI_parseDateText(text, &y, &m, &d, nullptr, nullptr, nullptr, code) == 0) {
-    return status.raise(code);
+  if (cli::CLI_parseDateText(text.chars(), &y, &m, &d, nullptr, nullptr, nullptr, code) == 0) {
+    return cli::failure<std::int32_t>(cli::sysfunOf(code));
   }
-  *result = compute(y, m, d);
+  return success(compute(y, m, d));
 }
 
 constexpr std::int32_t secondsOf(std::int32_t h, std::int32_t m, std::int32_t s) {
@@ -44,51 +47,75 @@ constexpr std::int32_t secondsOf(std::int32_t h, std::int32_t m, std::int32_t s)
 
 }  // namespace
 
-#define CLI_DATE_EXPORT(name, reader, compute)                                              \
-  CLI_EXPORT void name(char *text, std::int32_t *result, Ind, Ind, char *sqlstate, NameArg, \
-                       NameArg, char *message) noexcept {                                   \
-    reader<compute>(text, result, Status{sqlstate, message}); /* NOLINT */                  \
-  }
+namespace cli {
 
-CLI_DATE_EXPORT(CLI_udfJULIAN_DAY1, fromDatePart, cli::CLI_julianDay)
-CLI_DATE_EXPORT(CLI_udfJULIAN_DAY2, fromDateText, cli::CLI_julianDay)
-CLI_DATE_EXPORT(CLI_udfWEEK1, fromDatePart, cli::CLI_weekOfYear)
-CLI_DATE_EXPORT(CLI_udfWEEK2, fromDateText, cli::CLI_weekOfYear)
-CLI_DATE_EXPORT(CLI_udfWEEK_ISO1, fromDatePart, cli::CLI_isoWeekOfYear)
-CLI_DATE_EXPORT(CLI_udfWEEK_ISO2, fromDateText, cli::CLI_isoWeekOfYear)
-CLI_DATE_EXPORT(CLI_udfQUARTER1, fromDatePart, cli::CLI_quarter)
-CLI_DATE_EXPORT(CLI_udfQUARTER2, fromDateText, cli::CLI_quarter)
-CLI_DATE_EXPORT(CLI_udfDAYOFYEAR1, fromDatePart, cli::CLI_dayOfYear)
-CLI_DATE_EXPORT(CLI_udfDAYOFYEAR2, fromDateText, cli::CLI_dayOfYear)
+Answer<std::int32_t> routine::JULIAN_DAY1(TextIn date) noexcept {
+  return fromDatePart<cli::CLI_julianDay>(date);
+}
+Answer<std::int32_t> routine::JULIAN_DAY2(TextIn date) noexcept {
+  return fromDateText<cli::CLI_julianDay>(date);
+}
+Answer<std::int32_t> routine::WEEK1(TextIn date) noexcept {
+  return fromDatePart<cli::CLI_weekOfYear>(date);
+}
+Answer<std::int32_t> routine::WEEK2(TextIn date) noexcept {
+  return fromDateText<cli::CLI_weekOfYear>(date);
+}
+Answer<std::int32_t> routine::WEEK_ISO1(TextIn date) noexcept {
+  return fromDatePart<cli::CLI_isoWeekOfYear>(date);
+}
+Answer<std::int32_t> routine::WEEK_ISO2(TextIn date) noexcept {
+  return fromDateText<cli::CLI_isoWeekOfYear>(date);
+}
+Answer<std::int32_t> routine::QUARTER1(TextIn date) noexcept {
+  return fromDatePart<cli::CLI_quarter>(date);
+}
+Answer<std::int32_t> routine::QUARTER2(TextIn date) noexcept {
+  return fromDateText<cli::CLI_quarter>(date);
+}
+Answer<std::int32_t> routine::DAYOFYEAR1(TextIn date) noexcept {
+  return fromDatePart<cli::CLI_dayOfYear>(date);
+}
+Answer<std::int32_t> routine::DAYOFYEAR2(TextIn date) noexcept {
+  return fromDateText<cli::CLI_dayOfYear>(date);
+}
 // For the days of the week the digits run the other way.
-CLI_DATE_EXPORT(CLI_udfDAYOFWEEK1, fromDateText, cli::CLI_dayOfWeek)
-CLI_DATE_EXPORT(CLI_udfDAYOFWEEK2, fromDatePart, cli::CLI_dayOfWeek)
-CLI_DATE_EXPORT(CLI_udfDAYOFWEEK_ISO1, fromDateText, cli::CLI_isoDayOfWeek)
-CLI_DATE_EXPORT(CLI_udfDAYOFWEEK_ISO2, fromDatePart, cli::CLI_isoDayOfWeek)
+Answer<std::int32_t> routine::DAYOFWEEK1(TextIn date) noexcept {
+  return fromDateText<cli::CLI_dayOfWeek>(date);
+}
+Answer<std::int32_t> routine::DAYOFWEEK2(TextIn date) noexcept {
+  return fromDatePart<cli::CLI_dayOfWeek>(date);
+}
+Answer<std::int32_t> routine::DAYOFWEEK_ISO1(TextIn date) noexcept {
+  return fromDateText<cli::CLI_isoDayOfWeek>(date);
+}
+Answer<std::int32_t> routine::DAYOFWEEK_ISO2(TextIn date) noexcept {
+  return fromDatePart<cli::CLI_isoDayOfWeek>(date);
+}
 
 // A time alone; 05 when it is no time.
-CLI_EXPORT void CLI_udfMIDNIGHT_SECONDS1(char *text, std::int32_t *result, Ind, Ind, char *sqlstate,
-                                         NameArg, NameArg, char *message) noexcept {
+Answer<std::int32_t> routine::MIDNIGHT_SECONDS1(TextIn time) noexcept {
   std::int32_t h = 0, m = 0, s = 0;
-  if (cli::CLI_parseTimeText(cli::kTimeMode, text, &h, &m, &s) == 0) {
-    return Status{sqlstate, message}.raise(cli::Sysfun::badTime);
+  if (CLI_parseTimeText(kTimeMode, time.chars(), &h, &m, &s) == 0) {
+    return failure<std::int32_t>(Sysfun::badTime);
   }
-  *result = secondsOf(h, m, s);
+  return success(secondsOf(h, m, s));
 }
 
 // A time, or a date or timestamp: 9 bytes or more after trimming is read as
 // a date, as no time text is that long.
-CLI_EXPORT void CLI_udfMIDNIGHT_SECONDS2(char *text, std::int32_t *result, Ind, Ind, char *sqlstate,
-                                         NameArg, NameArg, char *message) noexcept {
-  const Status status{sqlstate, message};
+Answer<std::int32_t> routine::MIDNIGHT_SECONDS2(TextIn value) noexcept {
+  char *text = value.chars();
   std::int32_t y = 0, mo = 0, d = 0, h = 0, m = 0, s = 0;
-  if (cli::CLI_trimBlanks(text) >= 9) {
+  if (CLI_trimBlanks(text) >= 9) {
     char code[3];
-    if (cli::CLI_parseDateText(text, &y, &mo, &d, &h, &m, &s, code) == 0) {
-      return status.raise(code);
+    if (CLI_parseDateText(text, &y, &mo, &d, &h, &m, &s, code) == 0) {
+      return failure<std::int32_t>(sysfunOf(code));
     }
-  } else if (cli::CLI_parseTimeText(cli::kTimeMode, text, &h, &m, &s) == 0) {
-    return status.raise(cli::Sysfun::badTime);
+  } else if (CLI_parseTimeText(kTimeMode, text, &h, &m, &s) == 0) {
+    return failure<std::int32_t>(Sysfun::badTime);
   }
-  *result = secondsOf(h, m, s);
+  return success(secondsOf(h, m, s));
 }
+
+}  // namespace cli

@@ -7,13 +7,24 @@
 #include <cstring>
 
 #include "frame/frame.hpp"
+#include "routines.hpp"
 
 namespace {
 
-using cli::Ind;
-using cli::NameArg;
-using cli::Status;
 using cli::Sysfun;
+
+// The interval codes: the unit that the duration is counted in.
+enum Interval : std::int32_t {
+  kMicroseconds = 1,
+  kSeconds = 2,
+  kMinutes = 4,
+  kHours = 8,
+  kDays = 16,
+  kWeeks = 32,
+  kMonths = 64,
+  kQuarters = 128,
+  kYears = 256,
+};
 
 constexpr std::int64_t kMax = 2147483647;
 
@@ -65,7 +76,7 @@ Sysfun read(const char *text, Duration &out) noexcept {
   for (std::size_t k = 0; k < 6; ++k) {
     out.micros = out.micros * 10 + (k < fraction ? text[point + 1 + k] - '0' : 0);
   }
-  return Sysfun{};
+  return Sysfun::none;
 }
 
 // The duration in the unit of `code`, or 0 with `failure` set.
@@ -73,31 +84,31 @@ std::int64_t convert(std::int32_t code, const Duration &t, Sysfun &failure) noex
   const std::int64_t totalMinutes =
       t.years * 525600 + t.months * 43200 + t.days * 1440 + t.hours * 60 + t.minutes;
   switch (code) {
-    case 1: {
+    case kMicroseconds: {
       if (totalMinutes > (kMax - t.seconds) / 60) break;
       const std::int64_t totalSeconds = t.seconds + totalMinutes * 60;
       if (totalSeconds > (kMax - t.micros) / 1000000) break;
       return t.micros + totalSeconds * 1000000;
     }
-    case 2:
+    case kSeconds:
       if (totalMinutes > (kMax - t.seconds) / 60) break;
       return t.seconds + totalMinutes * 60;
-    case 4:
+    case kMinutes:
       // Minutes have no overflow test and no failure: from a year field of
       // 4086 on the total passes 32 bits, and what is stored is the total
       // kept in 32 bits, two's complement, the same on every platform.
       return static_cast<std::int32_t>(static_cast<std::uint32_t>(totalMinutes));
-    case 8:
+    case kHours:
       return t.years * 8760 + t.months * 720 + t.days * 24 + t.hours;
-    case 16:
+    case kDays:
       return t.years * 365 + t.months * 30 + t.days;
-    case 32:
+    case kWeeks:
       return t.years * 52 + (t.months * 30 + t.days) / 7;
-    case 64:
+    case kMonths:
       return t.years * 12 + t.months;
-    case 128:
+    case kQuarters:
       return t.years * 4 + t.months / 3;
-    case 256:
+    case kYears:
       return t.years;
     default:
       failure = Sysfun::badInterval;
@@ -109,14 +120,18 @@ std::int64_t convert(std::int32_t code, const Duration &t, Sysfun &failure) noex
 
 }  // namespace
 
-CLI_EXPORT void CLI_udfTIMESTAMPDIFF(const std::int32_t *code, const char *duration,
-                                     std::int32_t *result, Ind, Ind, Ind, char *sqlstate, NameArg,
-                                     NameArg, char *message) noexcept {
-  const Status status{sqlstate, message};
+namespace cli {
+
+Answer<std::int32_t> routine::TIMESTAMPDIFF(std::int32_t interval, TextIn duration) noexcept {
   Duration t;
-  if (const Sysfun bad = read(duration, t); bad != Sysfun{}) return status.raise(bad);
-  Sysfun failure{};
-  const std::int64_t value = convert(*code, t, failure);
-  if (failure != Sysfun{}) return status.raise(failure);
-  *result = static_cast<std::int32_t>(static_cast<std::uint32_t>(t.negative ? -value : value));
+  if (const Sysfun bad = read(duration.chars(), t); bad != Sysfun::none) {
+    return failure<std::int32_t>(bad);
+  }
+  Sysfun failed = Sysfun::none;
+  const std::int64_t value = convert(interval, t, failed);
+  if (failed != Sysfun::none) return failure<std::int32_t>(failed);
+  return success(
+      static_cast<std::int32_t>(static_cast<std::uint32_t>(t.negative ? -value : value)));
 }
+
+}  // namespace cli

@@ -8,18 +8,19 @@
 
 #include "calendar/calendar.hpp"
 #include "calendar/parse.hpp"
+#include "catalogue/catalogue.hpp"
+#include "engine/conversion.hpp"
 #include "engine/services.h"
-#include "frame/conversion.hpp"
 #include "frame/frame.hpp"
+#include "routines.hpp"
 
 namespace {
 
-using cli::Ind;
-using cli::NameArg;
-using cli::Status;
+using cli::Report;
 using cli::Sysfun;
 
-constexpr std::uint32_t kSpace = 101;
+// The room for a name: the longest name result that the catalogue gives.
+constexpr std::uint32_t kSpace = cli::catalogue::kName;
 
 static_assert(sizeof(CLI_nlsTimeRecord) == 36);
 static_assert(offsetof(CLI_nlsTimeRecord, month) == 16);
@@ -31,20 +32,21 @@ enum class Reader { wholeText, datePart };
 // Parse, fetch the name, store it in the database's code page.  A null
 // information block ends the call after the date is validated.
 template <Name name, Reader reader>
-void nameOf(char *text, char *result, Status status, const unsigned char *dbinfo) noexcept {
+Report nameOf(cli::TextIn date, cli::TextOut out, cli::DbInfo dbinfo) noexcept {
+  char *text = date.chars();
+  char *result = out.chars();
   std::int32_t y = 0, m = 0, d = 0;
   if constexpr (reader == Reader::wholeText) {
     char code[3];
     if (cli::CLI_parseDateText(text, &y, &m, &d, nullptr, nullptr, nullptr, code) == 0) {
-      return status.raise(code);
+      return cli::sysfunOf(code);
     }
   } else if (cli::CLI_parseDatePart(text, &y, &m, &d) == 0) {
-    return status.raise(Sysfun::badDate);
+    return Sysfun::badDate;
   }
   CLI_nlsTimeRecord time{};
-  if (dbinfo == nullptr) return;
-  std::uint32_t databaseCodePage = 0;
-  std::memcpy(&databaseCodePage, dbinfo + CLI_DBINFO_CODEPAGE_OFFSET, sizeof databaseCodePage);
+  if (!dbinfo.present()) return {};
+  const std::uint32_t databaseCodePage = dbinfo.codePage();
 
   unsigned char buffer[kSpace + 3];
   std::uint16_t nameCodePage = 0;
@@ -57,30 +59,37 @@ void nameOf(char *text, char *result, Status status, const unsigned char *dbinfo
     length = sqloNLSGetServerMonthName(&time, kSpace, buffer, &nameCodePage);
   }
   // A length beyond the buffer is no name either: nothing past it is read.
-  if (length == 0 || length > kSpace) return status.raise(Sysfun::overflow);
+  if (length == 0 || length > kSpace) return Sysfun::overflow;
 
   if (std::uint32_t{nameCodePage} == databaseCodePage) {
     std::memcpy(result, buffer, length);
     result[length] = '\0';
-    return;
+    return {};
   }
   auto *target = reinterpret_cast<unsigned char *>(result);
   const cli::Converted c =
       cli::CLI_convertCodePage(buffer, length, nameCodePage, databaseCodePage, target, kSpace);
   result[c.length <= kSpace ? c.length : kSpace] = '\0';
-  if (c.status != 0) status.raise(Sysfun::overflow);
+  if (c.status != 0) return Sysfun::overflow;
+  return {};
 }
 
 }  // namespace
 
-#define CLI_NAME_EXPORT(symbol, name, reader)                                                  \
-  CLI_EXPORT void symbol(char *text, char *result, Ind, Ind, char *sqlstate, NameArg, NameArg, \
-                         char *message, const unsigned char *dbinfo) noexcept {                \
-    nameOf<name, reader>(text, result, Status{sqlstate, message}, dbinfo);                     \
-  }
+namespace cli {
 
 // The digits run the opposite way in the two routines.
-CLI_NAME_EXPORT(CLI_udfDAYNAME1, Name::day, Reader::wholeText)
-CLI_NAME_EXPORT(CLI_udfDAYNAME2, Name::day, Reader::datePart)
-CLI_NAME_EXPORT(CLI_udfMONTHNAME1, Name::month, Reader::datePart)
-CLI_NAME_EXPORT(CLI_udfMONTHNAME2, Name::month, Reader::wholeText)
+Report routine::DAYNAME1(TextIn date, TextOut result, DbInfo dbinfo) noexcept {
+  return nameOf<Name::day, Reader::wholeText>(date, result, dbinfo);
+}
+Report routine::DAYNAME2(TextIn date, TextOut result, DbInfo dbinfo) noexcept {
+  return nameOf<Name::day, Reader::datePart>(date, result, dbinfo);
+}
+Report routine::MONTHNAME1(TextIn date, TextOut result, DbInfo dbinfo) noexcept {
+  return nameOf<Name::month, Reader::datePart>(date, result, dbinfo);
+}
+Report routine::MONTHNAME2(TextIn date, TextOut result, DbInfo dbinfo) noexcept {
+  return nameOf<Name::month, Reader::wholeText>(date, result, dbinfo);
+}
+
+}  // namespace cli

@@ -8,15 +8,13 @@
 
 #include "calendar/parse.hpp"
 #include "frame/frame.hpp"
+#include "routines.hpp"
 
 namespace {
 
-using cli::Ind;
-using cli::NameArg;
-using cli::Status;
+using cli::Report;
 using cli::Sysfun;
 
-constexpr std::size_t kStamp = 26;
 constexpr char kMidnight[] = "-00.00.00.000000";
 constexpr char kNoFraction[] = ".000000";
 
@@ -43,56 +41,60 @@ char *append(char *out, const char *text, std::size_t length) noexcept {
 }
 
 // A time on today's date; 05 when the text is no time.
-void stampTime(char *text, char *result, Status status) noexcept {
+Report stampTime(char *text, char *result) noexcept {
   if (cli::CLI_parseTimeText(cli::kTimeMode, text, nullptr, nullptr, nullptr) == 0) {
-    return status.raise(Sysfun::badTime);
+    return Sysfun::badTime;
   }
   char *out = writeToday(result);
   out = append(out, text, std::strlen(text));
   std::memcpy(out, kNoFraction, sizeof kNoFraction);
+  return {};
 }
 
 // A date at midnight; 04 when the text is no date, and also for a date
 // text longer than 10 bytes, which would not fit the 27-byte result.
-void stampDate(char *text, char *result, Status status) noexcept {
+Report stampDate(char *text, char *result) noexcept {
   std::int32_t y = 0, m = 0, d = 0;
-  if (cli::CLI_parseDatePart(text, &y, &m, &d) == 0) return status.raise(Sysfun::badDate);
+  if (cli::CLI_parseDatePart(text, &y, &m, &d) == 0) return Sysfun::badDate;
   const std::size_t length = std::strlen(text);
-  if (length > 10) return status.raise(Sysfun::badDate);
+  if (length > 10) return Sysfun::badDate;
   std::memcpy(append(result, text, length), kMidnight, sizeof kMidnight);
+  return {};
 }
 
 }  // namespace
 
-CLI_EXPORT void CLI_udfTIMESTAMPTIME(char *text, char *result, Ind, Ind, char *sqlstate, NameArg,
-                                     NameArg, char *message) noexcept {
-  stampTime(text, result, Status{sqlstate, message});
+namespace cli {
+
+Report routine::TIMESTAMPTIME(TextIn time, TextOut result) noexcept {
+  return stampTime(time.chars(), result.chars());
 }
 
-CLI_EXPORT void CLI_udfTIMESTAMPDATE(char *text, char *result, Ind, Ind, char *sqlstate, NameArg,
-                                     NameArg, char *message) noexcept {
-  stampDate(text, result, Status{sqlstate, message});
+Report routine::TIMESTAMPDATE(TextIn date, TextOut result) noexcept {
+  return stampDate(date.chars(), result.chars());
 }
 
-// By its form: longer than 10 bytes a timestamp, copied up to 26 bytes (a
-// longer fraction is cut); otherwise a date when it holds a hyphen, a time
-// when it has 8 bytes, and nothing that is taken else.
-CLI_EXPORT void CLI_udfTIMESTAMP(char *text, char *result, Ind, Ind, char *sqlstate, NameArg,
-                                 NameArg, char *message) noexcept {
-  const Status status{sqlstate, message};
-  const std::size_t length = cli::CLI_trimBlanks(text);
+// By its form: longer than 10 bytes a timestamp, copied up to the result's
+// 26 bytes (a longer fraction is cut); otherwise a date when it holds a
+// hyphen, a time when it has 8 bytes, and nothing that is taken else.
+Report routine::TIMESTAMP(TextIn value, TextOut result) noexcept {
+  char *text = value.chars();
+  const std::size_t length = CLI_trimBlanks(text);
   if (length > 10) {
     std::int32_t y = 0, m = 0, d = 0;
     char code[3];
-    if (cli::CLI_parseDateText(text, &y, &m, &d, nullptr, nullptr, nullptr, code) == 0) {
-      return status.raise(code);
+    if (CLI_parseDateText(text, &y, &m, &d, nullptr, nullptr, nullptr, code) == 0) {
+      return sysfunOf(code);
     }
-    const std::size_t kept = length < kStamp ? length : kStamp;
-    std::memcpy(result, text, kept);
-    std::memset(result + kept, 0, kStamp + 1 - kept);
-    return;
+    const std::size_t stamp = result.limit();
+    const std::size_t kept = length < stamp ? length : stamp;
+    std::memcpy(result.chars(), text, kept);
+    std::memset(result.chars() + kept, 0, stamp + 1 - kept);
+    return {};
   }
-  if (std::memchr(text, '-', length) != nullptr) return stampDate(text, result, status);
-  if (length == 8) return stampTime(text, result, status);
-  status.raise(Sysfun::badTimestamp);
+  if (std::memchr(text, '-', length) != nullptr) return stampDate(text, result.chars());
+  if (length == 8) return stampTime(text, result.chars());
+  return Sysfun::badTimestamp;
 }
+
+}  // namespace cli

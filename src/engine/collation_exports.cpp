@@ -6,24 +6,27 @@
 
 #include "engine/services.h"
 #include "frame/frame.hpp"
+#include "routines.hpp"
 
-using cli::Ind;
-using cli::NameArg;
+namespace cli {
 
-CLI_EXPORT void CLI_udfCOLLATIONNAME(const unsigned char *identifier, char *result,
-                                     const std::int16_t *inputNull, Ind resultNull, char *, NameArg,
-                                     NameArg, char *) noexcept {
-  constexpr std::uint32_t kArea = 129;
-  if (*inputNull >= 0) {
+Report routine::COLLATIONNAME(Nullable<BytesIn> collation_id, TextOut result,
+                              ResultIndicator result_null) noexcept {
+  // The service is given the whole area, the terminator's byte included.
+  const auto area = static_cast<std::uint32_t>(result.limit() + 1);
+  if (!collation_id.null()) {
     unsigned char copy[8];
-    std::memcpy(copy, identifier, sizeof copy);
-    const std::int32_t length = sqlnlsCollIDMapIDToName(result, kArea, copy, 0);
-    if (length > 0 && length < static_cast<std::int32_t>(kArea)) {
-      result[length] = '\0';
-      *resultNull = 0;
-      return;
+    std::memcpy(copy, collation_id.value.data(), sizeof copy);
+    const std::int32_t length = sqlnlsCollIDMapIDToName(result.chars(), area, copy, 0);
+    if (length > 0 && length < static_cast<std::int32_t>(area)) {
+      result.finish(static_cast<std::size_t>(length));
+      result_null.set(0);
+      return {};
     }
   }
-  std::memcpy(result, "INVALID", sizeof "INVALID");
-  *resultNull = 0;
+  std::memcpy(result.chars(), "INVALID", sizeof "INVALID");
+  result_null.set(0);
+  return {};
 }
+
+}  // namespace cli

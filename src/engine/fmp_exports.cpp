@@ -6,15 +6,14 @@
 // gives the table back.  The table is the engine's: the routine neither
 // allocates nor frees it.
 #include <cstdint>
-#include <cstdio>
 #include <cstring>
 
 #include "frame/frame.hpp"
+#include "routines.hpp"
 
 namespace {
 
-using cli::Ind;
-using cli::NameArg;
+using cli::Report;
 
 // The scratchpad's data: row count, table pointer, next row index.
 struct Scratch {
@@ -22,24 +21,6 @@ struct Scratch {
   const unsigned char *table;
   std::int32_t next;
 };
-
-Scratch load(const unsigned char *scratchpad) {
-  Scratch s;
-  std::memcpy(&s, scratchpad + CLI_SCRATCHPAD_DATA_OFFSET, sizeof s);
-  return s;
-}
-
-void save(unsigned char *scratchpad, const Scratch &s) {
-  std::memcpy(scratchpad + CLI_SCRATCHPAD_DATA_OFFSET, &s, sizeof s);
-}
-
-void storeState(char *sqlstate, const char *state) { std::memcpy(sqlstate, state, 6); }
-
-void callFailed(char *sqlstate, char *message, const char *state, std::int32_t status) {
-  storeState(sqlstate, state);
-  static_cast<void>(std::snprintf(message, CLI_MESSAGE_SIZE, CLI_MESSAGE_API_CALL_FAILED,
-                                  static_cast<int>(status)));
-}
 
 // A request record: 64-bit slots, the first pointing at the request code.
 using Slot = std::uint64_t;
@@ -49,32 +30,36 @@ Slot slotOf(T *pointer) {
   return reinterpret_cast<std::uintptr_t>(pointer);
 }
 
+// The request codes, and the bytes of one row of each table.
+enum Request : std::int32_t { kClose = 1, kOpenRows = 2, kOpenThreads = 3 };
+constexpr std::size_t kThreadRow = 28, kRowsRow = 16;
 constexpr std::int32_t kNoTable = -3;  // FmpThreads: an empty table, not a failure
+
+// The table pointer that the callback left in a request's last slot.
+const unsigned char *tableIn(const Slot &slot) {
+  const unsigned char *table = nullptr;
+  std::memcpy(&table, &slot, sizeof table);
+  return table;
+}
 
 // Close, both: give the table back if one is held; clear it whatever the
 // callback says.
-void close(unsigned char *scratchpad, CLI_tableCallback callback, char *sqlstate, char *message) {
-  Scratch s = load(scratchpad);
-  if (s.table == nullptr) return;
-  std::int32_t code = 1;
+Report close(Scratch &s, CLI_tableCallback callback) {
+  if (s.table == nullptr) return {};
+  std::int32_t code = kClose;
   Slot request[2] = {slotOf(&code), reinterpret_cast<std::uintptr_t>(s.table)};
   const std::int32_t status = callback(2, request);
-  if (status != 0) callFailed(sqlstate, message, CLI_SQLSTATE_CLOSE_CALLBACK_FAILED, status);
   s.table = nullptr;
-  save(scratchpad, s);
+  if (status != 0) return Report::of(Report::Kind::closeCallbackFailed, status);
+  return {};
 }
 
-// Fetch, both: the row at the next index, or "02000".  The index rises on
-// every fetch; no row is read through a null table.
-const unsigned char *nextRow(unsigned char *scratchpad, std::size_t rowSize, char *sqlstate) {
-  Scratch s = load(scratchpad);
+// Fetch, both: the row at the next index, or null at the end of the table.
+// The index rises on every fetch; no row is read through a null table.
+const unsigned char *nextRow(Scratch &s, std::size_t rowSize) {
   const std::int32_t index = s.next;
   s.next = static_cast<std::int32_t>(static_cast<std::uint32_t>(index) + 1u);
-  save(scratchpad, s);
-  if (index >= s.count || index < 0 || s.table == nullptr) {
-    storeState(sqlstate, CLI_SQLSTATE_NO_MORE_ROWS);
-    return nullptr;
-  }
+  if (index >= s.count || index < 0 || s.table == nullptr) return nullptr;
   return s.table + static_cast<std::size_t>(index) * rowSize;
 }
 
@@ -85,88 +70,67 @@ T field(const unsigned char *row, std::size_t offset) {
   return v;
 }
 
+constexpr Report kEndOfTable = Report::of(Report::Kind::endOfTable);
+
 }  // namespace
 
-CLI_EXPORT void CLI_udfFmpThreads(const std::int32_t *selector, std::int32_t *r1, std::int32_t *r2,
-                                  std::int32_t *r3, std::int32_t *r4, std::int32_t *r5,
-                                  std::int32_t *r6, Ind, Ind n1, Ind n2, Ind n3, Ind n4, Ind n5,
-                                  Ind n6, char *sqlstate, NameArg, NameArg, char *message,
-                                  unsigned char *scratchpad, const std::int32_t *callType,
-                                  CLI_tableCallback callback) noexcept {
-  switch (*callType) {
-    case CLI_CALL_OPEN: {
-      Scratch s = load(scratchpad);
-      s.table = nullptr;
-      save(scratchpad, s);
-      std::int32_t code = 3, input = *selector, count = 0;
-      Slot request[4] = {slotOf(&code), slotOf(&input), slotOf(&count), 0};
-      const std::int32_t status = callback(4, request);
-      if (status == kNoTable) {
-        count = 0;
-      } else if (status != 0) {
-        callFailed(sqlstate, message, CLI_SQLSTATE_OPEN_CALLBACK_FAILED, status);
-      }
-      s.count = count;
-      std::memcpy(&s.table, &request[3], sizeof s.table);  // the slot holds the pointer
-      s.next = 0;
-      save(scratchpad, s);
-      return;
+namespace cli {
+
+// Rows of six 32-bit numbers, from byte 4 of each 28-byte record.
+Report routine::FmpThreads(std::int32_t selector, Row row, Scratchpad scratchpad,
+                           CallType call_type, CLI_tableCallback callback) noexcept {
+  const auto open = [&](Scratch &s) -> Report {
+    s.table = nullptr;
+    std::int32_t code = kOpenThreads, input = selector, count = 0;
+    Slot request[4] = {slotOf(&code), slotOf(&input), slotOf(&count), 0};
+    const std::int32_t status = callback(4, request);
+    s.count = status == kNoTable ? 0 : count;
+    s.table = tableIn(request[3]);
+    s.next = 0;
+    if (status != 0 && status != kNoTable) {
+      return Report::of(Report::Kind::openCallbackFailed, status);
     }
-    case CLI_CALL_FETCH: {
-      const unsigned char *row = nextRow(scratchpad, 28, sqlstate);
-      if (row == nullptr) return;
-      std::int32_t *results[] = {r1, r2, r3, r4, r5, r6};
-      Ind indicators[] = {n1, n2, n3, n4, n5, n6};
-      for (std::size_t i = 0; i < 6; ++i) {
-        *results[i] = field<std::int32_t>(row, 4 + 4 * i);
-        *indicators[i] = 0;
-      }
-      return;
-    }
-    case CLI_CALL_CLOSE:
-      return close(scratchpad, callback, sqlstate, message);
-    default:
-      return;
-  }
+    return {};
+  };
+  const auto fetch = [&](Scratch &s) -> Report {
+    const unsigned char *record = nextRow(s, kThreadRow);
+    if (record == nullptr) return kEndOfTable;
+    for (std::size_t i = 0; i < 6; ++i) row.put(i, field<std::int32_t>(record, 4 + 4 * i));
+    return {};
+  };
+  return tableStep<Scratch>(call_type, scratchpad, open, fetch,
+                            [&](Scratch &s) { return close(s, callback); });
 }
 
-CLI_EXPORT void CLI_udfFmpRows(std::int32_t *r1, std::int32_t *r2, std::int16_t *r3,
-                               std::int16_t *r4, std::int16_t *r5, std::int16_t *r6, Ind n1, Ind n2,
-                               Ind n3, Ind n4, Ind n5, Ind n6, char *sqlstate, NameArg, NameArg,
-                               char *message, unsigned char *scratchpad,
-                               const std::int32_t *callType, CLI_tableCallback callback) noexcept {
-  switch (*callType) {
-    case CLI_CALL_OPEN: {
-      Scratch s = load(scratchpad);
-      s.table = nullptr;
-      save(scratchpad, s);
-      std::int32_t code = 2, count = 0;
-      Slot request[3] = {slotOf(&code), slotOf(&count), 0};
-      const std::int32_t status = callback(3, request);
-      if (status != 0) {
-        return callFailed(sqlstate, message, CLI_SQLSTATE_OPEN_CALLBACK_FAILED, status);
-      }
-      s.count = count;
-      std::memcpy(&s.table, &request[2], sizeof s.table);
-      s.next = 0;
-      save(scratchpad, s);
-      return;
-    }
-    case CLI_CALL_FETCH: {
-      const unsigned char *row = nextRow(scratchpad, 16, sqlstate);
-      if (row == nullptr) return;
-      *r1 = field<std::int32_t>(row, 0);
-      *r2 = field<std::int32_t>(row, 4);
-      *r3 = field<std::int16_t>(row, 8);
-      *r4 = field<std::int16_t>(row, 10);
-      *r5 = row[12];  // unsigned bytes, widened with zeros
-      *r6 = row[13];
-      *n1 = *n2 = *n3 = *n4 = *n5 = *n6 = 0;
-      return;
-    }
-    case CLI_CALL_CLOSE:
-      return close(scratchpad, callback, sqlstate, message);
-    default:
-      return;
-  }
+// Rows of two 32-bit numbers, two 16-bit ones and two unsigned bytes,
+// widened with zeros, from each 16-byte record.  A failed open leaves the
+// count and the next index as they were.
+Report routine::FmpRows(Row row, Scratchpad scratchpad, CallType call_type,
+                        CLI_tableCallback callback) noexcept {
+  const auto open = [&](Scratch &s) -> Report {
+    s.table = nullptr;
+    std::int32_t code = kOpenRows, count = 0;
+    Slot request[3] = {slotOf(&code), slotOf(&count), 0};
+    const std::int32_t status = callback(3, request);
+    if (status != 0) return Report::of(Report::Kind::openCallbackFailed, status);
+    s.count = count;
+    s.table = tableIn(request[2]);
+    s.next = 0;
+    return {};
+  };
+  const auto fetch = [&](Scratch &s) -> Report {
+    const unsigned char *record = nextRow(s, kRowsRow);
+    if (record == nullptr) return kEndOfTable;
+    row.put(0, field<std::int32_t>(record, 0));
+    row.put(1, field<std::int32_t>(record, 4));
+    row.put(2, field<std::int16_t>(record, 8));
+    row.put(3, field<std::int16_t>(record, 10));
+    row.put(4, std::int16_t{record[12]});
+    row.put(5, std::int16_t{record[13]});
+    return {};
+  };
+  return tableStep<Scratch>(call_type, scratchpad, open, fetch,
+                            [&](Scratch &s) { return close(s, callback); });
 }
+
+}  // namespace cli

@@ -15,11 +15,12 @@
 
 #include "engine/services.h"
 #include "frame/frame.hpp"
+#include "routines.hpp"
 
 namespace {
 
-using cli::Ind;
-using cli::NameArg;
+using cli::Report;
+using cli::Row;
 
 using cli::platform::kPathSeparator;
 
@@ -28,7 +29,6 @@ constexpr std::uint32_t kTextRoom = 8, kDataRoom = 264;
 // What the log line carries as the status when a statement is refused
 // because the file ends before it would: no block was asked for.
 constexpr std::int32_t kRefusedStatus = -1;
-constexpr std::size_t kColumns = 18;
 constexpr const char *kModule = "cliudf";
 
 // The scratchpad's data.
@@ -40,15 +40,10 @@ struct Scratch {
   unsigned char *block;
 };
 
-// The result columns of one call, and their indicators.
-struct Row {
-  std::int32_t *number[16];
-  char *text;
-  CLI_udfLob *statement;
-  Ind indicator[kColumns];
-};
+// The columns past the sixteen numbers: the section text and the statement.
+constexpr std::size_t kSectionColumn = 16, kStatementColumn = 17;
 
-void endTable(char *sqlstate) { std::memcpy(sqlstate, CLI_SQLSTATE_NO_MORE_ROWS, 6); }
+constexpr Report kEndOfTable = Report::of(Report::Kind::endOfTable);
 
 // The snapshot name, at the end of a chain of pointers that starts in the
 // process's static data; null where a link is missing.
@@ -64,22 +59,23 @@ const char *snapshotName(const void *staticData) {
   return r == nullptr ? nullptr : reinterpret_cast<const char *>(r + 26408);
 }
 
-void open(Scratch &s, const void *staticData, char *sqlstate) {
+Report open(Scratch &s, const void *staticData) {
   s.block = nullptr;
   s.capacity = 0;
   s.closed = 1;
   char instance[264] = {};
-  if (sqleinstancepath(0, instance) != 0) return endTable(sqlstate);
+  if (sqleinstancepath(0, instance) != 0) return kEndOfTable;
   const char *name = snapshotName(staticData);
   char path[256];
   const int n = name == nullptr ? -1
                                 : std::snprintf(path, sizeof path, "%s%s%s%s%s.%s", instance,
                                                 kPathSeparator, "tmp", kPathSeparator, name, "sql");
   // A path that does not fit its area is a file that cannot be opened.
-  if (n < 0 || static_cast<std::size_t>(n) >= sizeof path) return;
+  if (n < 0 || static_cast<std::size_t>(n) >= sizeof path) return {};
   sqlm_filter_file_name(path);
-  if (sqloopenp(path, 20, 1024, &s.file, 0) != 0) return;
+  if (sqloopenp(path, 20, 1024, &s.file, 0) != 0) return {};
   s.closed = 0;
+  return {};
 }
 
 // Reads n bytes on from where the file stands; false on a short read.  The
@@ -185,8 +181,7 @@ bool fill(const unsigned char *at, const sqlm_header_info &h, const Row &row) {
       std::memcpy(&wide, data, 8);
       v = static_cast<std::int32_t>(static_cast<std::uint32_t>(static_cast<std::uint64_t>(wide)));
     }
-    *row.number[d.column] = v;
-    *row.indicator[d.column] = 0;
+    row.put(d.column, v);
     return true;
   }
   static constexpr struct {
@@ -198,31 +193,30 @@ bool fill(const unsigned char *at, const sqlm_header_info &h, const Row &row) {
     const auto *parent = reinterpret_cast<const sqlm_header_info *>(at);
     std::int32_t first = 0, second = 0;
     if (!childValue(parent, 300, first) || !childValue(parent, 301, second)) return false;
-    *row.number[p.column] = first;
-    *row.number[p.column + 1] = second;
-    *row.indicator[p.column] = 0;
-    *row.indicator[p.column + 1] = 0;
+    row.put(p.column, first);
+    row.put(p.column + 1u, second);
     return true;
   }
   if (h.element == 312) {
     // The data and a NUL behind it must fit the statement column's area.
-    if (h.size >= cli::kLobLimit) return false;
-    cli::Lob::finish(row.statement, h.size);
-    std::memcpy(cli::Lob::area(row.statement), data, h.size);
-    cli::Lob::area(row.statement)[h.size] = 0;
-    *row.indicator[17] = 0;
+    const cli::LobOut statement = row.lob(kStatementColumn);
+    if (h.size >= statement.limit()) return false;
+    statement.finish(h.size);
+    std::memcpy(statement.area(), data, h.size);
+    statement.area()[h.size] = 0;
+    row.filled(kStatementColumn);
   }
   return true;
 }
 
-void fetch(Scratch &s, const Row &row, char *sqlstate) {
-  if (s.closed != 0) return endTable(sqlstate);
+Report fetch(Scratch &s, const Row &row) {
+  if (s.closed != 0) return kEndOfTable;
   sqlm_header_info h{};
-  if (!readHeader(s, h)) return endTable(sqlstate);
+  if (!readHeader(s, h)) return kEndOfTable;
   if (h.element == kSection) {
-    if (!scanSection(s, h)) return endTable(sqlstate);
+    if (!scanSection(s, h)) return kEndOfTable;
   } else if (h.element != kStatement) {
-    return endTable(sqlstate);
+    return kEndOfTable;
   }
   // One block serves every statement; it is replaced only by a larger one.
   if (s.capacity < h.size) {
@@ -242,75 +236,52 @@ void fetch(Scratch &s, const Row &row, char *sqlstate) {
       case Room::tooLittle:
         break;
       case Room::lost:  // the file position could not be put back
-        return endTable(sqlstate);
+        return kEndOfTable;
     }
     if (status != 0) {
-      endTable(sqlstate);
       sqlt_logerr_data("SQLCACHE_SNAPSHOT: unable to allocate temporary sqlcache stmt", &status, 4,
                        3);
-      return;
+      return kEndOfTable;
     }
     s.block = static_cast<unsigned char *>(block);
     s.capacity = h.size;
   }
-  if (!readBytes(s, s.block, h.size)) return endTable(sqlstate);
+  if (!readBytes(s, s.block, h.size)) return kEndOfTable;
   std::int64_t left = h.size;
   for (const unsigned char *at = s.block; left > 0;) {
     sqlm_header_info inner;
-    if (left < 8) return endTable(sqlstate);
+    if (left < 8) return kEndOfTable;
     std::memcpy(&inner, at, sizeof inner);
     const std::int64_t whole = std::int64_t{inner.size} + 8;
-    if (whole > left || !fill(at, inner, row)) return endTable(sqlstate);
+    if (whole > left || !fill(at, inner, row)) return kEndOfTable;
     at += whole;
     left -= whole;
   }
-  std::memcpy(row.text, s.sectionText, sizeof s.sectionText);
+  std::memcpy(row.chars(kSectionColumn), s.sectionText, sizeof s.sectionText);
+  return {};
 }
 
-void close(Scratch &s) {
-  if (s.closed != 0) return;
+Report close(Scratch &s) {
+  if (s.closed != 0) return {};
   sqloclose(s.file);
   if (s.capacity > 0) sqlofmblkEx(kModule, __LINE__, s.block);
   s.block = nullptr;
   s.capacity = 0;
   s.closed = 1;
+  return {};
 }
 
 }  // namespace
 
-// N = 0, M = 18: 18 results, 18 result indicators, the status buffers,
-// the scratchpad and the call type.  The results are written through Row.
-// NOLINTBEGIN(readability-non-const-parameter)
-CLI_EXPORT void SQLCACHE_SNAPSHOT(
-    std::int32_t *c1, std::int32_t *c2, std::int32_t *c3, std::int32_t *c4, std::int32_t *c5,
-    std::int32_t *c6, std::int32_t *c7, std::int32_t *c8, std::int32_t *c9, std::int32_t *c10,
-    std::int32_t *c11, std::int32_t *c12, std::int32_t *c13, std::int32_t *c14, std::int32_t *c15,
-    std::int32_t *c16, char *c17, CLI_udfLob *c18, Ind n1, Ind n2, Ind n3, Ind n4, Ind n5, Ind n6,
-    Ind n7, Ind n8, Ind n9, Ind n10, Ind n11, Ind n12, Ind n13, Ind n14, Ind n15, Ind n16, Ind n17,
-    Ind n18, char *sqlstate, NameArg, NameArg, char *, unsigned char *scratchpad,
-    const std::int32_t *callType) noexcept {
-  const void *staticData = sqlo_get_static_data();  // called on every entry; used on open only
-  Scratch s;
-  std::memcpy(&s, scratchpad + CLI_SCRATCHPAD_DATA_OFFSET, sizeof s);
-  switch (*callType) {
-    case CLI_CALL_OPEN:
-      open(s, staticData, sqlstate);
-      break;
-    case CLI_CALL_FETCH: {
-      const Row row{
-          {c1, c2, c3, c4, c5, c6, c7, c8, c9, c10, c11, c12, c13, c14, c15, c16},
-          c17,
-          c18,
-          {n1, n2, n3, n4, n5, n6, n7, n8, n9, n10, n11, n12, n13, n14, n15, n16, n17, n18}};
-      fetch(s, row, sqlstate);
-      break;
-    }
-    case CLI_CALL_CLOSE:
-      close(s);
-      break;
-    default:
-      return;
-  }
-  std::memcpy(scratchpad + CLI_SCRATCHPAD_DATA_OFFSET, &s, sizeof s);
+namespace cli {
+
+// The engine's static data is asked for on every call, whatever its type,
+// and used on open only.
+Report routine::SQLCACHE_SNAPSHOT(Row row, Scratchpad scratchpad, CallType call_type) noexcept {
+  const void *staticData = sqlo_get_static_data();
+  return tableStep<Scratch>(
+      call_type, scratchpad, [&](Scratch &s) { return open(s, staticData); },
+      [&](Scratch &s) { return fetch(s, row); }, [&](Scratch &s) { return close(s); });
 }
-// NOLINTEND(readability-non-const-parameter)
+
+}  // namespace cli

@@ -12,15 +12,18 @@
 #include <cstring>
 #include <initializer_list>
 
+#include "engine/conversion.hpp"
 #include "engine/services.h"
-#include "frame/conversion.hpp"
 #include "frame/frame.hpp"
+#include "routines.hpp"
 
 namespace {
 
-using cli::Ind;
-using cli::Lob;
-using cli::NameArg;
+using cli::LobIn;
+using cli::LobOut;
+using cli::Nullable;
+using cli::Report;
+using cli::ResultIndicator;
 
 constexpr std::size_t kHead = 22;
 
@@ -106,56 +109,54 @@ void writeLength(unsigned char *p, std::size_t width, std::uint32_t value, bool 
   for (std::size_t i = 0; i < width; ++i) p[i] = b[swap ? width - 1 - i : i];
 }
 
-// The status of this routine: five SQLSTATE characters and "sqlocpcv",
-// neither terminated.
-void report(char *sqlstate, char *message, const char *state) {
-  std::memcpy(sqlstate, state, 5);
-  std::memcpy(message, CLI_MESSAGE_SQLOCPCV, 8);  // NOLINT(bugprone-not-null-terminated-result)
-}
+// The statuses of this routine, each with the message "sqlocpcv".
+constexpr Report kResultTooSmall = Report::of(Report::Kind::resultTooSmall);
+constexpr Report kConversionFailed = Report::of(Report::Kind::conversionFailed);
+constexpr Report kUnknownLengthForm = Report::of(Report::Kind::unknownLengthForm);
 
-template <std::uint32_t Capacity>
-void copyObject(const CLI_udfLob *object, std::int32_t from, std::int32_t to,
-                std::int32_t byteOrder, CLI_udfLob *result, const std::int16_t *objectNull,
-                std::int16_t *resultNull, char *sqlstate, char *message) noexcept {
-  if (*objectNull < 0) {
-    *resultNull = *objectNull;
-    return;
+// The copy into a result of `out.limit()` bytes.  On a NULL object the
+// result is NULL too; on success the result indicator is 1.
+Report copyObject(Nullable<LobIn> object, std::int32_t from, std::int32_t to,
+                  std::int32_t byteOrder, LobOut result, ResultIndicator resultNull) noexcept {
+  if (object.null()) {
+    resultNull.set(object.indicator);
+    return {};
   }
+  const std::size_t capacity = result.limit();
   const bool swap = byteOrder != machineByteOrder();
   const std::int32_t factor = expansionFactor(from, to);
-  const cli::Bytes in = Lob::read(object);
-  unsigned char *out = Lob::area(result);
+  const cli::Bytes in = object.value.bytes();
+  unsigned char *out = result.area();
   std::size_t end = 0;  // the end of the last converted string in the result
   if (in.size >= kHead + 1) {
     std::size_t t = kHead, u = kHead;
     for (;;) {
-      if (u + 26 > Capacity) return report(sqlstate, message, CLI_SQLSTATE_RESULT_TOO_SMALL);
+      if (u + 26 > capacity) return kResultTooSmall;
       const unsigned char tag = in.data[t];
       const std::size_t width = widthOfTag(tag);
-      if (width == 0) return report(sqlstate, message, CLI_SQLSTATE_UNKNOWN_LENGTH_FORM);
+      if (width == 0) return kUnknownLengthForm;
       // A length field or string past the end of the object is no record.
-      if (t + 1 + width > in.size)
-        return report(sqlstate, message, CLI_SQLSTATE_UNKNOWN_LENGTH_FORM);
+      if (t + 1 + width > in.size) return kUnknownLengthForm;
       std::memcpy(out + u - kHead, in.data + t - kHead, kHead + 1);
       const std::uint32_t n = readLength(in.data + t + 1, width, swap);
       const std::size_t source = t + 1 + width;
-      if (n > in.size - source) return report(sqlstate, message, CLI_SQLSTATE_UNKNOWN_LENGTH_FORM);
+      if (n > in.size - source) return kUnknownLengthForm;
       const std::size_t v = u + 1 + width;
       // The room test as the contract gives it: n times the factor in
       // floating point, with 0.5 added, truncated.
       const double scaled = static_cast<double>(n) * factor + 0.5;
       const auto room = static_cast<std::uint64_t>(scaled);
-      if (v + room >= Capacity) return report(sqlstate, message, CLI_SQLSTATE_RESULT_TOO_SMALL);
+      if (v + room >= capacity) return kResultTooSmall;
       // The object's size is the space, but never more than the result holds.
       const auto space =
-          static_cast<std::uint32_t>(in.size < Capacity - v ? in.size : Capacity - v);
+          static_cast<std::uint32_t>(in.size < capacity - v ? in.size : capacity - v);
       const cli::Converted c =
           cli::CLI_convertCodePage(in.data + source, n, static_cast<std::uint32_t>(from),
                                    static_cast<std::uint32_t>(to), out + v, space);
-      if (c.status < 0) return report(sqlstate, message, CLI_SQLSTATE_CONVERSION_FAILED);
+      if (c.status < 0) return kConversionFailed;
       // The new length must fit the width of its field.
       if (c.length > space || (width < 4 && c.length >= (1u << (8 * width)))) {
-        return report(sqlstate, message, CLI_SQLSTATE_RESULT_TOO_SMALL);
+        return kResultTooSmall;
       }
       writeLength(out + u + 1, width, c.length, swap);
       end = v + c.length;
@@ -164,20 +165,29 @@ void copyObject(const CLI_udfLob *object, std::int32_t from, std::int32_t to,
       if (t + 1 > in.size) break;
     }
   }
-  Lob::finish(result, end);
-  *resultNull = 1;
+  result.finish(end);
+  resultNull.set(1);
+  return {};
 }
 
 }  // namespace
 
-#define CLI_VEBLOB_EXPORT(symbol, capacity)                                                        \
-  CLI_EXPORT void symbol(                                                                          \
-      const CLI_udfLob *object, const std::int32_t *from, const std::int32_t *to,                  \
-      const std::int32_t *byteOrder, CLI_udfLob *result, const std::int16_t *objectNull, Ind, Ind, \
-      Ind, std::int16_t *resultNull, char *sqlstate, NameArg, NameArg, char *message) noexcept {   \
-    copyObject<capacity>(object, *from, *to, *byteOrder, result, objectNull, resultNull, sqlstate, \
-                         message);                                                                 \
-  }
+namespace cli {
 
-CLI_VEBLOB_EXPORT(CLI_udfVEBLOB_CP_LARGE, 1000000)
-CLI_VEBLOB_EXPORT(CLI_udfVEBLOB_CP_SMALL, 500000)
+Report routine::VEBLOB_CP_LARGE(Nullable<LobIn> object, Nullable<std::int32_t> source_code_page,
+                                Nullable<std::int32_t> target_code_page,
+                                Nullable<std::int32_t> byte_order, LobOut result,
+                                ResultIndicator result_null) noexcept {
+  return copyObject(object, source_code_page.value, target_code_page.value, byte_order.value,
+                    result, result_null);
+}
+
+Report routine::VEBLOB_CP_SMALL(Nullable<LobIn> object, Nullable<std::int32_t> source_code_page,
+                                Nullable<std::int32_t> target_code_page,
+                                Nullable<std::int32_t> byte_order, LobOut result,
+                                ResultIndicator result_null) noexcept {
+  return copyObject(object, source_code_page.value, target_code_page.value, byte_order.value,
+                    result, result_null);
+}
+
+}  // namespace cli

@@ -86,17 +86,24 @@ typedef int32_t (*CLI_tableCallback)(int32_t slotCount, void *request);
 #define CLI_MESSAGE_API_CALL_FAILED "API call failed %d"
 #define CLI_MESSAGE_SQLOCPCV "sqlocpcv"
 
-/* The two-digit codes that follow "SYSFUN:".  There is no 09. */
-#define CLI_SYSFUN_OUT_OF_RANGE "01"     /* argument outside what is accepted */
-#define CLI_SYSFUN_DIVISION_BY_ZERO "02" /* division by zero */
-#define CLI_SYSFUN_OVERFLOW "03"         /* result not representable */
-#define CLI_SYSFUN_BAD_DATE "04"         /* date, or date part, not valid */
-#define CLI_SYSFUN_BAD_TIME "05"         /* time text not valid */
-#define CLI_SYSFUN_BAD_TIMESTAMP "06"    /* time part of a timestamp, or form */
-#define CLI_SYSFUN_BAD_DURATION "07"     /* character not allowed in duration */
-#define CLI_SYSFUN_BAD_INTERVAL "08"     /* unknown interval code */
-#define CLI_SYSFUN_TOO_LONG "10"         /* a length rule is broken */
-#define CLI_SYSFUN_NOT_A_NUMBER "11"     /* text is not a number */
+/*
+ * The SYSFUN codes that follow "SYSFUN:", one entry each: the number, a
+ * name, the two characters and the condition in words.  The library, the
+ * hosts' messages and the function reference are all made from this one
+ * table.  There is no 09, and nothing stands above 11.
+ */
+#define CLI_SYSFUN_CODES(X)                                                          \
+  X(1, outOfRange, "01", "an argument lies outside what the function accepts")       \
+  X(2, divisionByZero, "02", "division by zero")                                     \
+  X(3, overflow, "03", "the result cannot be represented")                           \
+  X(4, badDate, "04", "the date is not valid")                                       \
+  X(5, badTime, "05", "the time is not valid")                                       \
+  X(6, badTimestamp, "06",                                                           \
+    "the time of the timestamp is not valid, or the text has no form that is taken") \
+  X(7, badDuration, "07", "the duration holds a character that is not allowed")      \
+  X(8, badInterval, "08", "the interval code is not a known one")                    \
+  X(10, tooLong, "10", "a string would be longer than the function allows")          \
+  X(11, notANumber, "11", "the text is not a number")
 
 /*
  * Reports SYSFUN error `code` (two characters): "38552" with its terminator

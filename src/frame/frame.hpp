@@ -1,9 +1,11 @@
 // Typed views of the routine frame, for the library's own C++ code.
 //
-// An export shim receives raw pointers in the frame's order; these views
-// give names to what the pointers hold (terminated text, CLI_udfLob, the
-// status channel) so that routine logic works on plain byte ranges and
-// never on frame positions.
+// An export's shim receives raw pointers in the frame's order and hands
+// its routine these views instead: inputs and results in their layouts,
+// the result indicator of a routine that handles NULL, the database
+// information block, the scratchpad, the call type and a table's row.  The
+// routine works on byte ranges and values and never on frame positions;
+// it gives back a Report or an Answer (status.hpp), which the shim stores.
 #pragma once
 
 #include <cstddef>
@@ -12,50 +14,14 @@
 
 #include "cliudf.h"
 #include "platform.hpp"
+#include "status.hpp"
 
 namespace cli {
 
 using Byte = unsigned char;
-// A null indicator argument; routines without null handling never touch it.
-using Ind = std::int16_t *;
-// The function name and specific name arguments, which no routine reads.
-using NameArg = const char *;
 
 inline constexpr std::size_t kTextLimit = CLI_TEXT_LIMIT;
 inline constexpr std::size_t kLobLimit = CLI_LOB_LIMIT;
-
-// The SYSFUN error codes, by number.
-enum class Sysfun : std::uint8_t {
-  outOfRange = 1,
-  divisionByZero = 2,
-  overflow = 3,
-  badDate = 4,
-  badTime = 5,
-  badTimestamp = 6,
-  badDuration = 7,
-  badInterval = 8,
-  tooLong = 10,
-  notANumber = 11,
-};
-
-// The status channel of one call: the SQLSTATE and message buffers.
-class Status {
- public:
-  Status(char *sqlstate, char *message) noexcept : sqlstate_(sqlstate), message_(message) {}
-
-  // Raises a SYSFUN error given as its two-digit text.
-  void raise(const char *code) const noexcept { CLI_raiseSysfun(sqlstate_, message_, code); }
-
-  void raise(Sysfun code) const noexcept {
-    const auto n = static_cast<unsigned>(code);
-    const char text[3] = {static_cast<char>('0' + n / 10), static_cast<char>('0' + n % 10), '\0'};
-    raise(text);
-  }
-
- private:
-  char *sqlstate_;
-  char *message_;
-};
 
 // A read-only run of bytes, as routine logic sees a string of either layout.
 struct Bytes {
@@ -63,50 +29,213 @@ struct Bytes {
   std::size_t size;
 };
 
-// Terminated text: bytes up to the first NUL.  A result area holds the
-// routine's limit plus one byte for the terminator.
-struct Text {
-  using Value = char;
-
-  static Bytes read(const char *value) noexcept {
-    return {reinterpret_cast<const Byte *>(value), std::strlen(value)};
+// An input of terminated text: bytes up to the first NUL.  Input buffers
+// are writable, and the date routines cut trailing blanks in place.
+class TextIn {
+ public:
+  explicit TextIn(char *value) noexcept : value_(value) {}
+  [[nodiscard]] char *chars() const noexcept { return value_; }
+  [[nodiscard]] Bytes bytes() const noexcept {
+    return {reinterpret_cast<const Byte *>(value_), std::strlen(value_)};
   }
   // The first min(length, limit) bytes, without looking past `limit`.
-  static Bytes head(const char *value, std::size_t limit) noexcept {
-    return {reinterpret_cast<const Byte *>(value), ::strnlen(value, limit)};
+  [[nodiscard]] Bytes head(std::size_t limit) const noexcept {
+    return {reinterpret_cast<const Byte *>(value_), ::strnlen(value_, limit)};
   }
-  static Byte *area(char *result) noexcept { return reinterpret_cast<Byte *>(result); }
-  // Completes a result of `size` bytes.
-  static void finish(char *result, std::size_t size) noexcept { result[size] = '\0'; }
+
+ private:
+  char *value_;
 };
 
-// CLI_udfLob: a 32-bit length word, then the data.  Read through memcpy so
-// that the word may stand at any address.
-struct Lob {
-  using Value = CLI_udfLob;
+// A CLI_udfLob: a 32-bit length word, then the data.  Read through memcpy
+// so that the word may stand at any address.
+inline std::uint32_t lengthWordOf(const void *value) noexcept {
+  std::uint32_t n;
+  std::memcpy(&n, value, sizeof n);
+  return n;
+}
 
-  static std::uint32_t lengthWord(const CLI_udfLob *value) noexcept {
-    std::uint32_t n;
-    std::memcpy(&n, value, sizeof n);
-    return n;
+class LobIn {
+ public:
+  explicit LobIn(const CLI_udfLob *value) noexcept : value_(value) {}
+  [[nodiscard]] Bytes bytes() const noexcept {
+    return {reinterpret_cast<const Byte *>(value_) + CLI_LOB_DATA_OFFSET, lengthWordOf(value_)};
   }
-  static Bytes read(const CLI_udfLob *value) noexcept {
-    return {reinterpret_cast<const Byte *>(value) + CLI_LOB_DATA_OFFSET, lengthWord(value)};
-  }
-  static Bytes head(const CLI_udfLob *value, std::size_t limit) noexcept {
-    const Bytes all = read(value);
+  [[nodiscard]] Bytes head(std::size_t limit) const noexcept {
+    const Bytes all = bytes();
     return {all.data, all.size < limit ? all.size : limit};
   }
-  // On entry a result's length word holds the capacity of its area.
-  static std::uint32_t capacity(const CLI_udfLob *result) noexcept { return lengthWord(result); }
-  static Byte *area(CLI_udfLob *result) noexcept {
-    return reinterpret_cast<Byte *>(result) + CLI_LOB_DATA_OFFSET;
-  }
-  // Stores the true length once the result is complete.
-  static void finish(CLI_udfLob *result, std::size_t size) noexcept {
-    const auto n = static_cast<std::uint32_t>(size);
-    std::memcpy(result, &n, sizeof n);
-  }
+
+ private:
+  const CLI_udfLob *value_;
 };
+
+// Fixed bytes: exactly the declared count, opaque.
+class BytesIn {
+ public:
+  explicit BytesIn(const Byte *value) noexcept : value_(value) {}
+  [[nodiscard]] const Byte *data() const noexcept { return value_; }
+
+ private:
+  const Byte *value_;
+};
+
+// A terminated-text result: room for `longest` bytes and the terminator.
+class TextOut {
+ public:
+  TextOut(char *area, std::uint32_t longest) noexcept : area_(area), longest_(longest) {}
+  [[nodiscard]] Byte *area() const noexcept { return reinterpret_cast<Byte *>(area_); }
+  [[nodiscard]] char *chars() const noexcept { return area_; }
+  // The longest text that the routine may build.
+  [[nodiscard]] std::size_t limit() const noexcept { return longest_; }
+  // Completes a result of `size` bytes.
+  void finish(std::size_t size) const noexcept { area_[size] = '\0'; }
+
+ private:
+  char *area_;
+  std::uint32_t longest_;
+};
+
+// A CLI_udfLob result.  `limit` is the longest string the routine builds;
+// on entry the length word holds the capacity that the engine gave.
+class LobOut {
+ public:
+  LobOut(CLI_udfLob *value, std::uint32_t limit) noexcept : value_(value), limit_(limit) {}
+  [[nodiscard]] Byte *area() const noexcept {
+    return reinterpret_cast<Byte *>(value_) + CLI_LOB_DATA_OFFSET;
+  }
+  [[nodiscard]] std::size_t limit() const noexcept { return limit_; }
+  [[nodiscard]] std::uint32_t capacity() const noexcept { return lengthWordOf(value_); }
+  // Stores the true length once the result is complete.
+  void finish(std::size_t size) const noexcept {
+    const auto n = static_cast<std::uint32_t>(size);
+    std::memcpy(value_, &n, sizeof n);
+  }
+
+ private:
+  CLI_udfLob *value_;
+  std::uint32_t limit_;
+};
+
+// Fixed text: exactly `size` bytes, filled up with blanks, no terminator.
+class FixedTextOut {
+ public:
+  FixedTextOut(char *area, std::uint32_t size) noexcept : area_(area), size_(size) {}
+  [[nodiscard]] char *chars() const noexcept { return area_; }
+  [[nodiscard]] std::size_t size() const noexcept { return size_; }
+
+ private:
+  char *area_;
+  std::uint32_t size_;
+};
+
+// An input of a routine that reads its null indicator itself.
+template <class T>
+struct Nullable {
+  T value;
+  std::int16_t indicator;
+  [[nodiscard]] bool null() const noexcept { return indicator < 0; }
+};
+
+// The result indicator of a routine that handles NULL itself.
+class ResultIndicator {
+ public:
+  explicit ResultIndicator(std::int16_t *indicator) noexcept : indicator_(indicator) {}
+  void set(std::int16_t value) const noexcept { *indicator_ = value; }
+
+ private:
+  std::int16_t *indicator_;
+};
+
+// The database information block, or null; one field of it is read.
+class DbInfo {
+ public:
+  explicit DbInfo(const Byte *block) noexcept : block_(block) {}
+  [[nodiscard]] bool present() const noexcept { return block_ != nullptr; }
+  [[nodiscard]] std::uint32_t codePage() const noexcept {
+    return lengthWordOf(block_ + CLI_DBINFO_CODEPAGE_OFFSET);
+  }
+
+ private:
+  const Byte *block_;
+};
+
+// The statement's scratchpad.  Its first word is the engine's; a routine's
+// data stands behind it and is read and written as one record.
+class Scratchpad {
+ public:
+  explicit Scratchpad(Byte *block) noexcept : block_(block) {}
+  template <class Data>
+  [[nodiscard]] Data load() const noexcept {
+    Data d;
+    std::memcpy(&d, block_ + CLI_SCRATCHPAD_DATA_OFFSET, sizeof d);
+    return d;
+  }
+  template <class Data>
+  void save(const Data &d) const noexcept {
+    std::memcpy(block_ + CLI_SCRATCHPAD_DATA_OFFSET, &d, sizeof d);
+  }
+
+ private:
+  Byte *block_;
+};
+
+// What a call of a table function asks for.
+enum class CallType : std::int32_t {
+  open = CLI_CALL_OPEN,
+  fetch = CLI_CALL_FETCH,
+  close = CLI_CALL_CLOSE,
+};
+
+// The result columns of a table function's row, with their indicators.
+// A column that a fetch fills gets the indicator 0.
+class Row {
+ public:
+  Row(void *const *values, std::int16_t *const *indicators, const std::uint32_t *sizes) noexcept
+      : values_(values), indicators_(indicators), sizes_(sizes) {}
+  template <class T>
+  void put(std::size_t column, T value) const noexcept {
+    std::memcpy(values_[column], &value, sizeof value);
+    filled(column);
+  }
+  [[nodiscard]] char *chars(std::size_t column) const noexcept {
+    return static_cast<char *>(values_[column]);
+  }
+  [[nodiscard]] LobOut lob(std::size_t column) const noexcept {
+    return {static_cast<CLI_udfLob *>(values_[column]), sizes_[column]};
+  }
+  void filled(std::size_t column) const noexcept { *indicators_[column] = 0; }
+
+ private:
+  void *const *values_;
+  std::int16_t *const *indicators_;
+  const std::uint32_t *sizes_;
+};
+
+// The life of a table function: one open, any number of fetches, one close.
+// Each step reads the routine's record from the scratchpad, works on it
+// and writes it back; any other call type returns at once, changing
+// nothing.
+template <class Data, class Open, class Fetch, class Close>
+Report tableStep(CallType type, Scratchpad scratchpad, Open open, Fetch fetch,
+                 Close close) noexcept {
+  Report report;
+  Data data = scratchpad.load<Data>();
+  switch (type) {
+    case CallType::open:
+      report = open(data);
+      break;
+    case CallType::fetch:
+      report = fetch(data);
+      break;
+    case CallType::close:
+      report = close(data);
+      break;
+    default:
+      return report;
+  }
+  scratchpad.save(data);
+  return report;
+}
 
 }  // namespace cli

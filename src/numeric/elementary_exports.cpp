@@ -86,17 +86,21 @@ Answer<double> radiansOf(double x) { return success((kPi * x) / 180.0); }
 
 }  // namespace
 
-CLI_NUMERIC_EXPORT1(CLI_udfSIN, double, double, sineOf)
-CLI_NUMERIC_EXPORT1(CLI_udfCOS, double, double, cosineOf)
-CLI_NUMERIC_EXPORT1(CLI_udfTAN, double, double, tangentOf)
-CLI_NUMERIC_EXPORT1(CLI_udfCOT, double, double, cotangentOf)
-CLI_NUMERIC_EXPORT1(CLI_udfASIN, double, double, arcSineOf)
-CLI_NUMERIC_EXPORT1(CLI_udfACOS, double, double, arcCosineOf)
-CLI_NUMERIC_EXPORT1(CLI_udfATAN, double, double, arcTangentOf)
-CLI_NUMERIC_EXPORT2(CLI_udfATAN2, double, double, double, arcTangentOfPair)
-CLI_NUMERIC_EXPORT1(CLI_udfLOG, double, double, logarithmOf)
-CLI_NUMERIC_EXPORT1(CLI_udfLOG10, double, double, decimalLogarithmOf)
-CLI_NUMERIC_EXPORT1(CLI_udfEXP, double, double, exponentialOf)
-CLI_NUMERIC_EXPORT1(CLI_udfSQRT, double, double, squareRootOf)
-CLI_NUMERIC_EXPORT1(CLI_udfDEGREES1, double, double, degreesOf)
-CLI_NUMERIC_EXPORT1(CLI_udfRADIANS1, double, double, radiansOf)
+namespace cli {
+
+Answer<double> routine::SIN(double x) noexcept { return sineOf(x); }
+Answer<double> routine::COS(double x) noexcept { return cosineOf(x); }
+Answer<double> routine::TAN(double x) noexcept { return tangentOf(x); }
+Answer<double> routine::COT(double x) noexcept { return cotangentOf(x); }
+Answer<double> routine::ASIN(double x) noexcept { return arcSineOf(x); }
+Answer<double> routine::ACOS(double x) noexcept { return arcCosineOf(x); }
+Answer<double> routine::ATAN(double x) noexcept { return arcTangentOf(x); }
+Answer<double> routine::ATAN2(double x, double y) noexcept { return arcTangentOfPair(x, y); }
+Answer<double> routine::LOG(double x) noexcept { return logarithmOf(x); }
+Answer<double> routine::LOG10(double x) noexcept { return decimalLogarithmOf(x); }
+Answer<double> routine::EXP(double x) noexcept { return exponentialOf(x); }
+Answer<double> routine::SQRT(double x) noexcept { return squareRootOf(x); }
+Answer<double> routine::DEGREES1(double x) noexcept { return degreesOf(x); }
+Answer<double> routine::RADIANS1(double x) noexcept { return radiansOf(x); }
+
+}  // namespace cli

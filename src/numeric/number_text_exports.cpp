@@ -6,12 +6,10 @@
 
 #include "engine/services.h"
 #include "frame/frame.hpp"
+#include "routines.hpp"
 
 namespace {
 
-using cli::Ind;
-using cli::NameArg;
-using cli::Status;
 using cli::Sysfun;
 
 // The white space that CHARTODOUBLE cuts from the end.
@@ -20,15 +18,14 @@ constexpr bool isTrailingSpace(char c) {
 }
 
 constexpr std::size_t kRaw = 22;  // sign, digit, point, 14 digits, E, sign, 3 digits
-constexpr std::size_t kShort = 24;
 
 // Which raw indexes the short form keeps: the bit 0x80000000 >> i for index i.
 constexpr std::uint32_t bitOf(std::size_t i) { return 0x80000000u >> i; }
 
 // Shortens raw number text: no plus signs, no leading exponent zeros (one
 // exponent digit stays), no trailing digit zeros (one stays behind the
-// point); 24 bytes filled up with blanks.
-void shorten(const char *raw, char *out) {
+// point); the fixed width filled up with blanks.
+void shorten(const char *raw, char *out, std::size_t width) {
   std::uint32_t mask = raw[18] == '+' ? 0xFFFFDC00u : 0xFFFFFC00u;
   for (std::size_t i = 19; i <= 20 && raw[i] == '0'; ++i) mask &= ~bitOf(i);
   if (raw[0] == '+') mask &= ~bitOf(0);
@@ -38,38 +35,45 @@ void shorten(const char *raw, char *out) {
     if ((mask & bitOf(i)) != 0) out[n++] = raw[i];
   }
   out[n++] = raw[21];
-  std::memset(out + n, ' ', kShort - n);
+  std::memset(out + n, ' ', width - n);
 }
 
 static_assert(kRaw + 1 == 23);
 
 }  // namespace
 
+namespace cli {
+
 // Cuts trailing white space in the caller's buffer, then asks the number
-// service; leading white space is the service's to judge.
-CLI_EXPORT void CLI_udfCHARTODOUBLE(char *text, double *result, Ind, Ind, char *sqlstate, NameArg,
-                                    NameArg, char *message) noexcept {
-  const std::size_t full = std::strlen(text);
+// service, which writes the result itself; leading white space is the
+// service's to judge.
+Report routine::CHARTODOUBLE(TextIn text, double *result) noexcept {
+  char *chars = text.chars();
+  const std::size_t full = std::strlen(chars);
   std::size_t n = full;
-  while (n > 0 && isTrailingSpace(text[n - 1])) --n;
-  if (n != full) text[n] = '\0';
-  if (sqlrxa2f(text, static_cast<std::uint32_t>(n), result, sizeof(double)) != 0) {
-    Status{sqlstate, message}.raise(Sysfun::notANumber);
+  while (n > 0 && isTrailingSpace(chars[n - 1])) --n;
+  if (n != full) chars[n] = '\0';
+  if (sqlrxa2f(chars, static_cast<std::uint32_t>(n), result, sizeof(double)) != 0) {
+    return Sysfun::notANumber;
   }
+  return {};
 }
 
 // Zero of either sign is 0E0; everything else, a NaN too, goes through the
 // formatting service with 15 significant digits.
-CLI_EXPORT void CLI_udfDOUBLETOCHAR(const double *x, char *result, Ind, Ind, char *, NameArg,
-                                    NameArg, char *) noexcept {
+Report routine::DOUBLETOCHAR(double x, FixedTextOut result) noexcept {
+  char *out = result.chars();
   char raw[kRaw + 1] = {};
-  if (*x == 0.0) {
-    result[0] = '0';
-    result[1] = 'E';
-    result[2] = '0';
-    std::memset(result + 3, ' ', kShort - 3);
-    return;
+  if (x == 0.0) {
+    out[0] = '0';
+    out[1] = 'E';
+    out[2] = '0';
+    std::memset(out + 3, ' ', result.size() - 3);
+    return {};
   }
-  sqlrxf2a(x, 15, raw, sizeof(double));
-  shorten(raw, result);
+  sqlrxf2a(&x, 15, raw, sizeof(double));
+  shorten(raw, out, result.size());
+  return {};
 }
+
+}  // namespace cli

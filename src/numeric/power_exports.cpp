@@ -78,7 +78,17 @@ static_assert(powerOfInt64(3, 40).code == Sysfun::overflow);
 
 }  // namespace
 
-CLI_NUMERIC_EXPORT2(CLI_udfPOWER1, double, double, double, powerOfDoubles)
-CLI_NUMERIC_EXPORT2(CLI_udfPOWER2, double, std::int32_t, double, powerOfDoubleToInt)
-CLI_NUMERIC_EXPORT2(CLI_udfPOWER3, std::int32_t, std::int32_t, std::int32_t, powerOfInt32)
-CLI_NUMERIC_EXPORT2(CLI_udfPOWER4, std::int64_t, std::int64_t, std::int64_t, powerOfInt64)
+namespace cli {
+
+Answer<double> routine::POWER1(double x, double y) noexcept { return powerOfDoubles(x, y); }
+Answer<double> routine::POWER2(double x, std::int32_t y) noexcept {
+  return powerOfDoubleToInt(x, y);
+}
+Answer<std::int32_t> routine::POWER3(std::int32_t x, std::int32_t y) noexcept {
+  return powerOfInt32(x, y);
+}
+Answer<std::int64_t> routine::POWER4(std::int64_t x, std::int64_t y) noexcept {
+  return powerOfInt64(x, y);
+}
+
+}  // namespace cli

@@ -9,11 +9,9 @@
 #include <cstdlib>
 
 #include "frame/frame.hpp"
+#include "routines.hpp"
 
 namespace {
-
-using cli::Ind;
-using cli::NameArg;
 
 // rand's values reduced to 0..32767.  Where RAND_MAX is larger, as on
 // glibc (2^31 - 1), the top 15 bits are kept: RAND_MAX + 1 is a power of
@@ -31,18 +29,19 @@ double next() noexcept {
 
 }  // namespace
 
-CLI_EXPORT void CLI_udfRAND1(double *result, Ind, char *, NameArg, NameArg, char *) noexcept {
-  *result = next();
-}
+namespace cli {
+
+Answer<double> routine::RAND1() noexcept { return success(next()); }
 
 // The scratchpad's data holds the seeded flag, one byte that the engine
 // zero-fills for each statement; only the first call of a statement reads
 // the seed.
-CLI_EXPORT void CLI_udfRAND2(const std::int32_t *seed, double *result, Ind, Ind, char *, NameArg,
-                             NameArg, char *, unsigned char *scratchpad) noexcept {
-  if (scratchpad[CLI_SCRATCHPAD_DATA_OFFSET] == 0) {
-    scratchpad[CLI_SCRATCHPAD_DATA_OFFSET] = 1;
-    std::srand(static_cast<unsigned>(*seed));
+Answer<double> routine::RAND2(std::int32_t seed, Scratchpad scratchpad) noexcept {
+  if (scratchpad.load<std::uint8_t>() == 0) {
+    scratchpad.save(std::uint8_t{1});
+    std::srand(static_cast<unsigned>(seed));
   }
-  *result = next();
+  return success(next());
 }
+
+}  // namespace cli

@@ -147,9 +147,23 @@ static_assert(truncateInt64(-9223372036854775807 - 1, -18).value == -90000000000
 
 }  // namespace
 
-CLI_NUMERIC_EXPORT2(CLI_udfROUND1, double, std::int32_t, double, roundDouble)
-CLI_NUMERIC_EXPORT2(CLI_udfROUND2, std::int32_t, std::int32_t, std::int32_t, cutInt32<true>)
-CLI_NUMERIC_EXPORT2(CLI_udfROUND5, std::int64_t, std::int32_t, std::int64_t, roundInt64)
-CLI_NUMERIC_EXPORT2(CLI_udfTRUNCATE1, double, std::int32_t, double, truncateDouble)
-CLI_NUMERIC_EXPORT2(CLI_udfTRUNCATE2, std::int32_t, std::int32_t, std::int32_t, cutInt32<false>)
-CLI_NUMERIC_EXPORT2(CLI_udfTRUNCATE5, std::int64_t, std::int32_t, std::int64_t, truncateInt64)
+namespace cli {
+
+Answer<double> routine::ROUND1(double x, std::int32_t y) noexcept { return roundDouble(x, y); }
+Answer<std::int32_t> routine::ROUND2(std::int32_t x, std::int32_t y) noexcept {
+  return cutInt32<true>(x, y);
+}
+Answer<std::int64_t> routine::ROUND5(std::int64_t x, std::int32_t y) noexcept {
+  return roundInt64(x, y);
+}
+Answer<double> routine::TRUNCATE1(double x, std::int32_t y) noexcept {
+  return truncateDouble(x, y);
+}
+Answer<std::int32_t> routine::TRUNCATE2(std::int32_t x, std::int32_t y) noexcept {
+  return cutInt32<false>(x, y);
+}
+Answer<std::int64_t> routine::TRUNCATE5(std::int64_t x, std::int32_t y) noexcept {
+  return truncateInt64(x, y);
+}
+
+}  // namespace cli

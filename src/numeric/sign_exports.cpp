@@ -65,30 +65,37 @@ static_assert(remainderOf<std::int64_t, Sysfun::overflow>(-7, 3).value == -1);
 
 }  // namespace
 
-CLI_NUMERIC_EXPORT1(CLI_udfABS1, double, double, absOfDouble)
-CLI_NUMERIC_EXPORT1(CLI_udfABS2, std::int32_t, std::int32_t, absOf<std::int32_t>)
-CLI_NUMERIC_EXPORT1(CLI_udfABS3, std::int16_t, std::int16_t, absOf<std::int16_t>)
-CLI_NUMERIC_EXPORT1(CLI_udfABS4, std::int64_t, std::int64_t, absOf<std::int64_t>)
+namespace cli {
 
-CLI_NUMERIC_EXPORT1(CLI_udfSIGN1, double, double, signOf<double>)
-CLI_NUMERIC_EXPORT1(CLI_udfSIGN2, std::int32_t, std::int32_t, signOf<std::int32_t>)
-CLI_NUMERIC_EXPORT1(CLI_udfSIGN3, std::int16_t, std::int16_t, signOf<std::int16_t>)
-CLI_NUMERIC_EXPORT1(CLI_udfSIGN4, std::int64_t, std::int64_t, signOf<std::int64_t>)
+Answer<double> routine::ABS1(double x) noexcept { return absOfDouble(x); }
+Answer<std::int32_t> routine::ABS2(std::int32_t x) noexcept { return absOf<std::int32_t>(x); }
+Answer<std::int16_t> routine::ABS3(std::int16_t x) noexcept { return absOf<std::int16_t>(x); }
+Answer<std::int64_t> routine::ABS4(std::int64_t x) noexcept { return absOf<std::int64_t>(x); }
 
-CLI_NUMERIC_EXPORT1(CLI_udfCEILING1, double, double, ceilingOfDouble)
-CLI_NUMERIC_EXPORT1(CLI_udfCEILING2, std::int32_t, std::int32_t, whole<std::int32_t>)
-CLI_NUMERIC_EXPORT1(CLI_udfCEILING3, std::int16_t, std::int16_t, whole<std::int16_t>)
-CLI_NUMERIC_EXPORT1(CLI_udfCEILING4, std::int64_t, std::int64_t, whole<std::int64_t>)
+Answer<double> routine::SIGN1(double x) noexcept { return signOf<double>(x); }
+Answer<std::int32_t> routine::SIGN2(std::int32_t x) noexcept { return signOf<std::int32_t>(x); }
+Answer<std::int16_t> routine::SIGN3(std::int16_t x) noexcept { return signOf<std::int16_t>(x); }
+Answer<std::int64_t> routine::SIGN4(std::int64_t x) noexcept { return signOf<std::int64_t>(x); }
 
-CLI_NUMERIC_EXPORT1(CLI_udfFLOOR1, double, double, floorOfDouble)
-CLI_NUMERIC_EXPORT1(CLI_udfFLOOR2, std::int32_t, std::int32_t, whole<std::int32_t>)
-CLI_NUMERIC_EXPORT1(CLI_udfFLOOR3, std::int16_t, std::int16_t, whole<std::int16_t>)
-CLI_NUMERIC_EXPORT1(CLI_udfFLOOR4, std::int64_t, std::int64_t, whole<std::int64_t>)
+Answer<double> routine::CEILING1(double x) noexcept { return ceilingOfDouble(x); }
+Answer<std::int32_t> routine::CEILING2(std::int32_t x) noexcept { return whole<std::int32_t>(x); }
+Answer<std::int16_t> routine::CEILING3(std::int16_t x) noexcept { return whole<std::int16_t>(x); }
+Answer<std::int64_t> routine::CEILING4(std::int64_t x) noexcept { return whole<std::int64_t>(x); }
+
+Answer<double> routine::FLOOR1(double x) noexcept { return floorOfDouble(x); }
+Answer<std::int32_t> routine::FLOOR2(std::int32_t x) noexcept { return whole<std::int32_t>(x); }
+Answer<std::int16_t> routine::FLOOR3(std::int16_t x) noexcept { return whole<std::int16_t>(x); }
+Answer<std::int64_t> routine::FLOOR4(std::int64_t x) noexcept { return whole<std::int64_t>(x); }
 
 // A zero divisor is 02 in the 32-bit form and 03 in the other two.
-CLI_NUMERIC_EXPORT2(CLI_udfMOD1, std::int32_t, std::int32_t, std::int32_t,
-                    (remainderOf<std::int32_t, Sysfun::divisionByZero>))
-CLI_NUMERIC_EXPORT2(CLI_udfMOD2, std::int16_t, std::int16_t, std::int16_t,
-                    (remainderOf<std::int16_t, Sysfun::overflow>))
-CLI_NUMERIC_EXPORT2(CLI_udfMOD3, std::int64_t, std::int64_t, std::int64_t,
-                    (remainderOf<std::int64_t, Sysfun::overflow>))
+Answer<std::int32_t> routine::MOD1(std::int32_t x, std::int32_t y) noexcept {
+  return remainderOf<std::int32_t, Sysfun::divisionByZero>(x, y);
+}
+Answer<std::int16_t> routine::MOD2(std::int16_t x, std::int16_t y) noexcept {
+  return remainderOf<std::int16_t, Sysfun::overflow>(x, y);
+}
+Answer<std::int64_t> routine::MOD3(std::int64_t x, std::int64_t y) noexcept {
+  return remainderOf<std::int64_t, Sysfun::overflow>(x, y);
+}
+
+}  // namespace cli

@@ -1,189 +1,150 @@
 // Exports of SPACE, LCASE, RTRIM, LTRIM, LEFT, RIGHT, REPEAT, CHAR and ASCII.
 //
 // The export ending in 1 takes terminated text, the one ending in 2 a
-// CLI_udfLob; both run one template over the layout (Text or Lob).  Every
-// limit is checked before anything is stored in the result, so a failed
-// call leaves the result area as the caller left it.
+// CLI_udfLob; both run one template over the views of the two layouts.
+// Every limit is checked before anything is stored in the result, so a
+// failed call leaves the result area as the caller left it.
 #include <cstdint>
 
 #include "frame/frame.hpp"
+#include "routines.hpp"
 #include "string/basic.hpp"
 
 namespace {
 
 using cli::Bytes;
-using cli::Ind;
-using cli::Lob;
-using cli::NameArg;
-using cli::Status;
+using cli::Report;
 using cli::Sysfun;
-using cli::Text;
 
-template <class Form>
-void lcase(const typename Form::Value *in, typename Form::Value *out) noexcept {
-  const Bytes s = Form::read(in);
-  cli::str::lowerCase(s, Form::area(out));
-  Form::finish(out, s.size);
+template <class In, class Out>
+Report lcase(In in, Out out) noexcept {
+  const Bytes s = in.bytes();
+  cli::str::lowerCase(s, out.area());
+  out.finish(s.size);
+  return {};
 }
 
-template <class Form>
-void store(Bytes kept, typename Form::Value *out) noexcept {
-  cli::str::copy(kept, Form::area(out));
-  Form::finish(out, kept.size);
+template <class Out>
+Report store(Bytes kept, Out out) noexcept {
+  cli::str::copy(kept, out.area());
+  out.finish(kept.size);
+  return {};
 }
 
-template <class Form>
-void rtrim(const typename Form::Value *in, typename Form::Value *out) noexcept {
-  store<Form>(cli::str::withoutTrailingBlanks(Form::read(in)), out);
-}
-
-template <class Form>
-void ltrim(const typename Form::Value *in, typename Form::Value *out) noexcept {
-  store<Form>(cli::str::withoutLeadingBlanks(Form::read(in)), out);
-}
-
-// LEFT and RIGHT after their own check of n: exactly n bytes, blanks behind
-// the data where the input is shorter.
-template <class Form>
-void left(const typename Form::Value *in, std::int32_t n, typename Form::Value *out) noexcept {
+// LEFT and RIGHT once n is known to fit: exactly n bytes, blanks behind the
+// data where the input is shorter.
+template <class In, class Out>
+Report left(In in, std::int32_t n, Out out) noexcept {
   const auto width = static_cast<std::size_t>(n);
-  cli::str::padded(Form::head(in, width), width, Form::area(out));
-  Form::finish(out, width);
+  cli::str::padded(in.head(width), width, out.area());
+  out.finish(width);
+  return {};
 }
 
-template <class Form>
-void right(const typename Form::Value *in, std::int32_t n, typename Form::Value *out) noexcept {
+template <class In, class Out>
+Report right(In in, std::int32_t n, Out out) noexcept {
   const auto width = static_cast<std::size_t>(n);
-  cli::str::rightPadded(Form::read(in), width, Form::area(out));
-  Form::finish(out, width);
+  cli::str::rightPadded(in.bytes(), width, out.area());
+  out.finish(width);
+  return {};
 }
 
 // REPEAT: an empty input gives an empty result whatever the count; else the
-// count must lie in 0 to limit / length.
-template <class Form, std::size_t Limit>
-void repeat(const typename Form::Value *in, std::int32_t count, typename Form::Value *out,
-            Status status) noexcept {
-  const Bytes s = Form::read(in);
+// count must lie in 0 to the result's limit divided by the length.
+template <class In, class Out>
+Report repeat(In in, std::int32_t count, Out out) noexcept {
+  const Bytes s = in.bytes();
   if (s.size == 0) {
-    Form::finish(out, 0);
-    return;
+    out.finish(0);
+    return {};
   }
-  if (count < 0 || static_cast<std::size_t>(count) > Limit / s.size) {
-    status.raise(Sysfun::tooLong);
-    return;
-  }
+  if (count < 0 || static_cast<std::size_t>(count) > out.limit() / s.size) return Sysfun::tooLong;
   const auto times = static_cast<std::size_t>(count);
-  cli::str::repeat(s, times, Form::area(out));
-  Form::finish(out, s.size * times);
+  cli::str::repeat(s, times, out.area());
+  out.finish(s.size * times);
+  return {};
 }
 
-// SPACE, LEFT1 and RIGHT1 take a count from 0 to 4000.
-constexpr bool outsideTextLimit(std::int32_t n) noexcept {
-  return n < 0 || n > static_cast<std::int32_t>(cli::kTextLimit);
+// A count from 0 to the longest text of the result (SPACE, LEFT1, RIGHT1).
+bool outside(std::int32_t n, const cli::TextOut &out) noexcept {
+  return n < 0 || static_cast<std::size_t>(n) > out.limit();
 }
 
 }  // namespace
 
-CLI_EXPORT void CLI_udfSPACE(const std::int32_t *count, char *result, Ind, Ind, char *sqlstate,
-                             NameArg, NameArg, char *message) noexcept {
-  const std::int32_t n = *count;
-  if (outsideTextLimit(n)) return Status{sqlstate, message}.raise(Sysfun::outOfRange);
-  const auto width = static_cast<std::size_t>(n);
-  std::memset(result, ' ', width);
-  result[width] = '\0';
+namespace cli {
+
+Report routine::SPACE(std::int32_t count, TextOut result) noexcept {
+  if (outside(count, result)) return Sysfun::outOfRange;
+  const auto width = static_cast<std::size_t>(count);
+  std::memset(result.chars(), ' ', width);
+  result.finish(width);
+  return {};
 }
 
-CLI_EXPORT void CLI_udfLCASE1(const char *in, char *out, Ind, Ind, char *, NameArg, NameArg,
-                              char *) noexcept {
-  lcase<Text>(in, out);
+Report routine::LCASE1(TextIn string, TextOut result) noexcept { return lcase(string, result); }
+Report routine::LCASE2(LobIn string, LobOut result) noexcept { return lcase(string, result); }
+
+Report routine::RTRIM1(TextIn string, TextOut result) noexcept {
+  return store(str::withoutTrailingBlanks(string.bytes()), result);
+}
+Report routine::RTRIM2(LobIn string, LobOut result) noexcept {
+  return store(str::withoutTrailingBlanks(string.bytes()), result);
 }
 
-CLI_EXPORT void CLI_udfLCASE2(const CLI_udfLob *in, CLI_udfLob *out, Ind, Ind, char *, NameArg,
-                              NameArg, char *) noexcept {
-  lcase<Lob>(in, out);
+Report routine::LTRIM1(TextIn string, TextOut result) noexcept {
+  return store(str::withoutLeadingBlanks(string.bytes()), result);
+}
+Report routine::LTRIM2(LobIn string, LobOut result) noexcept {
+  return store(str::withoutLeadingBlanks(string.bytes()), result);
 }
 
-CLI_EXPORT void CLI_udfRTRIM1(const char *in, char *out, Ind, Ind, char *, NameArg, NameArg,
-                              char *) noexcept {
-  rtrim<Text>(in, out);
-}
-
-CLI_EXPORT void CLI_udfRTRIM2(const CLI_udfLob *in, CLI_udfLob *out, Ind, Ind, char *, NameArg,
-                              NameArg, char *) noexcept {
-  rtrim<Lob>(in, out);
-}
-
-CLI_EXPORT void CLI_udfLTRIM1(const char *in, char *out, Ind, Ind, char *, NameArg, NameArg,
-                              char *) noexcept {
-  ltrim<Text>(in, out);
-}
-
-CLI_EXPORT void CLI_udfLTRIM2(const CLI_udfLob *in, CLI_udfLob *out, Ind, Ind, char *, NameArg,
-                              NameArg, char *) noexcept {
-  ltrim<Lob>(in, out);
-}
-
-CLI_EXPORT void CLI_udfLEFT1(const char *in, const std::int32_t *n, char *out, Ind, Ind, Ind,
-                             char *sqlstate, NameArg, NameArg, char *message) noexcept {
-  if (outsideTextLimit(*n)) return Status{sqlstate, message}.raise(Sysfun::outOfRange);
-  left<Text>(in, *n, out);
+Report routine::LEFT1(TextIn string, std::int32_t n, TextOut result) noexcept {
+  if (outside(n, result)) return Sysfun::outOfRange;
+  return left(string, n, result);
 }
 
 // The highest n that passes is the capacity minus 1.
-CLI_EXPORT void CLI_udfLEFT2(const CLI_udfLob *in, const std::int32_t *n, CLI_udfLob *out, Ind, Ind,
-                             Ind, char *sqlstate, NameArg, NameArg, char *message) noexcept {
-  if (*n < 0 || static_cast<std::uint32_t>(*n) >= Lob::capacity(out)) {
-    return Status{sqlstate, message}.raise(Sysfun::outOfRange);
-  }
-  left<Lob>(in, *n, out);
+Report routine::LEFT2(LobIn string, std::int32_t n, LobOut result) noexcept {
+  if (n < 0 || static_cast<std::uint32_t>(n) >= result.capacity()) return Sysfun::outOfRange;
+  return left(string, n, result);
 }
 
-CLI_EXPORT void CLI_udfRIGHT1(const char *in, const std::int32_t *n, char *out, Ind, Ind, Ind,
-                              char *sqlstate, NameArg, NameArg, char *message) noexcept {
-  if (outsideTextLimit(*n)) return Status{sqlstate, message}.raise(Sysfun::outOfRange);
-  right<Text>(in, *n, out);
+Report routine::RIGHT1(TextIn string, std::int32_t n, TextOut result) noexcept {
+  if (outside(n, result)) return Sysfun::outOfRange;
+  return right(string, n, result);
 }
 
 // The highest n that passes is the capacity itself.
-CLI_EXPORT void CLI_udfRIGHT2(const CLI_udfLob *in, const std::int32_t *n, CLI_udfLob *out, Ind,
-                              Ind, Ind, char *sqlstate, NameArg, NameArg, char *message) noexcept {
-  if (*n < 0 || static_cast<std::uint32_t>(*n) > Lob::capacity(out)) {
-    return Status{sqlstate, message}.raise(Sysfun::outOfRange);
-  }
-  right<Lob>(in, *n, out);
+Report routine::RIGHT2(LobIn string, std::int32_t n, LobOut result) noexcept {
+  if (n < 0 || static_cast<std::uint32_t>(n) > result.capacity()) return Sysfun::outOfRange;
+  return right(string, n, result);
 }
 
-CLI_EXPORT void CLI_udfREPEAT1(const char *in, const std::int32_t *count, char *out, Ind, Ind, Ind,
-                               char *sqlstate, NameArg, NameArg, char *message) noexcept {
-  repeat<Text, cli::kTextLimit>(in, *count, out, Status{sqlstate, message});
+Report routine::REPEAT1(TextIn string, std::int32_t count, TextOut result) noexcept {
+  return repeat(string, count, result);
+}
+Report routine::REPEAT2(LobIn string, std::int32_t count, LobOut result) noexcept {
+  return repeat(string, count, result);
 }
 
-CLI_EXPORT void CLI_udfREPEAT2(const CLI_udfLob *in, const std::int32_t *count, CLI_udfLob *out,
-                               Ind, Ind, Ind, char *sqlstate, NameArg, NameArg,
-                               char *message) noexcept {
-  repeat<Lob, cli::kLobLimit>(in, *count, out, Status{sqlstate, message});
-}
-
-CLI_EXPORT void CLI_udfCHAR(const std::int32_t *code, char *out, Ind, Ind, char *, NameArg, NameArg,
-                            char *) noexcept {
-  out[0] = static_cast<char>(cli::str::charOfCode(*code));
-  out[1] = '\0';
+Report routine::CHAR(std::int32_t code, TextOut result) noexcept {
+  result.chars()[0] = static_cast<char>(str::charOfCode(code));
+  result.finish(1);
+  return {};
 }
 
 // ASCII1 and ASCII2 are one routine under two names: the first byte of the
 // text, which is the terminator (0) for empty text.
-CLI_EXPORT void CLI_udfASCII1(const char *in, std::int32_t *out, Ind, Ind, char *, NameArg, NameArg,
-                              char *) noexcept {
-  *out = static_cast<unsigned char>(in[0]);
+Answer<std::int32_t> routine::ASCII1(TextIn string) noexcept {
+  return success(std::int32_t{static_cast<unsigned char>(string.chars()[0])});
+}
+Answer<std::int32_t> routine::ASCII2(TextIn string) noexcept {
+  return success(std::int32_t{static_cast<unsigned char>(string.chars()[0])});
+}
+Answer<std::int32_t> routine::ASCII3(LobIn string) noexcept {
+  const Bytes s = string.bytes();
+  return success(std::int32_t{s.size == 0 ? Byte{0} : s.data[0]});
 }
 
-CLI_EXPORT void CLI_udfASCII2(const char *in, std::int32_t *out, Ind, Ind, char *, NameArg, NameArg,
-                              char *) noexcept {
-  *out = static_cast<unsigned char>(in[0]);
-}
-
-CLI_EXPORT void CLI_udfASCII3(const CLI_udfLob *in, std::int32_t *out, Ind, Ind, char *, NameArg,
-                              NameArg, char *) noexcept {
-  const Bytes s = Lob::read(in);
-  *out = s.size == 0 ? 0 : s.data[0];
-}
+}  // namespace cli

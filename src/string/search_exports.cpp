@@ -11,17 +11,14 @@
 #include <type_traits>
 
 #include "frame/frame.hpp"
+#include "routines.hpp"
 #include "string/search.hpp"
 
 namespace {
 
 using cli::Bytes;
-using cli::Ind;
-using cli::Lob;
-using cli::NameArg;
-using cli::Status;
+using cli::Report;
 using cli::Sysfun;
-using cli::Text;
 using cli::str::kNotFound;
 using cli::str::Searcher;
 
@@ -156,26 +153,27 @@ bool replaceByte(Bytes source, cli::Byte search, Bytes replacement, cli::Byte *a
 // replaced; an empty search string matches nothing.  Raises 10 as soon as a
 // piece would take the result past the limit; the pieces so far stay, as
 // terminated text in the text form.
-template <class Form, std::size_t Limit>
-void replace(const typename Form::Value *sourceValue, const typename Form::Value *searchValue,
-             const typename Form::Value *replacementValue, typename Form::Value *out,
-             Status status) noexcept {
-  const Bytes source = Form::read(sourceValue);
-  const Bytes search = Form::read(searchValue);
-  const Bytes replacement = Form::read(replacementValue);
+template <class In, class Out>
+Report replace(In sourceValue, In searchValue, In replacementValue, Out out) noexcept {
+  constexpr bool kText = std::is_same_v<Out, cli::TextOut>;
+  const Bytes source = sourceValue.bytes();
+  const Bytes search = searchValue.bytes();
+  const Bytes replacement = replacementValue.bytes();
+  const std::size_t limit = out.limit();
   // What a failure leaves in the result: an empty text, or the source's
   // length in the length word.
-  Form::finish(out, std::is_same_v<Form, Text> ? 0 : source.size);
+  out.finish(kText ? 0 : source.size);
   std::size_t length = 0;
   // A short source is served as well by memchr from match to match.
   if (search.size == 1 && source.size >= kByteBlock &&
-      replaceByte(source, search.data[0], replacement, Form::area(out), Limit, length)) {
-    return Form::finish(out, length);
+      replaceByte(source, search.data[0], replacement, out.area(), limit, length)) {
+    out.finish(length);
+    return {};
   }
-  Builder result(Form::area(out), Limit);
-  const auto fail = [&] {
-    if constexpr (std::is_same_v<Form, Text>) Form::finish(out, result.length());
-    status.raise(Sysfun::tooLong);
+  Builder result(out.area(), limit);
+  const auto fail = [&]() -> Report {
+    if constexpr (kText) out.finish(result.length());
+    return Sysfun::tooLong;
   };
   std::size_t scan = 0;
   if (search.size != 0) {
@@ -189,21 +187,22 @@ void replace(const typename Form::Value *sourceValue, const typename Form::Value
     }
   }
   if (!result.append(source.data + scan, source.size - scan)) return fail();
-  Form::finish(out, result.length());
+  out.finish(result.length());
+  return {};
 }
 
 // INSERT after its checks: the source's first p - 1 bytes, the new string,
 // and what is left of the source behind the deleted range.
-template <class Form>
-void insert(Bytes source, std::int64_t p, std::int64_t l, Bytes added,
-            typename Form::Value *out) noexcept {
-  Builder result(Form::area(out), static_cast<std::size_t>(-1));
+template <class Out>
+Report spliced(Bytes source, std::int64_t p, std::int64_t l, Bytes added, Out out) noexcept {
+  Builder result(out.area(), static_cast<std::size_t>(-1));
   const auto head = static_cast<std::size_t>(p - 1);
   result.append(source.data, head);
   result.append(added.data, added.size);
   const auto rest = static_cast<std::size_t>(p - 1 + l);
   if (rest < source.size) result.append(source.data + rest, source.size - rest);
-  Form::finish(out, result.length());
+  out.finish(result.length());
+  return {};
 }
 
 // The checks of INSERT in their order: codes 10 before codes 01.  The
@@ -230,73 +229,61 @@ Sysfun insertCheck(bool lobForm, std::size_t s, std::int64_t p, std::int64_t l, 
   }
   if (p < 1 || (!lobForm && p > static_cast<std::int64_t>(limit))) return Sysfun::outOfRange;
   if (l < 0 || p + l > static_cast<std::int64_t>(limit)) return Sysfun::outOfRange;
-  return Sysfun{};
+  return Sysfun::none;
 }
 
 }  // namespace
 
-CLI_EXPORT void CLI_udfLOCATE1(const char *search, const char *searched, const std::int32_t *start,
-                               std::int32_t *result, Ind, Ind, Ind, Ind, char *sqlstate, NameArg,
-                               NameArg, char *message) noexcept {
-  const std::int32_t s = *start;
-  if (s < 1 || s > static_cast<std::int32_t>(cli::kTextLimit)) {
-    return Status{sqlstate, message}.raise(Sysfun::outOfRange);
+namespace cli {
+
+Answer<std::int32_t> routine::LOCATE1(TextIn search, TextIn string, std::int32_t start) noexcept {
+  if (start < 1 || start > static_cast<std::int32_t>(kTextLimit)) {
+    return failure<std::int32_t>(Sysfun::outOfRange);
   }
-  const Bytes h = Text::read(searched);
-  *result = static_cast<std::size_t>(s) - 1 > h.size
-                ? 0
-                : locate(Text::read(search), h, static_cast<std::size_t>(s));
+  const Bytes h = string.bytes();
+  return success(static_cast<std::size_t>(start) - 1 > h.size
+                     ? 0
+                     : locate(search.bytes(), h, static_cast<std::size_t>(start)));
 }
 
-CLI_EXPORT void CLI_udfLOCATE2(const CLI_udfLob *search, const CLI_udfLob *searched,
-                               const std::int32_t *start, std::int32_t *result, Ind, Ind, Ind, Ind,
-                               char *sqlstate, NameArg, NameArg, char *message) noexcept {
-  const std::int32_t s = *start;
-  if (s < 1 || s > static_cast<std::int32_t>(cli::kLobLimit)) {
-    return Status{sqlstate, message}.raise(Sysfun::outOfRange);
+Answer<std::int32_t> routine::LOCATE2(LobIn search, LobIn string, std::int32_t start) noexcept {
+  if (start < 1 || start > static_cast<std::int32_t>(kLobLimit)) {
+    return failure<std::int32_t>(Sysfun::outOfRange);
   }
-  *result = locate(Lob::read(search), Lob::read(searched), static_cast<std::size_t>(s));
+  return success(locate(search.bytes(), string.bytes(), static_cast<std::size_t>(start)));
 }
 
-CLI_EXPORT void CLI_udfLOCATE3(const char *search, const char *searched, std::int32_t *result, Ind,
-                               Ind, Ind, char *, NameArg, NameArg, char *) noexcept {
-  *result = locate(Text::read(search), Text::read(searched), 1);
+Answer<std::int32_t> routine::LOCATE3(TextIn search, TextIn string) noexcept {
+  return success(locate(search.bytes(), string.bytes(), 1));
 }
 
-CLI_EXPORT void CLI_udfLOCATE4(const CLI_udfLob *search, const CLI_udfLob *searched,
-                               std::int32_t *result, Ind, Ind, Ind, char *, NameArg, NameArg,
-                               char *) noexcept {
-  *result = locate(Lob::read(search), Lob::read(searched), 1);
+Answer<std::int32_t> routine::LOCATE4(LobIn search, LobIn string) noexcept {
+  return success(locate(search.bytes(), string.bytes(), 1));
 }
 
-CLI_EXPORT void CLI_udfREPLACE1(const char *source, const char *search, const char *replacement,
-                                char *result, Ind, Ind, Ind, Ind, char *sqlstate, NameArg, NameArg,
-                                char *message) noexcept {
-  replace<Text, cli::kTextLimit>(source, search, replacement, result, Status{sqlstate, message});
+Report routine::REPLACE1(TextIn source, TextIn search, TextIn replacement,
+                         TextOut result) noexcept {
+  return replace(source, search, replacement, result);
 }
 
-CLI_EXPORT void CLI_udfREPLACE2(const CLI_udfLob *source, const CLI_udfLob *search,
-                                const CLI_udfLob *replacement, CLI_udfLob *result, Ind, Ind, Ind,
-                                Ind, char *sqlstate, NameArg, NameArg, char *message) noexcept {
-  replace<Lob, cli::kLobLimit>(source, search, replacement, result, Status{sqlstate, message});
+Report routine::REPLACE2(LobIn source, LobIn search, LobIn replacement, LobOut result) noexcept {
+  return replace(source, search, replacement, result);
 }
 
-CLI_EXPORT void CLI_udfINSERT1(const char *source, const std::int32_t *start,
-                               const std::int32_t *length, const char *added, char *result, Ind,
-                               Ind, Ind, Ind, Ind, char *sqlstate, NameArg, NameArg,
-                               char *message) noexcept {
-  const Bytes s = Text::read(source), i = Text::read(added);
-  const Sysfun code = insertCheck(false, s.size, *start, *length, i.size, cli::kTextLimit);
-  if (code != Sysfun{}) return Status{sqlstate, message}.raise(code);
-  insert<Text>(s, *start, *length, i, result);
+Report routine::INSERT1(TextIn source, std::int32_t start, std::int32_t length, TextIn added,
+                        TextOut result) noexcept {
+  const Bytes s = source.bytes(), i = added.bytes();
+  const Sysfun code = insertCheck(false, s.size, start, length, i.size, result.limit());
+  if (code != Sysfun::none) return code;
+  return spliced(s, start, length, i, result);
 }
 
-CLI_EXPORT void CLI_udfINSERT2(const CLI_udfLob *source, const std::int32_t *start,
-                               const std::int32_t *length, const CLI_udfLob *added,
-                               CLI_udfLob *result, Ind, Ind, Ind, Ind, Ind, char *sqlstate, NameArg,
-                               NameArg, char *message) noexcept {
-  const Bytes s = Lob::read(source), i = Lob::read(added);
-  const Sysfun code = insertCheck(true, s.size, *start, *length, i.size, Lob::capacity(result));
-  if (code != Sysfun{}) return Status{sqlstate, message}.raise(code);
-  insert<Lob>(s, *start, *length, i, result);
+Report routine::INSERT2(LobIn source, std::int32_t start, std::int32_t length, LobIn added,
+                        LobOut result) noexcept {
+  const Bytes s = source.bytes(), i = added.bytes();
+  const Sysfun code = insertCheck(true, s.size, start, length, i.size, result.capacity());
+  if (code != Sysfun::none) return code;
+  return spliced(s, start, length, i, result);
 }
+
+}  // namespace cli

@@ -1,0 +1,169 @@
+// The body of every export, made from its catalogue row.
+//
+// The exports themselves are generated from the rows (exports.cpp in the
+// build folder): each passes its raw arguments to run<Row>, which turns
+// them into the views of frame.hpp by the row's layouts, calls the
+// routine's logic with them and stores what the logic gives back.  So the
+// compiler checks every routine against its row: a logic function whose
+// parameters don't take the views that the row implies does not compile.
+//
+// The logic of a routine takes, in this order:
+//   its inputs: a number by value, TextIn, LobIn or BytesIn, each wrapped
+//     in Nullable for a routine that reads its input indicators;
+//   its result, unless that is a single number, which it returns in an
+//     Answer (or, marked kResultByAddress, gets as the result's address):
+//     TextOut, LobOut or FixedTextOut, followed by a
+//     ResultIndicator for a routine that handles NULL; a table's Row;
+//   the extras of its frame: DbInfo; Scratchpad; Scratchpad, CallType;
+//     Scratchpad, CallType, CLI_tableCallback.
+// and gives back an Answer or a Report.
+#pragma once
+
+#include <array>
+#include <cstddef>
+#include <cstdint>
+#include <tuple>
+#include <utility>
+
+#include "catalogue/catalogue.hpp"
+#include "frame/frame.hpp"
+
+namespace cli::shim {
+
+namespace cat = cli::catalogue;
+
+constexpr bool isNumber(cat::Layout l) {
+  return l == cat::Layout::int16 || l == cat::Layout::int32 || l == cat::Layout::int64 ||
+         l == cat::Layout::real;
+}
+
+// The view of input I of row R, from its pointer.
+template <std::size_t R, std::size_t I, class Pointer>
+auto inputView(Pointer p) noexcept {
+  constexpr cat::Layout layout = cat::kRoutines[R].inputs[I].layout;
+  if constexpr (layout == cat::Layout::text) {
+    return TextIn{p};
+  } else if constexpr (layout == cat::Layout::lob) {
+    return LobIn{p};
+  } else if constexpr (layout == cat::Layout::fixedBytes) {
+    return BytesIn{p};
+  } else {
+    static_assert(isNumber(layout));
+    return *p;
+  }
+}
+
+// The view of result I of row R, from its pointer; not for numbers.
+template <std::size_t R, std::size_t I, class Pointer>
+auto resultView(Pointer p) noexcept {
+  constexpr cat::Slot slot = cat::kRoutines[R].results[I];
+  if constexpr (slot.layout == cat::Layout::text) {
+    return TextOut{p, slot.size};
+  } else if constexpr (slot.layout == cat::Layout::lob) {
+    return LobOut{p, slot.size};
+  } else {
+    static_assert(slot.layout == cat::Layout::fixedText);
+    return FixedTextOut{p, slot.size};
+  }
+}
+
+template <std::size_t R, class Arguments>
+auto inputViews(const Arguments &a) noexcept {
+  constexpr const cat::Routine &r = cat::kRoutines[R];
+  constexpr std::size_t n = inputCount(r), m = resultCount(r);
+  return [&]<std::size_t... I>(std::index_sequence<I...>) {
+    if constexpr ((r.properties & cat::kHandlesNull) != 0) {
+      return std::tuple{Nullable<decltype(inputView<R, I>(std::get<I>(a)))>{
+          inputView<R, I>(std::get<I>(a)), *std::get<n + m + I>(a)}...};
+    } else {
+      return std::tuple{inputView<R, I>(std::get<I>(a))...};
+    }
+  }
+  (std::make_index_sequence<n>{});
+}
+
+// The extras of the frame, as views.
+template <std::size_t R, class Arguments>
+auto extraViews(const Arguments &a) noexcept {
+  constexpr const cat::Routine &r = cat::kRoutines[R];
+  constexpr std::size_t first = 2 * (inputCount(r) + resultCount(r)) + 4;
+  if constexpr (r.frame == cat::Frame::plain) {
+    return std::tuple{};
+  } else if constexpr (r.frame == cat::Frame::dbinfo) {
+    return std::tuple{DbInfo{std::get<first>(a)}};
+  } else if constexpr (r.frame == cat::Frame::scratchpad) {
+    return std::tuple{Scratchpad{std::get<first>(a)}};
+  } else if constexpr (r.frame == cat::Frame::table) {
+    return std::tuple{Scratchpad{std::get<first>(a)},
+                      static_cast<CallType>(*std::get<first + 1>(a))};
+  } else {
+    return std::tuple{Scratchpad{std::get<first>(a)},
+                      static_cast<CallType>(*std::get<first + 1>(a)), std::get<first + 2>(a)};
+  }
+}
+
+// A table's result columns, with their indicators and sizes.
+template <std::size_t R, class Arguments>
+struct RowArguments {
+  static constexpr const cat::Routine &r = cat::kRoutines[R];
+  static constexpr std::size_t n = inputCount(r), m = resultCount(r);
+  explicit RowArguments(const Arguments &a) noexcept {
+    [&]<std::size_t... I>(std::index_sequence<I...>) {
+      ((values[I] = std::get<n + I>(a)), ...);
+      ((indicators[I] = std::get<2 * n + m + I>(a)), ...);
+    }
+    (std::make_index_sequence<m>{});
+  }
+  static constexpr auto sizes = [] {
+    std::array<std::uint32_t, m> s{};
+    for (std::size_t i = 0; i < m; ++i) s[i] = r.results[i].size;
+    return s;
+  }();
+  std::array<void *, m> values{};
+  std::array<std::int16_t *, m> indicators{};
+  [[nodiscard]] Row view() const noexcept {
+    return {values.data(), indicators.data(), sizes.data()};
+  }
+};
+
+template <std::size_t R, class Logic, class... Raw>
+void run(Logic logic, Raw... raw) noexcept {
+  constexpr const cat::Routine &r = cat::kRoutines[R];
+  constexpr std::size_t n = inputCount(r), m = resultCount(r);
+  static_assert(sizeof...(Raw) == cat::argumentCount(r), "the export's arguments are its row's");
+  const std::tuple<Raw...> a{raw...};
+  char *const sqlstate = std::get<2 * (n + m)>(a);
+  char *const message = std::get<2 * (n + m) + 3>(a);
+  const auto inputs = inputViews<R>(a);
+  const auto extras = extraViews<R>(a);
+
+  if constexpr (r.frame == cat::Frame::table || r.frame == cat::Frame::tableCallback) {
+    const RowArguments<R, std::tuple<Raw...>> row(a);
+    const Report report = std::apply(logic, std::tuple_cat(inputs, std::tuple{row.view()}, extras));
+    report.store(sqlstate, message);
+  } else if constexpr ((r.properties & cat::kResultByAddress) != 0) {
+    static_assert(m == 1 && isNumber(r.results[0].layout));
+    const Report report =
+        std::apply(logic, std::tuple_cat(inputs, std::tuple{std::get<n>(a)}, extras));
+    report.store(sqlstate, message);
+  } else if constexpr (isNumber(r.results[0].layout)) {
+    static_assert(m == 1 && (r.properties & cat::kHandlesNull) == 0);
+    const auto answer = std::apply(logic, std::tuple_cat(inputs, extras));
+    if (answer.code == Sysfun::none || answer.stored) *std::get<n>(a) = answer.value;
+    Report(answer.code).store(sqlstate, message);
+  } else {
+    static_assert(m == 1);
+    const auto result = std::tuple{resultView<R, 0>(std::get<n>(a))};
+    Report report;
+    if constexpr ((r.properties & cat::kHandlesNull) != 0) {
+      report = std::apply(
+          logic, std::tuple_cat(inputs, result, std::tuple{ResultIndicator{std::get<2 * n + 1>(a)}},
+                                extras));
+    } else {
+      report = std::apply(logic, std::tuple_cat(inputs, result, extras));
+    }
+    report.store(sqlstate, message);
+  }
+}
+
+}  // namespace cli::shim
