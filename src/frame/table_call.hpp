@@ -1,0 +1,147 @@
+// A table function's life through the caller: the scratchpad, the call
+// type, the input values and one row of result areas, laid out from the
+// row's result slots, each area a block of exactly its size.  For hosts,
+// tests, fuzz targets and benchmarks: it allocates, which no routine may.
+#pragma once
+
+#include <array>
+#include <cstddef>
+#include <cstdint>
+#include <cstring>
+#include <string_view>
+#include <vector>
+
+#include "frame/call.hpp"
+
+namespace cli::call {
+
+class TableCall {
+ public:
+  // Room for the engine's length word and any table function's data.
+  static constexpr std::size_t kScratchpadSize = 256;
+
+  // `unset` is what each result indicator holds before a call, so that a
+  // column the routine leaves alone can be told apart.
+  TableCall(const cat::Routine &row, void *fn, CLI_tableCallback callback = nullptr,
+            std::int16_t unset = -1)
+      : row_(row), fn_(fn), callback_(callback), unset_(unset) {
+    for (std::size_t i = 0; i < cat::resultCount(row); ++i) {
+      areas_.emplace_back(areaSize(row.results[i]));
+      results_[i] = areas_.back().data();
+    }
+  }
+
+  // Input i, the caller's value, read on every call.
+  void setInput(std::size_t i, void *value, std::int16_t indicator = 0) {
+    inputs_[i] = value;
+    inputIndicators_[i] = indicator;
+  }
+
+  // One call with `type`, the status buffers cleared, each result
+  // indicator set to `unset` and each CLI_udfLob area's length word to its
+  // capacity first.
+  void step(std::int32_t type) noexcept {
+    callType_ = type;
+    status_ = StatusBuffers{};
+    std::array<std::int16_t *, cat::kMaxInputs> inputIndicators{};
+    std::array<std::int16_t *, cat::kMaxResults> resultIndicators{};
+    for (std::size_t i = 0; i < cat::inputCount(row_); ++i) {
+      inputIndicators[i] = &inputIndicators_[i];
+    }
+    for (std::size_t i = 0; i < cat::resultCount(row_); ++i) {
+      indicators_[i] = unset_;
+      resultIndicators[i] = &indicators_[i];
+      if (row_.results[i].layout == cat::Layout::lob) {
+        prepareLobResult(results_[i], row_.results[i].size);
+      }
+    }
+    Frame f;
+    f.inputs = inputs_.data();
+    f.results = results_.data();
+    f.inputIndicators = inputIndicators.data();
+    f.resultIndicators = resultIndicators.data();
+    f.sqlstate = status_.sqlstate;
+    f.functionName = row_.sqlName;
+    f.specificName = row_.symbol;
+    f.message = status_.message;
+    f.scratchpad = scratchpad_.data();
+    f.callType = &callType_;
+    f.callback = callback_;
+    call(row_, fn_, f);
+  }
+
+  // Open on a zero-filled scratchpad; true unless a status was stored
+  // other than the end of the table.
+  bool open() noexcept {
+    scratchpad_.fill(0);
+    step(CLI_CALL_OPEN);
+    return !status_.stored() || ended();
+  }
+  // True when the call gave a row.
+  bool fetch() noexcept {
+    step(CLI_CALL_FETCH);
+    return !status_.stored();
+  }
+  void close() noexcept { step(CLI_CALL_CLOSE); }
+
+  [[nodiscard]] const StatusBuffers &status() const noexcept { return status_; }
+  [[nodiscard]] bool ended() const noexcept {
+    return std::memcmp(status_.sqlstate, CLI_SQLSTATE_NO_MORE_ROWS, 5) == 0;
+  }
+  [[nodiscard]] const cat::Routine &row() const noexcept { return row_; }
+  [[nodiscard]] unsigned char *area(std::size_t column) noexcept { return areas_[column].data(); }
+  [[nodiscard]] std::int16_t indicator(std::size_t column) const noexcept {
+    return indicators_[column];
+  }
+  [[nodiscard]] unsigned char *scratchpad() noexcept { return scratchpad_.data(); }
+
+  // A number column, widened.
+  [[nodiscard]] std::int64_t number(std::size_t column) const noexcept {
+    const unsigned char *a = areas_[column].data();
+    switch (row_.results[column].layout) {
+      case cat::Layout::int16: {
+        std::int16_t v = 0;
+        std::memcpy(&v, a, sizeof v);
+        return v;
+      }
+      case cat::Layout::int32: {
+        std::int32_t v = 0;
+        std::memcpy(&v, a, sizeof v);
+        return v;
+      }
+      default: {
+        std::int64_t v = 0;
+        std::memcpy(&v, a, sizeof v);
+        return v;
+      }
+    }
+  }
+  // A text column up to its terminator, or a CLI_udfLob column's data, its
+  // length held to the area's capacity.
+  [[nodiscard]] std::string_view text(std::size_t column) const noexcept {
+    const auto *a = reinterpret_cast<const char *>(areas_[column].data());
+    const cat::Slot &slot = row_.results[column];
+    if (slot.layout == cat::Layout::lob) {
+      std::uint32_t n = 0;
+      std::memcpy(&n, a, sizeof n);
+      return {a + CLI_LOB_DATA_OFFSET, n < slot.size ? n : slot.size};
+    }
+    return {a, ::strnlen(a, areas_[column].size())};
+  }
+
+ private:
+  const cat::Routine &row_;
+  void *fn_;
+  CLI_tableCallback callback_;
+  std::int16_t unset_;
+  std::int32_t callType_ = CLI_CALL_OPEN;
+  std::array<unsigned char, kScratchpadSize> scratchpad_{};
+  std::vector<std::vector<unsigned char>> areas_;
+  std::array<void *, cat::kMaxInputs> inputs_{};
+  std::array<std::int16_t, cat::kMaxInputs> inputIndicators_{};
+  std::array<void *, cat::kMaxResults> results_{};
+  std::array<std::int16_t, cat::kMaxResults> indicators_{};
+  StatusBuffers status_;
+};
+
+}  // namespace cli::call
