@@ -1,0 +1,184 @@
+// The call path of every scalar SQL function: the form that serves the
+// arguments, the call of its export through the frame caller, and the
+// result or the status turned into an SQLite result or error.  It knows
+// layouts and the catalogue, never what a routine does.
+#include <sqlite3ext.h>
+SQLITE_EXTENSION_INIT3
+
+#include <algorithm>
+#include <array>
+#include <cstdint>
+#include <cstring>
+#include <new>
+#include <tuple>
+#include <utility>
+
+#include "arguments.hpp"
+#include "connection.hpp"
+#include "frame/call.hpp"
+#include "frame/cliudf.h"
+#include "registry.hpp"
+
+namespace orv::host {
+namespace {
+
+using cli::catalogue::Frame;
+using cli::catalogue::kRoutineCount;
+using cli::catalogue::Routine;
+
+// Turns the status that a routine stored into an SQLite error: a SYSFUN
+// error with its code in words, any other status with its message.
+void reportStatus(const Call &c, const cli::call::StatusBuffers &status) {
+  const char *label = c.function.label.c_str();
+  if (const cli::Sysfun code = cli::call::sysfunIn(status.sqlstate, status.message);
+      code != cli::Sysfun::none) {
+    fail(c.context, "%s: SQLSTATE 38552, SYSFUN:%s: %s", label, cli::textOf(code).digits,
+         cli::wordsOf(code));
+  } else {
+    fail(c.context, "%s: SQLSTATE %.5s: %.*s", label, status.sqlstate,
+         static_cast<int>(sizeof status.message - 1), status.message);
+  }
+}
+
+// The scratchpad of a statement: zero-filled before its first call and
+// handed back unchanged on each later one.  SQLite keeps per-statement data
+// only as auxiliary data of an argument, and keeps it across rows only
+// while that argument is a constant; with a varying argument each row gets
+// a fresh scratchpad.
+constexpr std::size_t kScratchpadSize = 4 + 100;
+
+unsigned char *statementScratchpad(sqlite3_context *context) {
+  if (auto *kept = static_cast<unsigned char *>(sqlite3_get_auxdata(context, 0))) return kept;
+  auto *fresh = static_cast<unsigned char *>(sqlite3_malloc(kScratchpadSize));
+  if (fresh == nullptr) return nullptr;
+  std::memset(fresh, 0, kScratchpadSize);
+  sqlite3_set_auxdata(context, 0, fresh, sqlite3_free);
+  // set_auxdata frees the block at once when it cannot keep it; ask again.
+  return static_cast<unsigned char *>(sqlite3_get_auxdata(context, 0));
+}
+
+// The database information block that the extension hands to the routines
+// that read one: SQLite text is UTF-8, so the database's code page is 1208.
+// The routines only read it.
+alignas(8) std::array<unsigned char, 512> kDatabaseInfo = [] {
+  std::array<unsigned char, 512> block{};
+  const std::uint32_t utf8 = 1208;
+  std::memcpy(block.data() + CLI_DBINFO_CODEPAGE_OFFSET, &utf8, sizeof utf8);
+  return block;
+}();
+
+template <std::size_t Row, std::size_t... Is>
+void callRow(const Call &c, std::index_sequence<Is...>) {
+  constexpr const Routine &r = kRoutines[Row];
+  constexpr std::size_t n = sizeof...(Is);
+  std::tuple<Input<r.inputs[Is].layout, r.inputs[Is].size>...> inputs;
+  Result<r.results[0].layout, r.results[0].size> result;
+  std::array<std::int16_t, n + 1> inputIndicators{};
+  std::int16_t resultIndicator = 0;
+
+  // NULL reaches the routine only when it reads its indicators itself.
+  [[maybe_unused]] const auto load = [&](auto &input, int i) {
+    if (c.arguments[static_cast<std::size_t>(i)].type == SQLITE_NULL) {
+      inputIndicators[static_cast<std::size_t>(i)] = -1;
+      return true;
+    }
+    return input.load(c, Row, i);
+  };
+  if (!(load(std::get<Is>(inputs), static_cast<int>(Is)) && ...)) return;
+  if (!result.prepare(c)) return;
+
+  void *values[] = {std::get<Is>(inputs).pointer()..., nullptr};
+  void *results[] = {result.pointer()};
+  std::int16_t *inputNulls[] = {&inputIndicators[Is]..., nullptr};
+  std::int16_t *resultNulls[] = {&resultIndicator};
+  cli::call::StatusBuffers status;
+  cli::call::Frame f;
+  f.inputs = values;
+  f.results = results;
+  f.inputIndicators = inputNulls;
+  f.resultIndicators = resultNulls;
+  f.sqlstate = status.sqlstate;
+  f.functionName = r.sqlName;
+  f.specificName = r.symbol;
+  f.message = status.message;
+  if constexpr (r.frame == Frame::dbinfo) f.dbinfo = kDatabaseInfo.data();
+  if constexpr (r.frame == Frame::scratchpad) {
+    f.scratchpad = statementScratchpad(c.context);
+    if (f.scratchpad == nullptr) return sqlite3_result_error_nomem(c.context);
+  }
+  cli::call::call<Row>(c.connection.exports[Row], f);
+
+  if (status.stored()) {
+    reportStatus(c, status);
+  } else if (resultIndicator < 0) {
+    sqlite3_result_null(c.context);
+  } else {
+    result.deliver(c);
+  }
+}
+
+using RowCall = void (*)(const Call &);
+
+template <std::size_t Row>
+void callRow(const Call &c) {
+  if constexpr (orv::host::hostable(kRoutines[Row])) {
+    callRow<Row>(c, std::make_index_sequence<inputCount(kRoutines[Row])>{});
+  }
+}
+
+template <std::size_t... Rows>
+constexpr std::array<RowCall, sizeof...(Rows)> rowCalls(std::index_sequence<Rows...>) {
+  return {&callRow<Rows>...};
+}
+constexpr auto kRowCalls = rowCalls(std::make_index_sequence<kRoutineCount>{});
+
+}  // namespace
+
+// The SQL function itself: classifies the arguments, picks the export and
+// calls it.
+void dispatch(sqlite3_context *context, int argc, sqlite3_value **argv) {
+  const auto &f = *static_cast<const Function *>(sqlite3_user_data(context));
+  Call call(context, argv, *f.connection, f);
+  KindMask mask = 0;
+  bool firstString = true;
+  for (int i = 0; i < argc; ++i) {
+    sqlite3_value *v = argv[i];
+    Argument &a = call.arguments[static_cast<std::size_t>(i)];
+    a.type = sqlite3_value_type(v);
+    const KindMask bit = 1u << i;
+    if (a.type == SQLITE_NULL) {
+      if (!f.handlesNull) return sqlite3_result_null(context);
+      continue;
+    }
+    if ((f.stringArguments & bit) == 0) {
+      // Only text and BLOBs need converting to find their number type.
+      if (a.type == SQLITE_TEXT || a.type == SQLITE_BLOB) a.type = sqlite3_value_numeric_type(v);
+      if (a.type == SQLITE_FLOAT) mask |= bit;
+      continue;
+    }
+    if (a.type == SQLITE_BLOB) {
+      a.bytes = static_cast<const unsigned char *>(sqlite3_value_blob(v));
+      call.blobResult = call.blobResult || firstString;
+    } else {
+      a.bytes = sqlite3_value_text(v);
+    }
+    a.size = static_cast<std::size_t>(sqlite3_value_bytes(v));
+    a.fitsText = a.type != SQLITE_BLOB && a.size <= kTextLimit && !holdsNul(a.bytes, a.size);
+    if (!a.fitsText) mask |= bit;
+    firstString = false;
+  }
+  const int row = f.formFor[mask];
+  if (row == orv::host::kNoForm) {
+    return fail(context,
+                "%s: a string argument is a BLOB, holds a NUL byte or is longer than %d bytes, "
+                "and the function has no form for such strings",
+                f.label.c_str(), static_cast<int>(kTextLimit));
+  }
+  try {
+    kRowCalls[static_cast<std::size_t>(row)](call);
+  } catch (const std::bad_alloc &) {
+    sqlite3_result_error_nomem(context);
+  }
+}
+
+}  // namespace orv::host
