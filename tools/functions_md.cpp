@@ -10,6 +10,7 @@
 #include <string>
 
 #include "builtin_names.hpp"
+#include "frame/cliudf.h"
 #include "registry.hpp"
 
 namespace {
@@ -71,23 +72,13 @@ Written from the library's catalogue by `tools/functions_md.cpp`
 Every routine is an export of `liborvclifn.so` that an engine calls by
 name through the routine frame (see `src/frame/cliudf.h`). Strings are
 bytes: lengths and positions count bytes, positions count from 1.
-Terminated text is limited to 4000 bytes; `CLI_udfLob` strings, a 32-bit
-length followed by the data, to 1048576 bytes. A failure is reported as
+Terminated text is limited to @TEXT@ bytes; `CLI_udfLob` strings, a 32-bit
+length followed by the data, to @LOB@ bytes. A failure is reported as
 SQLSTATE 38552 with the message `SYSFUN:` and a two-digit code:
 
 | Code | Condition |
 |---|---|
-| 01 | an argument lies outside what the function accepts |
-| 02 | division by zero |
-| 03 | the result cannot be represented |
-| 04 | the date is not valid |
-| 05 | the time is not valid |
-| 06 | the time of a timestamp is not valid, or the text has no form that is taken |
-| 07 | a timestamp duration holds a character that is not allowed |
-| 08 | the interval code is not a known one |
-| 10 | a string would be longer than the function allows |
-| 11 | the text is not a number |
-
+@CODES@
 ## In SQLite
 
 The extension `orvclifn_sqlite` registers every routine of the library:
@@ -123,6 +114,23 @@ call them quoted, as `"LEFT"(s, n)`, or as `sysfun_left`, `sysfun_right` and
 ## Functions in this build
 )";
 
+// The introduction with the limits and the SYSFUN codes filled in from the
+// frame's header, where they are stated once.
+std::string introduction() {
+  std::string text = kIntroduction;
+  const auto fill = [&](const std::string &mark, const std::string &with) {
+    text.replace(text.find(mark), mark.size(), with);
+  };
+  std::string table;
+#define ORV_CODE_ROW(number, name, digits, words) table += "| " digits " | " words " |\n";
+  CLI_SYSFUN_CODES(ORV_CODE_ROW)
+#undef ORV_CODE_ROW
+  fill("@TEXT@", std::to_string(CLI_TEXT_LIMIT));
+  fill("@LOB@", std::to_string(CLI_LOB_LIMIT));
+  fill("@CODES@", table);
+  return text;
+}
+
 }  // namespace
 
 int main(int argc, char **argv) {
@@ -130,7 +138,7 @@ int main(int argc, char **argv) {
   if (sqlite3_open(":memory:", &db) != SQLITE_OK) return 1;
 
   std::ostringstream out;
-  out << kIntroduction << sqlite3_libversion() << kPicking;
+  out << introduction() << sqlite3_libversion() << kPicking;
   const auto groups = orv::host::groups();
   for (const auto &g : groups) {
     if (g.plainName.empty()) continue;
