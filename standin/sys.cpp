@@ -100,11 +100,14 @@ bool isDecimal(const char *s, std::size_t n) {
 constexpr std::size_t kNameOffset = 26408;
 constexpr std::size_t kNameRoom = 256;
 
+// The chain as the engine lays it out: the static data holds the first
+// link at byte 88, the record it points to holds the second at byte 0, the
+// next holds the third at byte 112, and the last record holds the name.
 struct StaticData {
-  alignas(8) unsigned char head[96];  // at 88: P
-  alignas(8) unsigned char p[8];      // at 0: Q
-  alignas(8) unsigned char q[120];    // at 112: R
-  alignas(8) unsigned char r[kNameOffset + kNameRoom];
+  alignas(8) unsigned char head[96];     // the first link at byte 88
+  alignas(8) unsigned char first[8];     // the second link at byte 0
+  alignas(8) unsigned char second[120];  // the third link at byte 112
+  alignas(8) unsigned char last[kNameOffset + kNameRoom];
 };
 
 void putPointer(unsigned char *at, const void *pointer) {
@@ -211,13 +214,13 @@ int32_t sqlnlsCollIDMapIDToName(char *name, uint32_t size, const unsigned char *
 
 void *sqlo_get_static_data(void) {
   thread_local StaticData data{};
-  putPointer(data.head + 88, data.p);
-  putPointer(data.p, data.q);
-  putPointer(data.q + 112, data.r);
+  putPointer(data.head + 88, data.first);
+  putPointer(data.first, data.second);
+  putPointer(data.second + 112, data.last);
   const char *name = std::getenv("ORVENGINE_SNAPSHOT_NAME");
   if (name == nullptr) name = "sqlcache";
   static_cast<void>(
-      std::snprintf(reinterpret_cast<char *>(data.r + kNameOffset), kNameRoom, "%s", name));
+      std::snprintf(reinterpret_cast<char *>(data.last + kNameOffset), kNameRoom, "%s", name));
   return data.head;
 }
 

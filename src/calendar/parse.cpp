@@ -39,10 +39,10 @@ std::int32_t fail(char *code, const char *why) noexcept {
   return 0;
 }
 
-// The scan shared by both date parsers: the date and where it ends (P).
+// The scan shared by both date parsers: the date and where it ends.
 struct DateScan {
-  std::size_t length = 0;  // L, after trimming
-  std::size_t end = 0;     // P: the end of the text or the separator
+  std::size_t length = 0;  // of the text, after trimming
+  std::size_t end = 0;     // the end of the date: the end of the text, or its separator
 };
 
 std::int32_t scanDate(char *text, std::int32_t *year, std::int32_t *month, std::int32_t *day,
@@ -127,7 +127,7 @@ std::int32_t CLI_parseTimeText(std::uint32_t mode, char *text, std::int32_t *hou
   if (length < 4 || length > 21) return 0;
   if (mode == kTimestampMode ? length < 7 : length > 8) return 0;
 
-  std::size_t m = 0;  // M: the position behind the first separator
+  std::size_t m = 0;  // where the minutes start: the position behind the first separator
   char separator = 0;
   for (std::size_t i = 0; i < length; ++i) {
     if (text[i] == '.' || text[i] == ':') {

@@ -47,33 +47,46 @@ constexpr Report kEndOfTable = Report::of(Report::Kind::endOfTable);
 
 // The snapshot name, at the end of a chain of pointers that starts in the
 // process's static data; null where a link is missing.
+// The offsets are those of the engine's own records: the first link stands
+// at byte 88 of the static data, the second at the start of the record it
+// points to, the third at byte 112 of the next, and the name at byte 26408
+// of the last.
+constexpr std::size_t kFirstLink = 88, kThirdLink = 112, kNameInRecord = 26408;
+
 const char *snapshotName(const void *staticData) {
   const auto *data = static_cast<const unsigned char *>(staticData);
   if (data == nullptr) return nullptr;
-  const unsigned char *p = nullptr, *q = nullptr, *r = nullptr;
-  std::memcpy(&p, data + 88, sizeof p);
-  if (p == nullptr) return nullptr;
-  std::memcpy(&q, p, sizeof q);
-  if (q == nullptr) return nullptr;
-  std::memcpy(&r, q + 112, sizeof r);
-  return r == nullptr ? nullptr : reinterpret_cast<const char *>(r + 26408);
+  const unsigned char *first = nullptr, *second = nullptr, *last = nullptr;
+  std::memcpy(&first, data + kFirstLink, sizeof first);
+  if (first == nullptr) return nullptr;
+  std::memcpy(&second, first, sizeof second);
+  if (second == nullptr) return nullptr;
+  std::memcpy(&last, second + kThirdLink, sizeof last);
+  return last == nullptr ? nullptr : reinterpret_cast<const char *>(last + kNameInRecord);
 }
+
+// The work areas of the path: the instance path service writes up to 264
+// bytes, and the path is composed in 256.
+constexpr std::size_t kInstanceRoom = 264, kPathRoom = 256;
+// The open mode and flags that the file service takes for a file read from
+// start to end.
+constexpr std::uint32_t kOpenForReading = 20, kOpenFlags = 1024;
 
 Report open(Scratch &s, const void *staticData) {
   s.block = nullptr;
   s.capacity = 0;
   s.closed = 1;
-  char instance[264] = {};
+  char instance[kInstanceRoom] = {};
   if (sqleinstancepath(0, instance) != 0) return kEndOfTable;
   const char *name = snapshotName(staticData);
-  char path[256];
+  char path[kPathRoom];
   const int n = name == nullptr ? -1
                                 : std::snprintf(path, sizeof path, "%s%s%s%s%s.%s", instance,
                                                 kPathSeparator, "tmp", kPathSeparator, name, "sql");
   // A path that does not fit its area is a file that cannot be opened.
   if (n < 0 || static_cast<std::size_t>(n) >= sizeof path) return {};
   sqlm_filter_file_name(path);
-  if (sqloopenp(path, 20, 1024, &s.file, 0) != 0) return {};
+  if (sqloopenp(path, kOpenForReading, kOpenFlags, &s.file, 0) != 0) return {};
   s.closed = 0;
   return {};
 }

@@ -26,6 +26,9 @@ using cli::Report;
 using cli::ResultIndicator;
 
 constexpr std::size_t kHead = 22;
+// The room that a record needs from its tag on before its string is
+// looked at: the test that the head of the next record fits.
+constexpr std::size_t kRecordRoom = 26;
 
 bool isOneOf(std::int32_t cp, std::initializer_list<std::int32_t> set) {
   return std::ranges::find(set, cp) != set.end();
@@ -131,7 +134,7 @@ Report copyObject(Nullable<LobIn> object, std::int32_t from, std::int32_t to,
   if (in.size >= kHead + 1) {
     std::size_t t = kHead, u = kHead;
     for (;;) {
-      if (u + 26 > capacity) return kResultTooSmall;
+      if (u + kRecordRoom > capacity) return kResultTooSmall;
       const unsigned char tag = in.data[t];
       const std::size_t width = widthOfTag(tag);
       if (width == 0) return kUnknownLengthForm;
