@@ -25,17 +25,19 @@
 #include <vector>
 
 #include "catalogue/catalogue.hpp"
+#include "frame/call.hpp"
 #include "frame/cliudf.h"
 #include "support/platform.hpp"
 
 namespace {
 
 namespace cat = cli::catalogue;
+namespace frame = cli::call;
 using Bytes = std::vector<unsigned char>;
 
 constexpr std::size_t kThreads = 8;
-constexpr std::size_t kMaxArguments = 16;
-constexpr std::size_t kMessageBytes = 70;
+// The frame's message buffer and a guard behind it, both compared.
+constexpr std::size_t kMessageBytes = CLI_MESSAGE_SIZE + 42;
 
 Bytes textBytes(std::string_view s, bool lob) {
   // A CLI_udfLob is its length word and the data; terminated text the data
@@ -131,20 +133,6 @@ std::vector<Bytes> poolFor(const cat::Slot &slot) {
   return pool;
 }
 
-std::size_t areaBytes(const cat::Slot &result) {
-  switch (result.layout) {
-    case cat::Layout::text:
-      return std::size_t{result.size} + 1;
-    case cat::Layout::lob:
-      return CLI_LOB_AREA_SIZE(std::size_t{result.size});
-    case cat::Layout::fixedText:
-    case cat::Layout::fixedBytes:
-      return result.size;
-    default:
-      return 8;
-  }
-}
-
 // What a call left: the used part of the result area and both status
 // buffers.  For a CLI_udfLob result the length word says how much is used.
 struct Outcome {
@@ -161,17 +149,6 @@ struct Case {
   std::size_t dateBytesToIgnore;  // today's date at the head of the result
 };
 
-template <std::size_t... Is>
-void invoke(void *fn, void *const *args, std::index_sequence<Is...>) {
-  using Export = void (*)(decltype(Is, static_cast<void *>(nullptr))...);
-  reinterpret_cast<Export>(fn)(args[Is]...);
-}
-
-template <std::size_t... Ks>
-void invokeAny(void *fn, void *const *args, std::size_t count, std::index_sequence<Ks...>) {
-  (void)((count == Ks && (invoke(fn, args, std::make_index_sequence<Ks>{}), true)) || ...);
-}
-
 // One thread's buffers, reused from call to call.
 class Caller {
  public:
@@ -179,10 +156,10 @@ class Caller {
     const cat::Routine &r = *c.routine;
     inputs_ = c.inputs;  // the date routines trim their input in place
     const cat::Slot &slot = r.results[0];
-    const std::size_t area = areaBytes(slot);
+    const std::size_t area = frame::areaSize(slot);
     if (result_.size() < area) result_.resize(area);
     std::fill_n(result_.begin(), area, 0xCD);
-    if (slot.layout == cat::Layout::lob) std::memcpy(result_.data(), &slot.size, 4);
+    if (slot.layout == cat::Layout::lob) frame::prepareLobResult(result_.data(), slot.size);
     std::fill(indicators_.begin(), indicators_.end(), std::int16_t{0});
     Outcome out;
     std::fill(out.sqlstate.begin(), out.sqlstate.end(), 'S');
@@ -191,17 +168,25 @@ class Caller {
     const std::int32_t utf8 = 1208;
     std::memcpy(dbinfo.data() + CLI_DBINFO_CODEPAGE_OFFSET, &utf8, sizeof utf8);
 
-    std::array<void *, kMaxArguments> args{};
-    std::size_t n = 0;
-    for (Bytes &in : inputs_) args.at(n++) = in.data();
-    args.at(n++) = result_.data();
-    for (std::size_t i = 0; i <= inputs_.size(); ++i) args.at(n++) = &indicators_.at(i);
-    args.at(n++) = out.sqlstate.data();
-    args.at(n++) = const_cast<char *>("FUNCTION");
-    args.at(n++) = const_cast<char *>("SPECIFIC");
-    args.at(n++) = out.message.data();
-    if (r.frame == cat::Frame::dbinfo) args.at(n++) = dbinfo.data();
-    invokeAny(c.fn, args.data(), n, std::make_index_sequence<kMaxArguments>{});
+    std::array<void *, cat::kMaxInputs> inputs{};
+    std::array<std::int16_t *, cat::kMaxInputs> inputIndicators{};
+    for (std::size_t i = 0; i < inputs_.size(); ++i) {
+      inputs[i] = inputs_[i].data();
+      inputIndicators[i] = &indicators_.at(i);
+    }
+    void *const results[] = {result_.data()};
+    std::int16_t *const resultIndicators[] = {&indicators_.at(inputs_.size())};
+    frame::Frame f;
+    f.inputs = inputs.data();
+    f.results = results;
+    f.inputIndicators = inputIndicators.data();
+    f.resultIndicators = resultIndicators;
+    f.sqlstate = out.sqlstate.data();
+    f.functionName = "FUNCTION";
+    f.specificName = "SPECIFIC";
+    f.message = out.message.data();
+    f.dbinfo = dbinfo.data();
+    frame::call(r, c.fn, f);
 
     std::size_t used = area;
     if (slot.layout == cat::Layout::lob) {

@@ -3,17 +3,19 @@
 // routines hand each service, and what they do when it fails.
 #include <gtest/gtest.h>
 
-#include <array>
 #include <cstdint>
 #include <cstring>
 #include <filesystem>
 #include <fstream>
+#include <optional>
 #include <string>
 #include <utility>
 #include <vector>
 
+#include "catalogue/catalogue.hpp"
 #include "fakes/fakes.h"
 #include "frame/cliudf.h"
+#include "frame/table_call.hpp"
 #include "snapshot.hpp"
 #include "support/frame_call.hpp"
 #include "support/platform.hpp"
@@ -161,12 +163,6 @@ TEST_F(Fakes, VeblobTakesPositiveStatusesAsSuccessAndAsksTheEncodingClass) {
 
 // ---- SQLCACHE_SNAPSHOT ---------------------------------------------------------
 
-template <std::size_t... Is>
-void invoke(void *fn, void *const *args, std::index_sequence<Is...>) {
-  using Export = void (*)(decltype(Is, static_cast<void *>(nullptr))...);
-  reinterpret_cast<Export>(fn)(args[Is]...);
-}
-
 class FakeSnapshot : public Fakes {
  protected:
   void SetUp() override {
@@ -174,6 +170,9 @@ class FakeSnapshot : public Fakes {
     dir = std::filesystem::temp_directory_path() / ("orv_fakes_" + std::to_string(processId()));
     std::filesystem::create_directories(dir / "tmp");
     std::snprintf(fakes->instancePath, sizeof fakes->instancePath, "%s", dir.string().c_str());
+    const cli::catalogue::Routine *routine = cli::catalogue::find("SQLCACHE_SNAPSHOT");
+    ASSERT_NE(routine, nullptr);
+    table.emplace(*routine, exportAddress("SQLCACHE_SNAPSHOT"));
   }
   void TearDown() override { std::filesystem::remove_all(dir); }
   void write(const std::string &stream) {
@@ -181,31 +180,25 @@ class FakeSnapshot : public Fakes {
   }
   // The SQLSTATE of one call.
   std::string step(std::int32_t callType) {
-    std::array<std::int32_t, 16> numbers{};
-    char text[9] = {};
-    static std::vector<unsigned char> statement(4 + 1048576);
-    std::array<std::int16_t, 18> indicators{};
-    char sqlstate[6] = {}, message[28] = {};
-    std::vector<void *> args;
-    for (auto &n : numbers) args.push_back(&n);
-    args.push_back(text);
-    args.push_back(statement.data());
-    for (auto &i : indicators) args.push_back(&i);
-    args.insert(args.end(), {sqlstate, nullptr, nullptr, message, scratchpad.data(), &callType});
-    invoke(exportAddress("SQLCACHE_SNAPSHOT"), args.data(), std::make_index_sequence<42>{});
-    return sqlstate;
+    table->step(callType);
+    const char *sqlstate = table->status().sqlstate;
+    return {sqlstate, ::strnlen(sqlstate, sizeof table->status().sqlstate)};
   }
   // Rows until the table ends.
   int rows() {
-    scratchpad.fill(0);
+    zeroScratchpad();
     step(CLI_CALL_OPEN);
     int n = 0;
     while (n < 200000 && step(CLI_CALL_FETCH).empty()) ++n;
     step(CLI_CALL_CLOSE);
     return n;
   }
+  // A fresh scratchpad, as the engine gives before an open.
+  void zeroScratchpad() {
+    std::memset(table->scratchpad(), 0, cli::call::TableCall::kScratchpadSize);
+  }
   std::filesystem::path dir;
-  std::array<unsigned char, 128> scratchpad{};
+  std::optional<cli::call::TableCall> table;
 };
 
 TEST_F(FakeSnapshot, EndsTheTableOnAFailedReadInEachStepOfTheSectionScan) {
@@ -230,7 +223,7 @@ TEST_F(FakeSnapshot, EndsTheTableOnAFailedReadInEachStepOfTheSectionScan) {
 TEST_F(FakeSnapshot, LogsAFailedAllocationAndKeepsNoBlock) {
   write(orv::snapshot::statement({{}, "s"}));
   fakes->allocationStatus = 7;
-  scratchpad.fill(0);
+  zeroScratchpad();
   step(CLI_CALL_OPEN);
   EXPECT_EQ(step(CLI_CALL_FETCH), "02000");
   EXPECT_EQ(fakes->logCalls, 1);
@@ -248,7 +241,7 @@ TEST_F(FakeSnapshot, RefusesAStatementLargerThanTheFileAndLogsIt) {
   std::string huge = orv::snapshot::element(19, "12345678");
   huge.replace(0, 4, "\xF0\xFF\xFF\xDD", 4);  // 3.7 GB in a file of a few bytes
   write(orv::snapshot::statement({{}, "s"}) + huge);
-  scratchpad.fill(0);
+  zeroScratchpad();
   step(CLI_CALL_OPEN);
   EXPECT_EQ(step(CLI_CALL_FETCH), "");
   EXPECT_EQ(step(CLI_CALL_FETCH), "02000");
@@ -265,7 +258,7 @@ TEST_F(FakeSnapshot, RefusesAStatementLargerThanTheFileAndLogsIt) {
 // The static data is asked for once on every entry, open included.
 TEST_F(FakeSnapshot, AsksForTheStaticDataOncePerCall) {
   write(orv::snapshot::statement({{}, "s"}));
-  scratchpad.fill(0);
+  zeroScratchpad();
   for (const std::int32_t type : {CLI_CALL_OPEN, CLI_CALL_FETCH, CLI_CALL_FETCH, CLI_CALL_CLOSE}) {
     fakes->staticDataCalls = 0;
     step(type);
@@ -275,7 +268,7 @@ TEST_F(FakeSnapshot, AsksForTheStaticDataOncePerCall) {
 
 TEST_F(FakeSnapshot, NeedsNoInstancePathOrFileToCloseCleanly) {
   fakes->instanceStatus = 3;
-  scratchpad.fill(0);
+  zeroScratchpad();
   EXPECT_EQ(step(CLI_CALL_OPEN), "02000");
   EXPECT_EQ(step(CLI_CALL_FETCH), "02000");
   step(CLI_CALL_CLOSE);

@@ -11,13 +11,16 @@
 #include <filesystem>
 #include <fstream>
 #include <mutex>
+#include <optional>
 #include <string>
 #include <thread>
 #include <utility>
 #include <vector>
 
+#include "catalogue/catalogue.hpp"
 #include "engine/services.h"
 #include "frame/cliudf.h"
+#include "frame/table_call.hpp"
 #include "snapshot.hpp"
 #include "support/frame_call.hpp"
 #include "support/platform.hpp"
@@ -27,11 +30,9 @@ namespace {
 namespace fs = std::filesystem;
 using namespace orv::snapshot;
 
-template <std::size_t... Is>
-void invoke(void *fn, void *const *args, std::index_sequence<Is...>) {
-  using Export = void (*)(decltype(Is, static_cast<void *>(nullptr))...);
-  reinterpret_cast<Export>(fn)(args[Is]...);
-}
+// What each result indicator holds before a call, to see which of them
+// the routine writes.
+constexpr std::int16_t kUnset = 0x5A5A;
 
 struct Row {
   std::array<std::int32_t, 16> columns{};
@@ -47,6 +48,9 @@ class Snapshot : public ::testing::Test {
     fs::create_directories(dir / "tmp");
     orv::test::setEnvironment("ORVENGINE_INSTANCE_PATH", dir.string().c_str());
     orv::test::setEnvironment("ORVENGINE_SNAPSHOT_NAME", "cache");
+    const cli::catalogue::Routine *routine = cli::catalogue::find("SQLCACHE_SNAPSHOT");
+    ASSERT_NE(routine, nullptr);
+    table.emplace(*routine, orv::test::exportAddress("SQLCACHE_SNAPSHOT"), nullptr, kUnset);
   }
   void TearDown() override {
     fs::remove_all(dir);
@@ -57,36 +61,31 @@ class Snapshot : public ::testing::Test {
     std::ofstream(dir / "tmp" / "cache.sql", std::ios::binary) << stream;
   }
 
-  // One call; a fetch's row is returned with the SQLSTATE it stored.
+  // One call; a fetch's row is returned with the SQLSTATE it stored.  The
+  // number columns hold -7 and column 17 "unset" before it, so that a
+  // column the routine leaves alone shows.
   std::pair<Row, std::string> call(std::int32_t callType) {
+    cli::call::TableCall &t = *table;
+    for (std::size_t i = 0; i < 16; ++i) {
+      const std::int32_t unset = -7;
+      std::memcpy(t.area(i), &unset, sizeof unset);
+    }
+    std::memset(t.area(16), 0, cli::call::areaSize(t.row().results[16]));
+    std::memcpy(t.area(16), "unset", 5);
+    t.step(callType);
     Row row;
-    row.indicators.fill(0x5A5A);
-    std::array<std::int32_t, 16> numbers{};
-    numbers.fill(-7);
-    char text[9] = "unset";
-    std::vector<unsigned char> statement(4 + 1048576);
-    char sqlstate[6] = {}, message[28] = {};
-    std::vector<void *> args;
-    for (auto &n : numbers) args.push_back(&n);
-    args.push_back(text);
-    args.push_back(statement.data());
-    for (auto &i : row.indicators) args.push_back(&i);
-    args.insert(args.end(), {sqlstate, nullptr, nullptr, message, scratchpad.data(), &callType});
-    invoke(orv::test::exportAddress("SQLCACHE_SNAPSHOT"), args.data(),
-           std::make_index_sequence<42>{});
-    row.columns = numbers;
-    row.text = text;
-    std::uint32_t length = 0;
-    std::memcpy(&length, statement.data(), 4);
-    if (row.indicators[17] == 0)
-      row.statement.assign(reinterpret_cast<char *>(statement.data()) + 4, length);
-    return {row, sqlstate};
+    for (std::size_t i = 0; i < 16; ++i) row.columns[i] = static_cast<std::int32_t>(t.number(i));
+    row.text = t.text(16);
+    if (t.indicator(17) == 0) row.statement = t.text(17);
+    for (std::size_t i = 0; i < 18; ++i) row.indicators[i] = t.indicator(i);
+    const char *sqlstate = t.status().sqlstate;
+    return {row, std::string(sqlstate, ::strnlen(sqlstate, sizeof t.status().sqlstate))};
   }
 
   // Opens, fetches until the table ends (at most `limit` rows), closes.
   std::vector<Row> rows(std::size_t limit = 100) {
     std::vector<Row> out;
-    scratchpad.fill(0);
+    zeroScratchpad();
     EXPECT_EQ(call(CLI_CALL_OPEN).second, "");
     for (std::size_t i = 0; i < limit; ++i) {
       auto [row, state] = call(CLI_CALL_FETCH);
@@ -104,8 +103,13 @@ class Snapshot : public ::testing::Test {
     return out;
   }
 
+  // A fresh scratchpad, as the engine gives before an open.
+  void zeroScratchpad() {
+    std::memset(table->scratchpad(), 0, cli::call::TableCall::kScratchpadSize);
+  }
+
   fs::path dir;
-  std::array<unsigned char, 128> scratchpad{};
+  std::optional<cli::call::TableCall> table;
 };
 
 Statement numbered(std::int32_t base, std::string text) {
@@ -203,7 +207,7 @@ TEST_F(Snapshot, EndsTheTableWhenTheFileCannotBeFound) {
   orv::test::setEnvironment("ORVENGINE_SNAPSHOT_NAME", "missing");
   EXPECT_EQ(texts().size(), 0u);
   orv::test::unsetEnvironment("ORVENGINE_INSTANCE_PATH");
-  scratchpad.fill(0);
+  zeroScratchpad();
   EXPECT_EQ(call(CLI_CALL_OPEN).second, "02000");
   EXPECT_EQ(call(CLI_CALL_FETCH).second, "02000");
   call(CLI_CALL_CLOSE);

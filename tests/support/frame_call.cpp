@@ -3,6 +3,7 @@
 #include <gtest/gtest.h>
 
 #include <algorithm>
+#include <array>
 #include <bit>
 #include <cctype>
 #include <cstring>
@@ -10,16 +11,24 @@
 #include <map>
 #include <utility>
 
+#include "catalogue/catalogue.hpp"
+#include "frame/call.hpp"
 #include "support/platform.hpp"
 
 namespace orv::test {
 namespace {
 
+namespace cat = cli::catalogue;
+namespace frame = cli::call;
+
 constexpr unsigned char kUnwritten = 0xCD;  // fills result areas before a call
 constexpr unsigned char kCanary = 0xA5;     // fills the bytes behind a result area
 constexpr std::size_t kCanaryBytes = 64;
 constexpr std::int16_t kIndicator = 0x5A5A;
-constexpr std::size_t kMessageBytes = 70;
+// The message buffer of the frame, and a guard behind it that a routine
+// writing past the message would reach.
+constexpr std::size_t kMessageGuardBytes = 42;
+constexpr std::size_t kMessageBytes = CLI_MESSAGE_SIZE + kMessageGuardBytes;
 
 const char *currentLibrary = ORV_LIBRARY_PATH;
 
@@ -34,28 +43,28 @@ void *library() {
   return at->second;
 }
 
-// Every frame argument is a pointer, so a pointer type taking K void *
-// parameters serves for any routine with a frame of K arguments.
-template <std::size_t... Is>
-bool invoke(void *fn, void *const *args, std::index_sequence<Is...>) {
-  using Export = void (*)(decltype(Is, static_cast<void *>(nullptr))...);
-  reinterpret_cast<Export>(fn)(args[Is]...);
-  return true;
-}
-
-// Calls `fn` with as many arguments as `args` holds, 6 + one of Ks.
-template <std::size_t... Ks>
-bool invokeAny(void *fn, const std::vector<void *> &args, std::index_sequence<Ks...>) {
-  const bool known =
-      ((args.size() == Ks + 6 && invoke(fn, args.data(), std::make_index_sequence<Ks + 6>{})) ||
-       ...);
-  if (!known) ADD_FAILURE() << "no frame of " << args.size() << " arguments";
-  return known;
-}
-
-// Calls `fn` with the 6 to 15 arguments of a frame with its extras.
-bool invokeFrame(void *fn, const std::vector<void *> &args) {
-  return invokeAny(fn, args, std::make_index_sequence<10>{});
+// Puts the caller's extras where the row's frame variant has them: the
+// database information block, or the scratchpad, then the call type and
+// the table callback.
+void placeExtras(const cat::Routine &row, const std::vector<void *> &extras, frame::Frame &f) {
+  switch (row.frame) {
+    case cat::Frame::plain:
+      break;
+    case cat::Frame::dbinfo:
+      f.dbinfo = extras[0];
+      break;
+    case cat::Frame::scratchpad:
+      f.scratchpad = extras[0];
+      break;
+    case cat::Frame::table:
+    case cat::Frame::tableCallback:
+      f.scratchpad = extras[0];
+      f.callType = static_cast<std::int32_t *>(extras[1]);
+      if (row.frame == cat::Frame::tableCallback) {
+        f.callback = reinterpret_cast<CLI_tableCallback>(extras[2]);
+      }
+      break;
+  }
 }
 
 std::size_t widthOf(Value::Layout layout) {
@@ -74,9 +83,17 @@ bool isNumber(Value::Layout layout) {
          layout != Value::Layout::fixed;
 }
 
+// The bytes of a result's area: a number's width, a CLI_udfLob's length
+// word and capacity, or the size asked for.
+std::size_t areaOf(const Value &result) {
+  if (isNumber(result.layout)) return widthOf(result.layout);
+  if (result.layout == Value::Layout::lob) return CLI_LOB_AREA_SIZE(std::size_t{result.size});
+  return result.size;
+}
+
 // A number is its bytes in the machine's order; terminated text its bytes
 // and a NUL; a CLI_udfLob its length word and its data.
-std::vector<unsigned char> layOut(const Value &v) {
+std::vector<unsigned char> bytesOf(const Value &v) {
   if (isNumber(v.layout)) {
     unsigned char raw[8];
     const auto n16 = static_cast<std::int16_t>(v.number);
@@ -87,16 +104,14 @@ std::vector<unsigned char> layOut(const Value &v) {
     std::memcpy(raw, from, widthOf(v.layout));
     return {raw, raw + widthOf(v.layout)};
   }
-  std::vector<unsigned char> out(v.bytes.begin(), v.bytes.end());
-  if (v.layout == Value::Layout::fixed) return out;
-  if (v.layout == Value::Layout::text) {
-    out.push_back(0);
-  } else {
-    const auto word = static_cast<std::uint32_t>(std::ssize(v.bytes));
-    unsigned char head[4];
-    std::memcpy(head, &word, sizeof word);
-    out.insert(out.begin(), head, head + 4);
+  if (v.layout == Value::Layout::lob) {
+    const auto n = static_cast<std::uint32_t>(v.bytes.size());  // the length word's width
+    std::vector<unsigned char> out(CLI_LOB_AREA_SIZE(std::size_t{n}));
+    frame::layOutLob(out.data(), v.bytes.data(), n);
+    return out;
   }
+  std::vector<unsigned char> out(v.bytes.begin(), v.bytes.end());
+  if (v.layout == Value::Layout::text) out.push_back(0);
   return out;
 }
 
@@ -158,20 +173,30 @@ namespace {
 
 Outcome callFrame(const char *name, const std::vector<Value> &inputs, const Value &result,
                   bool nullable, const std::vector<void *> &extras) {
+  const cat::Routine *row = cat::find(name);
+  if (row == nullptr) {
+    ADD_FAILURE() << name << " has no row in the catalogue";
+    return fails("no row");
+  }
   void *fn = exportAddress(name);
   EXPECT_NE(fn, nullptr) << name << " is not exported";
   if (fn == nullptr) return fails("no export");
+  if (inputs.size() != cat::inputCount(*row) || cat::resultCount(*row) != 1 ||
+      extras.size() != cat::extraCount(row->frame)) {
+    ADD_FAILURE() << name << ": its row takes " << cat::inputCount(*row) << " inputs, "
+                  << cat::resultCount(*row) << " results and " << cat::extraCount(row->frame)
+                  << " extras, not " << inputs.size() << ", 1 and " << extras.size();
+    return fails("no frame");
+  }
 
   std::vector<std::vector<unsigned char>> in;
   in.reserve(inputs.size());
-  for (const Value &v : inputs) in.push_back(layOut(v));
+  for (const Value &v : inputs) in.push_back(bytesOf(v));
 
-  const std::size_t area = isNumber(result.layout)               ? widthOf(result.layout)
-                           : result.layout == Value::Layout::lob ? 4 + std::size_t{result.size}
-                                                                 : result.size;
+  const std::size_t area = areaOf(result);
   std::vector<unsigned char> out(area + kCanaryBytes, kCanary);
   std::fill_n(out.begin(), area, kUnwritten);
-  if (result.layout == Value::Layout::lob) std::memcpy(out.data(), &result.size, 4);
+  if (result.layout == Value::Layout::lob) frame::prepareLobResult(out.data(), result.size);
   const std::vector<unsigned char> before = out;
 
   std::vector<std::int16_t> indicators(inputs.size() + 1, kIndicator);
@@ -179,25 +204,30 @@ Outcome callFrame(const char *name, const std::vector<Value> &inputs, const Valu
     for (std::size_t i = 0; i < inputs.size(); ++i) indicators[i] = inputs[i].null ? -1 : 0;
   }
   const std::vector<std::int16_t> indicatorsBefore = indicators;
-  char sqlstate[6];
+  char sqlstate[CLI_SQLSTATE_SIZE];
   char message[kMessageBytes];
   std::memset(sqlstate, 'S', sizeof sqlstate);
   std::memset(message, 'M', sizeof message);
 
-  std::vector<void *> args;
-  args.reserve(2 * inputs.size() + 6);
-  for (std::size_t i = 0; i < in.size(); ++i) {
-    args.push_back(inputs[i].placed != nullptr ? const_cast<void *>(inputs[i].placed)
-                                               : in[i].data());
+  std::array<void *, cat::kMaxInputs> inputAt{};
+  std::array<std::int16_t *, cat::kMaxInputs> inputIndicatorAt{};
+  for (std::size_t i = 0; i < inputs.size(); ++i) {
+    inputAt[i] = inputs[i].placed != nullptr ? const_cast<void *>(inputs[i].placed) : in[i].data();
+    inputIndicatorAt[i] = &indicators[i];
   }
-  args.push_back(out.data());
-  for (auto &i : indicators) args.push_back(&i);
-  args.push_back(sqlstate);
-  args.push_back(const_cast<char *>("FUNCTION"));
-  args.push_back(const_cast<char *>("SPECIFIC"));
-  args.push_back(message);
-  args.insert(args.end(), extras.begin(), extras.end());
-  if (!invokeFrame(fn, args)) return fails("no frame");
+  void *const resultAt[] = {out.data()};
+  std::int16_t *const resultIndicatorAt[] = {&indicators.back()};
+  frame::Frame f;
+  f.inputs = inputAt.data();
+  f.results = resultAt;
+  f.inputIndicators = inputIndicatorAt.data();
+  f.resultIndicators = resultIndicatorAt;
+  f.sqlstate = sqlstate;
+  f.functionName = "FUNCTION";
+  f.specificName = "SPECIFIC";
+  f.message = message;
+  placeExtras(*row, extras, f);
+  frame::call(*row, fn, f);
 
   EXPECT_TRUE(std::all_of(out.begin() + static_cast<std::ptrdiff_t>(area), out.end(),
                           [](unsigned char b) { return b == kCanary; }))

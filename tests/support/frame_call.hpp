@@ -88,9 +88,11 @@ inline Outcome failsLeaving(std::string code, std::string bytes) {
 
 void PrintTo(const Outcome &o, std::ostream *os);
 
-// Calls the export `name` with one result.  Its null indicators must stay
-// as they were.
-// `extras` are the frame's extra arguments, passed behind the message.
+// Calls the export `name`, a routine of one result, through the frame
+// that its catalogue row gives.  Its null indicators must stay as they were.
+// `extras` are the frame's extra arguments in the frame's order: the
+// database information block, or the scratchpad, call type and callback,
+// as many as the row's frame variant has.
 Outcome call(const char *name, const std::vector<Value> &inputs, const Value &result,
              const std::vector<void *> &extras = {});
 
