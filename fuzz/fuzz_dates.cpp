@@ -77,7 +77,7 @@ std::string callName(const char *name, std::string_view text, bool nullBlock, st
   std::memcpy(info.data(), dbinfo.data(), dbinfo.size());
   Call c(name);
   c.input(textBlock(text), Trim::blanks).result(Block(cli::catalogue::kName + 1));
-  c.extra(nullBlock ? nullptr : info.data());
+  c.dbinfo(nullBlock ? nullptr : info.data());
   code = c.run();
   ORV_CHECK(name, info.view() == std::string_view(reinterpret_cast<const char *>(dbinfo.data()),
                                                   dbinfo.size()));

@@ -45,18 +45,15 @@ struct Table {
   std::vector<Block> indicators;
   Block scratchpad{100, 0};
   Block sqlstate{CLI_SQLSTATE_SIZE}, message{CLI_MESSAGE_SIZE}, type{4};
-  std::vector<void *> args;
+  Export routine = lookUp(kName);
+  Arguments args;
 
   Table() {
     for (int i = 0; i < 16; ++i) numbers.emplace_back(4);
     for (int i = 0; i < 18; ++i) indicators.emplace_back(2);
-    for (Block &n : numbers) args.push_back(n.data());
-    args.push_back(text.data());
-    args.push_back(statement.data());
-    for (Block &i : indicators) args.push_back(i.data());
-    args.insert(args.end(),
-                {sqlstate.data(), const_cast<char *>("FUNCTION"), const_cast<char *>("SPECIFIC"),
-                 message.data(), scratchpad.data(), type.data()});
+    for (std::size_t i = 0; i < 16; ++i) args.result(numbers[i], indicators[i]);
+    args.result(text, indicators[16]).result(statement, indicators[17]);
+    args.status(sqlstate, message).scratchpad(scratchpad).callType(type);
   }
 
   // One call; returns the SQLSTATE's five characters, empty for none.
@@ -68,7 +65,7 @@ struct Table {
     std::memset(sqlstate.data(), 'S', sqlstate.size());
     std::memset(message.data(), 'M', message.size());
     std::memcpy(type.data(), &callType, 4);
-    invoke(kName, exportAddress(kName), args);
+    args.call(routine);
     ORV_CHECK(kName, Call::untouched(message, 'M'));
     if (Call::untouched(sqlstate, 'S')) return {};
     ORV_CHECK(kName, sqlstate.holds(std::string_view("02000\0", 6)));

@@ -90,14 +90,12 @@ void drive(bool threads, const std::uint8_t *&data, std::size_t &size) {
   std::vector<Block> inds;
   for (int i = 0; i < 6 + (threads ? 1 : 0); ++i) inds.emplace_back(2);
   Block sqlstate(CLI_SQLSTATE_SIZE), message(CLI_MESSAGE_SIZE), input(4), type(4);
-  std::vector<void *> args;
-  if (threads) args.push_back(input.data());
-  for (Block &r : results) args.push_back(r.data());
-  for (Block &i : inds) args.push_back(i.data());
-  args.insert(args.end(), {sqlstate.data(), const_cast<char *>("FUNCTION"),
-                           const_cast<char *>("SPECIFIC"), message.data(), scratchpad.data(),
-                           type.data(), reinterpret_cast<void *>(&callback)});
-  void *const address = exportAddress(name);
+  Arguments args;
+  if (threads) args.input(input, inds[0]);
+  const std::size_t first = threads ? 1 : 0;
+  for (std::size_t i = 0; i < 6; ++i) args.result(results[i], inds[first + i]);
+  args.status(sqlstate, message).scratchpad(scratchpad).callType(type).callback(&callback);
+  const Export routine = lookUp(name);
 
   const auto run = [&](std::int32_t callType, std::array<std::int64_t, 6> &row,
                        std::array<std::int16_t, 6> &indicators, std::string &state) {
@@ -107,10 +105,9 @@ void drive(bool threads, const std::uint8_t *&data, std::size_t &size) {
     std::memset(message.data(), 'M', message.size());
     std::memcpy(input.data(), &selector, 4);
     std::memcpy(type.data(), &callType, 4);
-    invoke(name, address, args);
+    args.call(routine);
     ORV_CHECK(name, numberIn<std::int32_t>(input) == selector);
     if (threads) ORV_CHECK(name, numberIn<std::int16_t>(inds[0]) == kIndicator);
-    const std::size_t first = threads ? 1 : 0;
     bool untouched = true;
     for (std::size_t i = 0; i < 6; ++i) {
       indicators[i] = numberIn<std::int16_t>(inds[first + i]);
