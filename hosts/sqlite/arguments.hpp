@@ -52,12 +52,12 @@ struct Call {
 // Most SQL strings are short: these read and write them in at most four
 // overlapping words each way, never outside [from, from + size), and call
 // the C library only for longer ones.
-std::uint64_t word(const unsigned char *p) {
+inline std::uint64_t word(const unsigned char *p) {
   std::uint64_t w = 0;
   std::memcpy(&w, p, sizeof w);
   return w;
 }
-std::uint32_t halfWord(const unsigned char *p) {
+inline std::uint32_t halfWord(const unsigned char *p) {
   std::uint32_t w = 0;
   std::memcpy(&w, p, sizeof w);
   return w;
@@ -66,7 +66,7 @@ constexpr bool hasZeroByte(std::uint64_t w) {
   return ((w - 0x0101010101010101u) & ~w & 0x8080808080808080u) != 0;
 }
 
-bool holdsNul(const unsigned char *p, std::size_t size) {
+inline bool holdsNul(const unsigned char *p, std::size_t size) {
   if (size >= 8 && size <= 16) return hasZeroByte(word(p)) || hasZeroByte(word(p + size - 8));
   if (size > 16 && size <= 32) {
     return hasZeroByte(word(p)) || hasZeroByte(word(p + 8)) || hasZeroByte(word(p + size - 16)) ||
@@ -79,7 +79,7 @@ bool holdsNul(const unsigned char *p, std::size_t size) {
   return size != 0 && std::memchr(p, 0, size) != nullptr;
 }
 
-void copyShort(char *to, const unsigned char *from, std::size_t size) {
+inline void copyShort(char *to, const unsigned char *from, std::size_t size) {
   if (size >= 8 && size <= 16) {
     const std::uint64_t head = word(from), tail = word(from + size - 8);
     std::memcpy(to, &head, 8);
@@ -107,7 +107,7 @@ void fail(sqlite3_context *context, const char *format, Args... args) {
   sqlite3_free(text);
 }
 
-const char *argumentName(std::size_t row, int i) {
+inline const char *argumentName(std::size_t row, int i) {
   const char *name = kRoutines[row].inputs[i].name;
   return name != nullptr ? name : "";
 }

@@ -154,8 +154,13 @@ std::string logicDeclaration(const Routine &r) {
                            ? "BytesIn"
                            : std::string("std::") + numberType(s.layout);
     if (type == "std::double") type = "double";
-    if (handlesNull(r)) type = "Nullable<" + type + ">";
-    p.push_back(type + " " + inputName(r, i));
+    if (handlesNull(r)) {
+      type.insert(0, "Nullable<");
+      type += '>';
+    }
+    type += " ";
+    type += inputName(r, i);
+    p.push_back(type);
   }
   std::string returned = "Report";
   if (isTable(r)) {
@@ -208,6 +213,7 @@ std::string exportsSource() {
   for (const Routine &r : kRoutines) {
     const std::vector<std::string> p = parameters(r);
     std::vector<std::string> names;
+    names.reserve(p.size());
     for (const std::string &s : p) names.push_back(declared(s));
     out += "\nORV_EXPORT void " + std::string(r.symbol) + "(" + joined(p, ", ") + ") noexcept {\n" +
            "  cli::shim::run<" + std::to_string(row) + ">(cli::routine::" + logicName(r) + ", " +
@@ -263,7 +269,7 @@ bool writeIfChanged(const char *path, const std::string &text) {
   if (std::FILE *f = std::fopen(path, "rb")) {
     char buffer[4096];
     for (std::size_t n; (n = std::fread(buffer, 1, sizeof buffer, f)) > 0;) old.append(buffer, n);
-    std::fclose(f);
+    static_cast<void>(std::fclose(f));
     if (old == text) return true;
   }
   std::FILE *f = std::fopen(path, "wb");

@@ -51,7 +51,8 @@ inline constexpr std::size_t kMaxArguments = [] {
 }();
 
 // Writes the arguments of `row` in the frame's order into `args`, which has
-// room for kMaxArguments; returns how many there are.
+// room for them all (kMaxArguments is enough for any row); returns how many
+// there are.
 inline std::size_t layOut(const cat::Routine &row, const Frame &f, void **args) noexcept {
   const std::size_t n = cat::inputCount(row), m = cat::resultCount(row);
   std::size_t k = 0;
@@ -132,18 +133,40 @@ inline bool invoke(void *fn, void *const *args, std::size_t count) noexcept {
 
 // Calls the export `fn` of `row` with the frame `f`.
 inline void call(const cat::Routine &row, void *fn, const Frame &f) noexcept {
-  void *args[kMaxArguments];
+  void *args[kMaxArguments] = {};
   invoke(fn, args, layOut(row, f, args));
 }
 
-// The same for a row known at compile time: the argument count is fixed,
-// so the call is as direct as a hand-written one.
+// The same for a row known at compile time: the counts and the argument
+// count are constants, so the call is as direct as a hand-written one.
 template <std::size_t Row>
 void call(void *fn, const Frame &f) noexcept {
-  constexpr std::size_t k = cat::argumentCount(cat::kRoutines[Row]);
-  void *args[kMaxArguments];
-  layOut(cat::kRoutines[Row], f, args);
-  invokeWith<k>(fn, args);
+  constexpr const cat::Routine &row = cat::kRoutines[Row];
+  constexpr std::size_t n = cat::inputCount(row), m = cat::resultCount(row);
+  constexpr std::size_t k = cat::argumentCount(row);
+  [&]<std::size_t... I, std::size_t... J>(std::index_sequence<I...>, std::index_sequence<J...>) {
+    void *args[k] = {f.inputs[I]...,
+                     f.results[J]...,
+                     f.inputIndicators[I]...,
+                     f.resultIndicators[J]...,
+                     f.sqlstate,
+                     const_cast<char *>(f.functionName),
+                     const_cast<char *>(f.specificName),
+                     f.message};
+    constexpr std::size_t extras = 2 * (n + m) + 4;
+    if constexpr (row.frame == cat::Frame::dbinfo) args[extras] = const_cast<void *>(f.dbinfo);
+    if constexpr (row.frame != cat::Frame::plain && row.frame != cat::Frame::dbinfo) {
+      args[extras] = f.scratchpad;
+    }
+    if constexpr (row.frame == cat::Frame::table || row.frame == cat::Frame::tableCallback) {
+      args[extras + 1] = f.callType;
+    }
+    if constexpr (row.frame == cat::Frame::tableCallback) {
+      args[extras + 2] = reinterpret_cast<void *>(f.callback);
+    }
+    invokeWith<k>(fn, args);
+  }
+  (std::make_index_sequence<n>{}, std::make_index_sequence<m>{});
 }
 
 // The status buffers of one call, cleared.

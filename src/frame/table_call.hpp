@@ -4,6 +4,7 @@
 // tests, fuzz targets and benchmarks: it allocates, which no routine may.
 #pragma once
 
+#include <algorithm>
 #include <array>
 #include <cstddef>
 #include <cstdint>
@@ -21,19 +22,48 @@ class TableCall {
   static constexpr std::size_t kScratchpadSize = 256;
 
   // `unset` is what each result indicator holds before a call, so that a
-  // column the routine leaves alone can be told apart.
+  // column the routine leaves alone can be told apart.  The frame is laid
+  // out once, here; a call only resets what the routine may have changed.
   TableCall(const cat::Routine &row, void *fn, CLI_tableCallback callback = nullptr,
             std::int16_t unset = -1)
-      : row_(row), fn_(fn), callback_(callback), unset_(unset) {
-    for (std::size_t i = 0; i < cat::resultCount(row); ++i) {
+      : row_(row),
+        fn_(fn),
+        unset_(unset),
+        inputs_(cat::inputCount(row)),
+        results_(cat::resultCount(row)) {
+    std::array<void *, cat::kMaxResults> areas{};
+    std::array<std::int16_t *, cat::kMaxInputs> inputIndicators{};
+    std::array<std::int16_t *, cat::kMaxResults> resultIndicators{};
+    areas_.reserve(results_);
+    for (std::size_t i = 0; i < inputs_; ++i) inputIndicators[i] = &inputIndicators_[i];
+    for (std::size_t i = 0; i < results_; ++i) {
       areas_.emplace_back(areaSize(row.results[i]));
-      results_[i] = areas_.back().data();
+      areas[i] = areas_.back().data();
+      resultIndicators[i] = &indicators_[i];
+      if (row.results[i].layout == cat::Layout::lob) lobColumns_[lobs_++] = i;
     }
+    Frame f;
+    f.inputs = inputValues_.data();
+    f.results = areas.data();
+    f.inputIndicators = inputIndicators.data();
+    f.resultIndicators = resultIndicators.data();
+    f.sqlstate = status_.sqlstate;
+    f.functionName = row.sqlName;
+    f.specificName = row.symbol;
+    f.message = status_.message;
+    f.scratchpad = scratchpad_.data();
+    f.callType = &callType_;
+    f.callback = callback;
+    count_ = layOut(row, f, args_.data());
   }
+  TableCall(const TableCall &) = delete;
+  TableCall &operator=(const TableCall &) = delete;
 
-  // Input i, the caller's value, read on every call.
-  void setInput(std::size_t i, void *value, std::int16_t indicator = 0) {
-    inputs_[i] = value;
+  // Input i, the caller's value, read on every call; input i is the frame's
+  // argument i.
+  void setInput(std::size_t i, void *value, std::int16_t indicator = 0) noexcept {
+    inputValues_[i] = value;
+    args_[i] = value;
     inputIndicators_[i] = indicator;
   }
 
@@ -43,31 +73,11 @@ class TableCall {
   void step(std::int32_t type) noexcept {
     callType_ = type;
     status_ = StatusBuffers{};
-    std::array<std::int16_t *, cat::kMaxInputs> inputIndicators{};
-    std::array<std::int16_t *, cat::kMaxResults> resultIndicators{};
-    for (std::size_t i = 0; i < cat::inputCount(row_); ++i) {
-      inputIndicators[i] = &inputIndicators_[i];
+    std::fill_n(indicators_.begin(), results_, unset_);
+    for (std::size_t i = 0; i < lobs_; ++i) {
+      prepareLobResult(areas_[lobColumns_[i]].data(), row_.results[lobColumns_[i]].size);
     }
-    for (std::size_t i = 0; i < cat::resultCount(row_); ++i) {
-      indicators_[i] = unset_;
-      resultIndicators[i] = &indicators_[i];
-      if (row_.results[i].layout == cat::Layout::lob) {
-        prepareLobResult(results_[i], row_.results[i].size);
-      }
-    }
-    Frame f;
-    f.inputs = inputs_.data();
-    f.results = results_.data();
-    f.inputIndicators = inputIndicators.data();
-    f.resultIndicators = resultIndicators.data();
-    f.sqlstate = status_.sqlstate;
-    f.functionName = row_.sqlName;
-    f.specificName = row_.symbol;
-    f.message = status_.message;
-    f.scratchpad = scratchpad_.data();
-    f.callType = &callType_;
-    f.callback = callback_;
-    call(row_, fn_, f);
+    invoke(fn_, args_.data(), count_);
   }
 
   // Open on a zero-filled scratchpad; true unless a status was stored
@@ -132,16 +142,19 @@ class TableCall {
  private:
   const cat::Routine &row_;
   void *fn_;
-  CLI_tableCallback callback_;
   std::int16_t unset_;
+  std::size_t inputs_, results_;  // the row's counts
   std::int32_t callType_ = CLI_CALL_OPEN;
   std::array<unsigned char, kScratchpadSize> scratchpad_{};
   std::vector<std::vector<unsigned char>> areas_;
-  std::array<void *, cat::kMaxInputs> inputs_{};
+  std::array<void *, cat::kMaxInputs> inputValues_{};
   std::array<std::int16_t, cat::kMaxInputs> inputIndicators_{};
-  std::array<void *, cat::kMaxResults> results_{};
   std::array<std::int16_t, cat::kMaxResults> indicators_{};
   StatusBuffers status_;
+  std::array<void *, kMaxArguments> args_{};
+  std::size_t count_ = 0;
+  std::array<std::size_t, cat::kMaxResults> lobColumns_{};  // the CLI_udfLob results
+  std::size_t lobs_ = 0;
 };
 
 }  // namespace cli::call

@@ -10,7 +10,6 @@
 
 namespace {
 
-using cli::Sysfun;
 
 // The white space that CHARTODOUBLE cuts from the end.
 constexpr bool isTrailingSpace(char c) {

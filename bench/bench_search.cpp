@@ -1,0 +1,168 @@
+// Searching and rebuilding.  The 1 MiB rows report bytes of the searched
+// string per second, and their time as a ratio to two rivals measured in
+// the same run: `x memmove`, to a memmove of 1 MiB (the cost of touching
+// the data at all), and `x memmem`, to the C library's memmem on the same
+// search string and text.  The shapes are those that make searches slow:
+// needles of 'a' with one 'b' (quadratic when searched naively), periodic
+// text with a needle that breaks the period at one end, and small
+// alphabets.
+#include <chrono>
+#include <cstdint>
+#include <cstring>
+#include <string>
+
+#include "bench_support.hpp"
+
+namespace orv::bench {
+
+namespace {
+
+std::string repeated(const std::string &unit, std::size_t size) {
+  std::string out;
+  while (out.size() < size) out += unit;
+  out.resize(size);
+  return out;
+}
+std::string words(std::size_t size) {
+  return repeated("the quick brown fox jumps over the lazy dog, then naps by the river. ", size);
+}
+std::string everyHundred(std::size_t size) {  // "x" once in every 100 bytes
+  std::string out = words(size);
+  for (std::size_t i = 50; i < size; i += 100) out[i] = 'x';
+  return out;
+}
+std::string randomOver(const char *alphabet, std::size_t size, unsigned seed) {
+  std::uint64_t state = seed;  // a fixed generator, so every run has the same text
+  std::string out(size, ' ');
+  const std::size_t k = std::strlen(alphabet);
+  for (char &c : out) {
+    state = state * 6364136223846793005ULL + 1442695040888963407ULL;
+    c = alphabet[(state >> 33) % k];
+  }
+  return out;
+}
+
+void memmoveMiB(benchmark::State &state) {
+  std::vector<char> from(kMiB, 'a'), to(kMiB);
+  const auto start = std::chrono::steady_clock::now();
+  for (auto _ : state) {
+    std::memmove(to.data(), from.data(), kMiB);
+    benchmark::DoNotOptimize(to.data());
+    benchmark::ClobberMemory();
+  }
+  const std::chrono::duration<double, std::nano> spent = std::chrono::steady_clock::now() - start;
+  setReferenceTime("memmove", spent.count() / static_cast<double>(state.iterations()));
+  state.SetBytesProcessed(state.iterations() * static_cast<std::int64_t>(kMiB));
+}
+
+struct SearchShape {
+  const char *name;
+  std::string needle, text;
+};
+const SearchShape kShapes[] = {
+    {"text, no match", "quartz", words(kMiB)},
+    {"text, no match, 40-byte needle", "the quick brown fox jumps over the cat!!", words(kMiB)},
+    {"a, 3999 a and a b", std::string(3999, 'a') + "b", std::string(kMiB, 'a')},
+    {"a, a b and 3999 a", "b" + std::string(3999, 'a'), std::string(kMiB, 'a')},
+    {"a, aab", "aab", std::string(kMiB, 'a')},
+    {"a, b and 15 a", "b" + std::string(15, 'a'), std::string(kMiB, 'a')},
+    {"abab, ab..abb", repeated("ab", 14) + "b", repeated("ab", kMiB)},
+    {"aabaab, aab..aaa", repeated("aab", 15) + "aaa", repeated("aab", kMiB)},
+    {"abcabc, abc..abd..abc", repeated("abc", 24) + "abd" + repeated("abc", 24),
+     repeated("abc", kMiB)},
+    {"random ab, 32 bytes", randomOver("ab", 32, 7), randomOver("ab", kMiB, 8)},
+    {"random acgt, 20 bytes", randomOver("acgt", 20, 9), randomOver("acgt", kMiB, 10)},
+};
+
+void memmemRow(benchmark::State &state, const SearchShape *shape) {
+  const auto start = std::chrono::steady_clock::now();
+  for (auto _ : state) {
+    benchmark::DoNotOptimize(::memmem(shape->text.data(), shape->text.size(), shape->needle.data(),
+                                      shape->needle.size()));
+  }
+  const std::chrono::duration<double, std::nano> spent = std::chrono::steady_clock::now() - start;
+  const double ns = spent.count() / static_cast<double>(state.iterations());
+  setReferenceTime(std::string("memmem ") + shape->name, ns);
+  setRatio(state, "x memmove", ns, "memmove");
+  state.SetBytesProcessed(state.iterations() * static_cast<std::int64_t>(shape->text.size()));
+}
+
+// A 1 MiB row with its ratios; `shape` names the memmem row beside it.
+void ratioRow(benchmark::State &state, const char *routine, const std::vector<Value> &inputs,
+              const Value &result, const char *shape) {
+  const double ns = run(state, routine, inputs, result, kMiB);
+  setRatio(state, "x memmove", ns, "memmove");
+  if (shape != nullptr) setRatio(state, "x memmem", ns, std::string("memmem ") + shape);
+}
+
+void registerShapeRows() {
+  benchmark::RegisterBenchmark("memmove/1 MiB (reference)", memmoveMiB);
+  for (const SearchShape &shape : kShapes) {
+    const std::string name = std::string("1 MiB of ") + shape.name;
+    benchmark::RegisterBenchmark(("memmem/" + name).c_str(), memmemRow, &shape);
+    benchmark::RegisterBenchmark(("LOCATE4/" + name).c_str(), [&shape](benchmark::State &s) {
+      ratioRow(s, "CLI_udfLOCATE4", {lob(shape.needle), lob(shape.text)}, number(0), shape.name);
+    });
+    benchmark::RegisterBenchmark(("REPLACE2/" + name).c_str(), [&shape](benchmark::State &s) {
+      ratioRow(s, "CLI_udfREPLACE2", {lob(shape.text), lob(shape.needle), lob("yz")}, lobArea(),
+               shape.name);
+    });
+  }
+  // Many matches: one every 100 bytes, and one at every byte, replaced by
+  // one byte and by none.
+  const std::string as(kMiB, 'a');
+  benchmark::RegisterBenchmark("REPLACE2/1 MiB, a match every 100 bytes", [](benchmark::State &s) {
+    ratioRow(s, "CLI_udfREPLACE2", {lob(everyHundred(kMiB)), lob("x"), lob("y")}, lobArea(),
+             nullptr);
+  });
+  benchmark::RegisterBenchmark(
+      "REPLACE2/1 MiB, a match at every byte, by one byte", [as](benchmark::State &s) {
+        ratioRow(s, "CLI_udfREPLACE2", {lob(as), lob("a"), lob("b")}, lobArea(), nullptr);
+      });
+  benchmark::RegisterBenchmark(
+      "REPLACE2/1 MiB, a match at every byte, by none", [as](benchmark::State &s) {
+        ratioRow(s, "CLI_udfREPLACE2", {lob(as), lob("a"), lob("")}, lobArea(), nullptr);
+      });
+  // Here the result is the 1 MiB.
+  benchmark::RegisterBenchmark(
+      "REPLACE2/512 KiB, a match at every byte, by two bytes", [](benchmark::State &s) {
+        ratioRow(s, "CLI_udfREPLACE2", {lob(std::string(kMiB / 2, 'a')), lob("a"), lob("bc")},
+                 lobArea(), nullptr);
+      });
+}
+
+// Short texts, as SQL hands them row by row.
+struct SearchRow {
+  const char *name, *routine;
+  std::vector<Value> inputs;
+  Value result;
+};
+const SearchRow kSearchRows[] = {
+    {"LOCATE1/20-byte text",
+     "CLI_udfLOCATE1",
+     {text("fox"), text(words(20)), number(1)},
+     number(0)},
+    {"LOCATE3/20-byte text", "CLI_udfLOCATE3", {text("fox"), text(words(20))}, number(0)},
+    {"REPLACE1/20-byte text",
+     "CLI_udfREPLACE1",
+     {text(words(20)), text("o"), text("00")},
+     textArea()},
+    {"INSERT1/20-byte text",
+     "CLI_udfINSERT1",
+     {text(words(20)), number(5), number(3), text("XYZ")},
+     textArea()},
+    {"SOUNDEX/10-byte name", "CLI_udfSOUNDEX", {text("Washington")}, textArea()},
+    {"DIFFERENCE/two names", "CLI_udfDIFFERENCE", {text("Ashcraft"), text("Ashcroft")}, number(0)},
+};
+
+}  // namespace
+
+void registerSearchRows() {
+  registerShapeRows();
+  for (const SearchRow &r : kSearchRows) {
+    benchmark::RegisterBenchmark(
+        r.name, [&r](benchmark::State &s) { run(s, r.routine, r.inputs, r.result); });
+  }
+}
+
+}  // namespace orv::bench
