@@ -13,6 +13,8 @@
 #include <string>
 #include <string_view>
 
+#include "catalogue/catalogue.hpp"
+#include "frame/call.hpp"
 #include "models/duration.hpp"
 #include "support/frame_call.hpp"
 
@@ -20,9 +22,6 @@ namespace {
 
 using namespace orv::test;
 using namespace std::chrono;
-
-using DateExport = void (*)(char *, std::int32_t *, std::int16_t *, std::int16_t *, char *,
-                            const char *, const char *, char *);
 
 // The numbers a date gives, from <chrono> alone.
 struct Oracle {
@@ -85,17 +84,49 @@ TEST(DateNumbers, AgreeWithChronoOnEveryDateOfTheCalendar) {
       {"CLI_udfDAYOFWEEK1", "CLI_udfDAYOFWEEK2", &Oracle::dayOfWeek},
       {"CLI_udfDAYOFWEEK_ISO1", "CLI_udfDAYOFWEEK_ISO2", &Oracle::isoDayOfWeek},
   };
-  std::array<std::array<DateExport, 2>, std::size(routines)> fns{};
+  // Each export is laid out once over the same buffers, and the loop only
+  // changes what they hold: every one of these takes a text and gives a
+  // 32-bit number, so all have the same count of arguments.
+  constexpr std::size_t kArguments =
+      cli::catalogue::argumentCount(*cli::catalogue::find("CLI_udfJULIAN_DAY2"));
+  char text[40];
+  std::int32_t got = -1;
+  std::int16_t ind[2] = {};
+  char sqlstate[6] = {};
+  char message[16] = {};
+  void *const inputs[] = {text};
+  void *const results[] = {&got};
+  std::int16_t *const inputIndicators[] = {&ind[0]};
+  std::int16_t *const resultIndicators[] = {&ind[1]};
+  cli::call::Frame frame;
+  frame.inputs = inputs;
+  frame.results = results;
+  frame.inputIndicators = inputIndicators;
+  frame.resultIndicators = resultIndicators;
+  frame.sqlstate = sqlstate;
+  frame.functionName = "";
+  frame.specificName = "";
+  frame.message = message;
+  struct Laid {
+    void *fn = nullptr;
+    void *args[cli::call::kMaxArguments] = {};
+  };
+  std::array<std::array<Laid, 2>, std::size(routines)> fns{};
   for (std::size_t r = 0; r < std::size(routines); ++r) {
-    fns[r] = {reinterpret_cast<DateExport>(exportAddress(routines[r].text)),
-              reinterpret_cast<DateExport>(exportAddress(routines[r].part))};
-    ASSERT_TRUE(fns[r][0] != nullptr && fns[r][1] != nullptr);
+    for (std::size_t form = 0; form < 2; ++form) {
+      const char *name = form == 0 ? routines[r].text : routines[r].part;
+      const cli::catalogue::Routine *row = cli::catalogue::find(name);
+      ASSERT_NE(row, nullptr) << name;
+      ASSERT_EQ(cli::catalogue::argumentCount(*row), kArguments) << name;
+      fns[r][form].fn = exportAddress(name);
+      cli::call::layOut(*row, frame, fns[r][form].args);
+    }
+    ASSERT_TRUE(fns[r][0].fn != nullptr && fns[r][1].fn != nullptr);
   }
   // Each date in full width, in short fields and with a time of day behind
   // it; trailing blanks on some.  The time must not change the number.
   const char *times[] = {"", "-23.59.59.999999", " 12:30:15", "   "};
   int failures = 0;
-  std::int16_t ind[2] = {};
   for (sys_days day = sys_days{year{1} / January / 1}; day <= sys_days{year{9999} / December / 31};
        day += days{1}) {
     const Oracle want = oracle(day);
@@ -103,13 +134,12 @@ TEST(DateNumbers, AgreeWithChronoOnEveryDateOfTheCalendar) {
     const auto n = static_cast<unsigned>(day.time_since_epoch().count());
     for (std::size_t r = 0; r < std::size(routines); ++r) {
       for (int form = 0; form < 2; ++form) {
-        char text[40];
-        char sqlstate[6] = {};
-        char message[16] = {};
+        std::memset(sqlstate, 0, sizeof sqlstate);
+        std::memset(message, 0, sizeof message);
         spell(text, ymd, ((n + r) & 1) != 0, times[(n + r + static_cast<unsigned>(form)) % 4]);
-        std::int32_t got = -1;
-        fns[r][static_cast<std::size_t>(form)](text, &got, &ind[0], &ind[1], sqlstate, "", "",
-                                               message);
+        got = -1;
+        const Laid &e = fns[r][static_cast<std::size_t>(form)];
+        cli::call::invokeWith<kArguments>(e.fn, e.args);
         if ((got != want.*routines[r].expected || sqlstate[0] != 0) && ++failures <= 10) {
           ADD_FAILURE() << routines[r].part << "/" << form << " on " << text << ": " << got
                         << ", want " << want.*routines[r].expected << " " << sqlstate;
@@ -390,30 +420,17 @@ TEST(DateGrammar, AgreesWithAModelOnMutatedTexts) {
 
 // The date routines cut trailing blanks in the caller's buffer.
 TEST(DateText, IsTrimmedInTheCallersBuffer) {
-  auto fn = reinterpret_cast<DateExport>(exportAddress("CLI_udfWEEK2"));
-  ASSERT_NE(fn, nullptr);
+  ASSERT_NE(exportAddress("CLI_udfWEEK2"), nullptr);
   for (const char *input : {"2001-12-31  ", "2001-13-31  "}) {
     char buffer[16] = {};
     std::strcpy(buffer, input);
-    std::int32_t result = 0;
-    std::int16_t ind[2] = {};
-    char status[6 + 16] = {};  // SQLSTATE, then the message
-    fn(buffer, &result, &ind[0], &ind[1], status, "", "", status + 6);
+    call("CLI_udfWEEK2", {placedAt(buffer)}, intArea());
     EXPECT_EQ(std::string(buffer, 12), std::string(input, 10) + std::string("\0 ", 2)) << input;
   }
   // TIMESTAMPDIFF reads its duration as it stands and leaves it so.
-  using DiffExport =
-      void (*)(const std::int32_t *, char *, std::int32_t *, std::int16_t *, std::int16_t *,
-               std::int16_t *, char *, const char *, const char *, char *);
-  auto diff = reinterpret_cast<DiffExport>(exportAddress("CLI_udfTIMESTAMPDIFF"));
-  ASSERT_NE(diff, nullptr);
+  ASSERT_NE(exportAddress("CLI_udfTIMESTAMPDIFF"), nullptr);
   char duration[] = "1.5  ";
-  const std::int32_t code = 2;
-  std::int32_t seconds = 0;
-  std::int16_t ind[3] = {};
-  char status[6 + 16] = {};
-  diff(&code, duration, &seconds, &ind[0], &ind[1], &ind[2], status, "", "", status + 6);
-  EXPECT_EQ(seconds, 1);
+  EXPECT_EQ(call("CLI_udfTIMESTAMPDIFF", {i32(2), placedAt(duration)}, intArea()).number, 1);
   EXPECT_EQ(std::string(duration, sizeof duration), std::string("1.5  ", sizeof duration));
 }
 

@@ -11,6 +11,8 @@
 #include <string>
 #include <vector>
 
+#include "catalogue/catalogue.hpp"
+#include "frame/call.hpp"
 #include "support/frame_call.hpp"
 #include "support/platform.hpp"
 
@@ -135,16 +137,28 @@ TEST_F(Names, GiveTheServersNamesForEachReader) {
 
 TEST_F(Names, ValidateTheDateButFetchNothingWithoutTheBlock) {
   EXPECT_EQ(name("CLI_udfDAYNAME1", "2001-13-05", nullptr), fails("04"));
-  using Export = void (*)(char *, char *, std::int16_t *, std::int16_t *, char *, const char *,
-                          const char *, char *, void *);
-  const auto fn = reinterpret_cast<Export>(exportAddress("CLI_udfMONTHNAME2"));
+  void *fn = exportAddress("CLI_udfMONTHNAME2");
   ASSERT_NE(fn, nullptr);
   char date[] = "2001-01-05";
   char result[102];
   std::memset(result, 'R', sizeof result);
   std::int16_t ind[2] = {7, 7};
   char status[6 + 70] = {};
-  fn(date, result, &ind[0], &ind[1], status, "", "", status + 6, nullptr);
+  void *const inputs[] = {date};
+  void *const results[] = {result};
+  std::int16_t *const inputIndicators[] = {&ind[0]};
+  std::int16_t *const resultIndicators[] = {&ind[1]};
+  cli::call::Frame f;
+  f.inputs = inputs;
+  f.results = results;
+  f.inputIndicators = inputIndicators;
+  f.resultIndicators = resultIndicators;
+  f.sqlstate = status;
+  f.functionName = "";
+  f.specificName = "";
+  f.message = status + 6;
+  f.dbinfo = nullptr;  // no database information block
+  cli::call::call(*cli::catalogue::find("CLI_udfMONTHNAME2"), fn, f);
   EXPECT_EQ(std::string(result, sizeof result), std::string(sizeof result, 'R'));
   EXPECT_EQ(status[0], '\0');
 }
@@ -160,11 +174,6 @@ TEST_F(Names, ConvertIntoTheDatabasesCodePage) {
 }
 
 // ---- VEBLOB_CP ------------------------------------------------------------
-
-using Veblob = void (*)(const unsigned char *, const std::int32_t *, const std::int32_t *,
-                        const std::int32_t *, unsigned char *, const std::int16_t *, std::int16_t *,
-                        std::int16_t *, std::int16_t *, std::int16_t *, char *, const char *,
-                        const char *, char *);
 
 struct Copied {
   std::string data;     // the result's data, by its length word, when it was set
@@ -187,8 +196,11 @@ std::string record(unsigned char tag, const std::string &text, bool bigEndian = 
 
 Copied copy(const char *routine, const std::string &object, std::int32_t from, std::int32_t to,
             std::int32_t order, bool null = false) {
-  const auto fn = reinterpret_cast<Veblob>(exportAddress(routine));
+  const cli::catalogue::Routine *row = cli::catalogue::find(routine);
+  void *fn = exportAddress(routine);
+  EXPECT_NE(row, nullptr);
   EXPECT_NE(fn, nullptr);
+  if (row == nullptr || fn == nullptr) return {};
   std::vector<unsigned char> in(4 + object.size());
   const auto n = static_cast<std::uint32_t>(object.size());
   std::memcpy(in.data(), &n, 4);
@@ -196,8 +208,20 @@ Copied copy(const char *routine, const std::string &object, std::int32_t from, s
   std::vector<unsigned char> out(4 + 1000000 + 64, 0xCD);
   std::int16_t ind[5] = {static_cast<std::int16_t>(null ? -1 : 0), 0, 0, 0, 0x5A5A};
   char sqlstate[6] = {}, message[16] = {};
-  fn(in.data(), &from, &to, &order, out.data(), &ind[0], &ind[1], &ind[2], &ind[3], &ind[4],
-     sqlstate, "", "", message);
+  void *const inputs[] = {in.data(), &from, &to, &order};
+  void *const results[] = {out.data()};
+  std::int16_t *const inputIndicators[] = {&ind[0], &ind[1], &ind[2], &ind[3]};
+  std::int16_t *const resultIndicators[] = {&ind[4]};
+  cli::call::Frame f;
+  f.inputs = inputs;
+  f.results = results;
+  f.inputIndicators = inputIndicators;
+  f.resultIndicators = resultIndicators;
+  f.sqlstate = sqlstate;
+  f.functionName = "";
+  f.specificName = "";
+  f.message = message;
+  cli::call::call(*row, fn, f);
   Copied c;
   c.indicator = ind[4];
   if (sqlstate[0] != '\0') {

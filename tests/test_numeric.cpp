@@ -11,6 +11,8 @@
 #include <random>
 #include <vector>
 
+#include "catalogue/catalogue.hpp"
+#include "frame/call.hpp"
 #include "frame/cliudf.h"
 #include "frame/platform.hpp"
 #include "support/frame_call.hpp"
@@ -347,25 +349,43 @@ TEST(FloatingPoint, IsNotContracted) {
 
 // ---- RAND -------------------------------------------------------------------
 
-using Rand1 = void (*)(double *, std::int16_t *, char *, const char *, const char *, char *);
-using Rand2 = void (*)(const std::int32_t *, double *, std::int16_t *, std::int16_t *, char *,
-                       const char *, const char *, char *, unsigned char *);
+namespace cat = cli::catalogue;
 
+constexpr auto kRand1 = static_cast<std::size_t>(cat::find("CLI_udfRAND1") - cat::kRoutines);
+constexpr auto kRand2 = static_cast<std::size_t>(cat::find("CLI_udfRAND2") - cat::kRoutines);
+
+// Calls of RAND1 and RAND2 through one frame, the status buffers shared,
+// so that a status stored by any call shows at the end.  RAND1 reads only
+// its result's part of the frame.
 struct RandomCalls {
-  Rand1 rand1 = reinterpret_cast<Rand1>(exportAddress("CLI_udfRAND1"));
-  Rand2 rand2 = reinterpret_cast<Rand2>(exportAddress("CLI_udfRAND2"));
+  void *rand1 = exportAddress("CLI_udfRAND1");
+  void *rand2 = exportAddress("CLI_udfRAND2");
+  std::int32_t seed = 0;
+  double r = -1;
   std::int16_t ind[2] = {};
   char sqlstate[6] = {};
   char message[70] = {};
+  void *const values[2] = {&seed, &r};
+  std::int16_t *const indicators[2] = {&ind[0], &ind[1]};
+  cli::call::Frame frame{.inputs = &values[0],
+                         .results = &values[1],
+                         .inputIndicators = &indicators[0],
+                         .resultIndicators = &indicators[1],
+                         .sqlstate = sqlstate,
+                         .functionName = "",
+                         .specificName = "",
+                         .message = message};
 
   double one() {
-    double r = -1;
-    rand1(&r, &ind[0], sqlstate, "", "", message);
+    r = -1;
+    cli::call::call<kRand1>(rand1, frame);
     return r;
   }
-  double seeded(std::int32_t seed, unsigned char *scratchpad) {
-    double r = -1;
-    rand2(&seed, &r, &ind[0], &ind[1], sqlstate, "", "", message, scratchpad);
+  double seeded(std::int32_t value, unsigned char *scratchpad) {
+    seed = value;
+    r = -1;
+    frame.scratchpad = scratchpad;
+    cli::call::call<kRand2>(rand2, frame);
     return r;
   }
 };

@@ -8,6 +8,8 @@
 #include <string>
 #include <vector>
 
+#include "catalogue/catalogue.hpp"
+#include "frame/call.hpp"
 #include "frame/cliudf.h"
 #include "support/frame_call.hpp"
 
@@ -68,30 +70,30 @@ class Tables : public ::testing::Test {
     std::int16_t r16[4] = {};
     std::int16_t inputIndicator = 0;
     const char *name = threads ? "CLI_udfFmpThreads" : "CLI_udfFmpRows";
-    void *fn = exportAddress(name);
-    if (threads) {
-      using Fn = void (*)(const std::int32_t *, std::int32_t *, std::int32_t *, std::int32_t *,
-                          std::int32_t *, std::int32_t *, std::int32_t *, std::int16_t *,
-                          std::int16_t *, std::int16_t *, std::int16_t *, std::int16_t *,
-                          std::int16_t *, std::int16_t *, char *, const char *, const char *,
-                          char *, unsigned char *, const std::int32_t *, CLI_tableCallback);
-      std::int16_t *n = c.indicators.data();
-      reinterpret_cast<Fn>(fn)(&selector, &r32[0], &r32[1], &r32[2], &r32[3], &r32[4], &r32[5],
-                               &inputIndicator, &n[0], &n[1], &n[2], &n[3], &n[4], &n[5], sqlstate,
-                               "", "", message, scratchpad.data(), &callType, callback);
-      for (std::size_t i = 0; i < 6; ++i) c.row[i] = r32[i];
-    } else {
-      using Fn =
-          void (*)(std::int32_t *, std::int32_t *, std::int16_t *, std::int16_t *, std::int16_t *,
-                   std::int16_t *, std::int16_t *, std::int16_t *, std::int16_t *, std::int16_t *,
-                   std::int16_t *, std::int16_t *, char *, const char *, const char *, char *,
-                   unsigned char *, const std::int32_t *, CLI_tableCallback);
-      std::int16_t *n = c.indicators.data();
-      reinterpret_cast<Fn>(fn)(&r32[0], &r32[1], &r16[0], &r16[1], &r16[2], &r16[3], &n[0], &n[1],
-                               &n[2], &n[3], &n[4], &n[5], sqlstate, "", "", message,
-                               scratchpad.data(), &callType, callback);
-      c.row = {r32[0], r32[1], r16[0], r16[1], r16[2], r16[3]};
+    // FmpThreads gives six 32-bit columns, FmpRows two and then four
+    // 16-bit ones.
+    void *const inputs[] = {&selector};
+    std::int16_t *const inputIndicators[] = {&inputIndicator};
+    std::array<void *, 6> results{};
+    std::array<std::int16_t *, 6> resultIndicators{};
+    for (std::size_t i = 0; i < 6; ++i) {
+      results[i] = threads || i < 2 ? static_cast<void *>(&r32[i]) : &r16[i - 2];
+      resultIndicators[i] = &c.indicators[i];
     }
+    cli::call::Frame f;
+    f.inputs = inputs;
+    f.results = results.data();
+    f.inputIndicators = inputIndicators;
+    f.resultIndicators = resultIndicators.data();
+    f.sqlstate = sqlstate;
+    f.functionName = "";
+    f.specificName = "";
+    f.message = message;
+    f.scratchpad = scratchpad.data();
+    f.callType = &callType;
+    f.callback = callback;
+    cli::call::call(*cli::catalogue::find(name), exportAddress(name), f);
+    for (std::size_t i = 0; i < 6; ++i) c.row[i] = threads || i < 2 ? r32[i] : r16[i - 2];
     EXPECT_EQ(inputIndicator, 0);
     c.sqlstate = sqlstate;
     c.message = message;

@@ -272,6 +272,7 @@ constexpr const Routine *find(std::string_view symbol) {
 
 static_assert(argumentCount(*find("CLI_udfFmpRows")) == 19, "FmpRows has 19 arguments");
 static_assert(argumentCount(*find("CLI_udfFmpThreads")) == 21, "FmpThreads has 21 arguments");
-static_assert(argumentCount(*find("SQLCACHE_SNAPSHOT")) == 42, "SQLCACHE_SNAPSHOT has 42 arguments");
+static_assert(argumentCount(*find("SQLCACHE_SNAPSHOT")) == 42,
+              "SQLCACHE_SNAPSHOT has 42 arguments");
 
 }  // namespace cli::catalogue

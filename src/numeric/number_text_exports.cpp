@@ -10,7 +10,6 @@
 
 namespace {
 
-
 // The white space that CHARTODOUBLE cuts from the end.
 constexpr bool isTrailingSpace(char c) {
   return c == ' ' || c == '\t' || c == '\n' || c == '\r' || c == '\v' || c == '\f';
