@@ -231,8 +231,12 @@ std::string routinesHeader() {
       "#include <cstdint>\n\n"
       "#include \"frame/frame.hpp\"\n\n"
       "namespace cli::routine {\n";
-  for (const Routine &r : kRoutines) out += "\n" + logicDeclaration(r);
-  return out + "\n}  // namespace cli::routine\n";
+  for (const Routine &r : kRoutines) {
+    out += '\n';
+    out += logicDeclaration(r);
+  }
+  out += "\n}  // namespace cli::routine\n";
+  return out;
 }
 
 std::string versionScript() {

@@ -141,9 +141,10 @@ inline void call(const cat::Routine &row, void *fn, const Frame &f) noexcept {
 // count are constants, so the call is as direct as a hand-written one.
 template <std::size_t Row>
 void call(void *fn, const Frame &f) noexcept {
-  constexpr const cat::Routine &row = cat::kRoutines[Row];
-  constexpr std::size_t n = cat::inputCount(row), m = cat::resultCount(row);
-  constexpr std::size_t k = cat::argumentCount(row);
+  constexpr std::size_t n = cat::inputCount(cat::kRoutines[Row]);
+  constexpr std::size_t m = cat::resultCount(cat::kRoutines[Row]);
+  constexpr std::size_t k = cat::argumentCount(cat::kRoutines[Row]);
+  constexpr cat::Frame frame = cat::kRoutines[Row].frame;
   [&]<std::size_t... I, std::size_t... J>(std::index_sequence<I...>, std::index_sequence<J...>) {
     void *args[k] = {f.inputs[I]...,
                      f.results[J]...,
@@ -154,14 +155,14 @@ void call(void *fn, const Frame &f) noexcept {
                      const_cast<char *>(f.specificName),
                      f.message};
     constexpr std::size_t extras = 2 * (n + m) + 4;
-    if constexpr (row.frame == cat::Frame::dbinfo) args[extras] = const_cast<void *>(f.dbinfo);
-    if constexpr (row.frame != cat::Frame::plain && row.frame != cat::Frame::dbinfo) {
+    if constexpr (frame == cat::Frame::dbinfo) args[extras] = const_cast<void *>(f.dbinfo);
+    if constexpr (frame != cat::Frame::plain && frame != cat::Frame::dbinfo) {
       args[extras] = f.scratchpad;
     }
-    if constexpr (row.frame == cat::Frame::table || row.frame == cat::Frame::tableCallback) {
+    if constexpr (frame == cat::Frame::table || frame == cat::Frame::tableCallback) {
       args[extras + 1] = f.callType;
     }
-    if constexpr (row.frame == cat::Frame::tableCallback) {
+    if constexpr (frame == cat::Frame::tableCallback) {
       args[extras + 2] = reinterpret_cast<void *>(f.callback);
     }
     invokeWith<k>(fn, args);

@@ -69,10 +69,10 @@ auto resultView(Pointer p) noexcept {
 
 template <std::size_t R, class Arguments>
 auto inputViews(const Arguments &a) noexcept {
-  constexpr const cat::Routine &r = cat::kRoutines[R];
-  constexpr std::size_t n = inputCount(r), m = resultCount(r);
+  constexpr std::size_t n = inputCount(cat::kRoutines[R]), m = resultCount(cat::kRoutines[R]);
+  constexpr bool handlesNull = (cat::kRoutines[R].properties & cat::kHandlesNull) != 0;
   return [&]<std::size_t... I>(std::index_sequence<I...>) {
-    if constexpr ((r.properties & cat::kHandlesNull) != 0) {
+    if constexpr (handlesNull) {
       return std::tuple{Nullable<decltype(inputView<R, I>(std::get<I>(a)))>{
           inputView<R, I>(std::get<I>(a)), *std::get<n + m + I>(a)}...};
     } else {

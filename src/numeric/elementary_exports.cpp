@@ -95,7 +95,7 @@ Answer<double> routine::COT(double x) noexcept { return cotangentOf(x); }
 Answer<double> routine::ASIN(double x) noexcept { return arcSineOf(x); }
 Answer<double> routine::ACOS(double x) noexcept { return arcCosineOf(x); }
 Answer<double> routine::ATAN(double x) noexcept { return arcTangentOf(x); }
-Answer<double> routine::ATAN2(double x, double y) noexcept { return arcTangentOfPair(x, y); }
+Answer<double> routine::ATAN2(double a, double b) noexcept { return arcTangentOfPair(a, b); }
 Answer<double> routine::LOG(double x) noexcept { return logarithmOf(x); }
 Answer<double> routine::LOG10(double x) noexcept { return decimalLogarithmOf(x); }
 Answer<double> routine::EXP(double x) noexcept { return exponentialOf(x); }

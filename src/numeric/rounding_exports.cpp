@@ -149,21 +149,21 @@ static_assert(truncateInt64(-9223372036854775807 - 1, -18).value == -90000000000
 
 namespace cli {
 
-Answer<double> routine::ROUND1(double x, std::int32_t y) noexcept { return roundDouble(x, y); }
-Answer<std::int32_t> routine::ROUND2(std::int32_t x, std::int32_t y) noexcept {
-  return cutInt32<true>(x, y);
+Answer<double> routine::ROUND1(double x, std::int32_t n) noexcept { return roundDouble(x, n); }
+Answer<std::int32_t> routine::ROUND2(std::int32_t x, std::int32_t n) noexcept {
+  return cutInt32<true>(x, n);
 }
-Answer<std::int64_t> routine::ROUND5(std::int64_t x, std::int32_t y) noexcept {
-  return roundInt64(x, y);
+Answer<std::int64_t> routine::ROUND5(std::int64_t x, std::int32_t n) noexcept {
+  return roundInt64(x, n);
 }
-Answer<double> routine::TRUNCATE1(double x, std::int32_t y) noexcept {
-  return truncateDouble(x, y);
+Answer<double> routine::TRUNCATE1(double x, std::int32_t n) noexcept {
+  return truncateDouble(x, n);
 }
-Answer<std::int32_t> routine::TRUNCATE2(std::int32_t x, std::int32_t y) noexcept {
-  return cutInt32<false>(x, y);
+Answer<std::int32_t> routine::TRUNCATE2(std::int32_t x, std::int32_t n) noexcept {
+  return cutInt32<false>(x, n);
 }
-Answer<std::int64_t> routine::TRUNCATE5(std::int64_t x, std::int32_t y) noexcept {
-  return truncateInt64(x, y);
+Answer<std::int64_t> routine::TRUNCATE5(std::int64_t x, std::int32_t n) noexcept {
+  return truncateInt64(x, n);
 }
 
 }  // namespace cli

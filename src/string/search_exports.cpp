@@ -270,17 +270,17 @@ Report routine::REPLACE2(LobIn source, LobIn search, LobIn replacement, LobOut r
   return replace(source, search, replacement, result);
 }
 
-Report routine::INSERT1(TextIn source, std::int32_t start, std::int32_t length, TextIn added,
+Report routine::INSERT1(TextIn source, std::int32_t start, std::int32_t length, TextIn insert,
                         TextOut result) noexcept {
-  const Bytes s = source.bytes(), i = added.bytes();
+  const Bytes s = source.bytes(), i = insert.bytes();
   const Sysfun code = insertCheck(false, s.size, start, length, i.size, result.limit());
   if (code != Sysfun::none) return code;
   return spliced(s, start, length, i, result);
 }
 
-Report routine::INSERT2(LobIn source, std::int32_t start, std::int32_t length, LobIn added,
+Report routine::INSERT2(LobIn source, std::int32_t start, std::int32_t length, LobIn insert,
                         LobOut result) noexcept {
-  const Bytes s = source.bytes(), i = added.bytes();
+  const Bytes s = source.bytes(), i = insert.bytes();
   const Sysfun code = insertCheck(true, s.size, start, length, i.size, result.capacity());
   if (code != Sysfun::none) return code;
   return spliced(s, start, length, i, result);
