@@ -203,19 +203,14 @@ std::string exportsSource() {
   std::string out =
       "// Written by orv_generate from the catalogue; do not edit.\n"
       "#include \"frame/shim.hpp\"\n"
-      "#include \"routines.hpp\"\n\n"
-      "#if defined(_WIN32)\n"
-      "#define ORV_EXPORT extern \"C\" __declspec(dllexport)\n"
-      "#else\n"
-      "#define ORV_EXPORT extern \"C\" __attribute__((visibility(\"default\")))\n"
-      "#endif\n";
+      "#include \"routines.hpp\"\n";
   std::size_t row = 0;
   for (const Routine &r : kRoutines) {
     const std::vector<std::string> p = parameters(r);
     std::vector<std::string> names;
     names.reserve(p.size());
     for (const std::string &s : p) names.push_back(declared(s));
-    out += "\nORV_EXPORT void " + std::string(r.symbol) + "(" + joined(p, ", ") + ") noexcept {\n" +
+    out += "\nCLI_EXPORT void " + std::string(r.symbol) + "(" + joined(p, ", ") + ") noexcept {\n" +
            "  cli::shim::run<" + std::to_string(row) + ">(cli::routine::" + logicName(r) + ", " +
            joined(names, ", ") + ");\n}\n";
     ++row;
