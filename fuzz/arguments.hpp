@@ -74,22 +74,22 @@ class Arguments {
   // The database information block; null is a value an engine may pass.
   Arguments &dbinfo(const void *block) {
     frame_.dbinfo = block;
-    extras_ |= kDbinfo;
+    extras_ |= cat::kDbinfo;
     return *this;
   }
   Arguments &scratchpad(const Block &b) {
     frame_.scratchpad = b.data();
-    extras_ |= kScratchpad;
+    extras_ |= cat::kScratchpad;
     return *this;
   }
   Arguments &callType(const Block &b) {
     frame_.callType = reinterpret_cast<std::int32_t *>(b.data());
-    extras_ |= kCallType;
+    extras_ |= cat::kCallType;
     return *this;
   }
   Arguments &callback(CLI_tableCallback entry) {
     frame_.callback = entry;
-    extras_ |= kCallback;
+    extras_ |= cat::kCallback;
     return *this;
   }
 
@@ -101,7 +101,8 @@ class Arguments {
     if (inputCount_ != cat::inputCount(row) || resultCount_ != cat::resultCount(row)) {
       broken(row.symbol, "values other than the row's slots");
     }
-    if (extras_ != extrasOf(row.frame)) broken(row.symbol, "extras other than the row's frame");
+    if (extras_ != cat::extrasOf(row.frame))
+      broken(row.symbol, "extras other than the row's frame");
     if (frame_.sqlstate == nullptr) broken(row.symbol, "no status buffers");
     frame_.inputs = inputs_.data();
     frame_.results = results_.data();
@@ -113,24 +114,6 @@ class Arguments {
   }
 
  private:
-  enum : unsigned { kDbinfo = 1u, kScratchpad = 2u, kCallType = 4u, kCallback = 8u };
-
-  static constexpr unsigned extrasOf(cat::Frame frame) {
-    switch (frame) {
-      case cat::Frame::plain:
-        return 0;
-      case cat::Frame::dbinfo:
-        return kDbinfo;
-      case cat::Frame::scratchpad:
-        return kScratchpad;
-      case cat::Frame::table:
-        return kScratchpad | kCallType;
-      case cat::Frame::tableCallback:
-        return kScratchpad | kCallType | kCallback;
-    }
-    return 0;
-  }
-
   std::array<void *, cat::kMaxInputs> inputs_{};
   std::array<void *, cat::kMaxResults> results_{};
   std::array<std::int16_t *, cat::kMaxInputs> inputIndicators_{};

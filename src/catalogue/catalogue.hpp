@@ -11,6 +11,7 @@
 // and one logic function with the signature that the row declares.
 #pragma once
 
+#include <bit>
 #include <cstddef>
 #include <cstdint>
 #include <string_view>
@@ -242,19 +243,28 @@ constexpr std::size_t countSlots(const Slot (&slots)[N]) {
 constexpr std::size_t inputCount(const Routine &r) { return countSlots(r.inputs); }
 constexpr std::size_t resultCount(const Routine &r) { return countSlots(r.results); }
 
-constexpr std::size_t extraCount(Frame f) {
+// The extras that a frame variant has, as bits; the bits run in the order
+// in which the extras follow the diagnostic message buffer.
+enum : unsigned { kDbinfo = 1u, kScratchpad = 2u, kCallType = 4u, kCallback = 8u };
+
+constexpr unsigned extrasOf(Frame f) {
   switch (f) {
     case Frame::plain:
       return 0;
     case Frame::dbinfo:
+      return kDbinfo;
     case Frame::scratchpad:
-      return 1;
+      return kScratchpad;
     case Frame::table:
-      return 2;
+      return kScratchpad | kCallType;
     case Frame::tableCallback:
-      return 3;
+      return kScratchpad | kCallType | kCallback;
   }
   return 0;
+}
+
+constexpr std::size_t extraCount(Frame f) {
+  return static_cast<std::size_t>(std::popcount(extrasOf(f)));
 }
 
 // Number of arguments of the export: values, indicators, the four status

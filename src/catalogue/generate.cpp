@@ -101,6 +101,20 @@ std::string resultPointer(const Slot &s) {
   }
 }
 
+// The extras, in their frame order: the export's parameter and the view
+// that the routine's logic takes in its place.
+struct Extra {
+  unsigned bit;
+  const char *argument;
+  const char *view;
+};
+constexpr Extra kExtras[] = {
+    {cli::catalogue::kDbinfo, "const unsigned char *dbinfo", "DbInfo dbinfo"},
+    {cli::catalogue::kScratchpad, "unsigned char *scratchpad", "Scratchpad scratchpad"},
+    {cli::catalogue::kCallType, "const int32_t *call_type", "CallType call_type"},
+    {cli::catalogue::kCallback, "CLI_tableCallback callback", "CLI_tableCallback callback"},
+};
+
 // The export's parameters, in the frame's order.
 std::vector<std::string> parameters(const Routine &r) {
   std::vector<std::string> p;
@@ -113,21 +127,8 @@ std::vector<std::string> parameters(const Routine &r) {
   p.emplace_back("const char *function_name");
   p.emplace_back("const char *specific_name");
   p.emplace_back("char *message");
-  switch (r.frame) {
-    case Frame::plain:
-      break;
-    case Frame::dbinfo:
-      p.emplace_back("const unsigned char *dbinfo");
-      break;
-    case Frame::scratchpad:
-      p.emplace_back("unsigned char *scratchpad");
-      break;
-    case Frame::table:
-    case Frame::tableCallback:
-      p.emplace_back("unsigned char *scratchpad");
-      p.emplace_back("const int32_t *call_type");
-      if (r.frame == Frame::tableCallback) p.emplace_back("CLI_tableCallback callback");
-      break;
+  for (const Extra &e : kExtras) {
+    if ((cli::catalogue::extrasOf(r.frame) & e.bit) != 0) p.emplace_back(e.argument);
   }
   return p;
 }
@@ -179,21 +180,8 @@ std::string logicDeclaration(const Routine &r) {
                    " result");
     if (handlesNull(r)) p.emplace_back("ResultIndicator result_null");
   }
-  switch (r.frame) {
-    case Frame::plain:
-      break;
-    case Frame::dbinfo:
-      p.emplace_back("DbInfo dbinfo");
-      break;
-    case Frame::scratchpad:
-      p.emplace_back("Scratchpad scratchpad");
-      break;
-    case Frame::table:
-    case Frame::tableCallback:
-      p.emplace_back("Scratchpad scratchpad");
-      p.emplace_back("CallType call_type");
-      if (r.frame == Frame::tableCallback) p.emplace_back("CLI_tableCallback callback");
-      break;
+  for (const Extra &e : kExtras) {
+    if ((cli::catalogue::extrasOf(r.frame) & e.bit) != 0) p.emplace_back(e.view);
   }
   return "// " + std::string(r.summary) + "\n" + returned + " " + logicName(r) + "(" +
          joined(p, ", ") + ") noexcept;\n";

@@ -64,24 +64,11 @@ inline std::size_t layOut(const cat::Routine &row, const Frame &f, void **args) 
   args[k++] = const_cast<char *>(f.functionName);
   args[k++] = const_cast<char *>(f.specificName);
   args[k++] = f.message;
-  switch (row.frame) {
-    case cat::Frame::plain:
-      break;
-    case cat::Frame::dbinfo:
-      args[k++] = const_cast<void *>(f.dbinfo);
-      break;
-    case cat::Frame::scratchpad:
-      args[k++] = f.scratchpad;
-      break;
-    case cat::Frame::table:
-    case cat::Frame::tableCallback:
-      args[k++] = f.scratchpad;
-      args[k++] = f.callType;
-      if (row.frame == cat::Frame::tableCallback) {
-        args[k++] = reinterpret_cast<void *>(f.callback);
-      }
-      break;
-  }
+  const unsigned extras = cat::extrasOf(row.frame);
+  if ((extras & cat::kDbinfo) != 0) args[k++] = const_cast<void *>(f.dbinfo);
+  if ((extras & cat::kScratchpad) != 0) args[k++] = f.scratchpad;
+  if ((extras & cat::kCallType) != 0) args[k++] = f.callType;
+  if ((extras & cat::kCallback) != 0) args[k++] = reinterpret_cast<void *>(f.callback);
   return k;
 }
 
@@ -144,7 +131,7 @@ void call(void *fn, const Frame &f) noexcept {
   constexpr std::size_t n = cat::inputCount(cat::kRoutines[Row]);
   constexpr std::size_t m = cat::resultCount(cat::kRoutines[Row]);
   constexpr std::size_t k = cat::argumentCount(cat::kRoutines[Row]);
-  constexpr cat::Frame frame = cat::kRoutines[Row].frame;
+  constexpr unsigned extras = cat::extrasOf(cat::kRoutines[Row].frame);
   [&]<std::size_t... I, std::size_t... J>(std::index_sequence<I...>, std::index_sequence<J...>) {
     void *args[k] = {f.inputs[I]...,
                      f.results[J]...,
@@ -154,16 +141,13 @@ void call(void *fn, const Frame &f) noexcept {
                      const_cast<char *>(f.functionName),
                      const_cast<char *>(f.specificName),
                      f.message};
-    constexpr std::size_t extras = 2 * (n + m) + 4;
-    if constexpr (frame == cat::Frame::dbinfo) args[extras] = const_cast<void *>(f.dbinfo);
-    if constexpr (frame != cat::Frame::plain && frame != cat::Frame::dbinfo) {
-      args[extras] = f.scratchpad;
-    }
-    if constexpr (frame == cat::Frame::table || frame == cat::Frame::tableCallback) {
-      args[extras + 1] = f.callType;
-    }
-    if constexpr (frame == cat::Frame::tableCallback) {
-      args[extras + 2] = reinterpret_cast<void *>(f.callback);
+    // The extras stand in their frame order behind the message.
+    std::size_t at = 2 * (n + m) + 4;
+    if constexpr ((extras & cat::kDbinfo) != 0) args[at++] = const_cast<void *>(f.dbinfo);
+    if constexpr ((extras & cat::kScratchpad) != 0) args[at++] = f.scratchpad;
+    if constexpr ((extras & cat::kCallType) != 0) args[at++] = f.callType;
+    if constexpr ((extras & cat::kCallback) != 0) {
+      args[at++] = reinterpret_cast<void *>(f.callback);
     }
     invokeWith<k>(fn, args);
   }
