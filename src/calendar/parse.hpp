@@ -41,7 +41,7 @@ struct Fields {
 };
 
 // The ten bytes of a date at the head of the text, valid as a date.
-inline bool headDate(const char *t, Fields &f) noexcept {
+[[gnu::always_inline]] inline bool headDate(const char *t, Fields &f) noexcept {
   if (!digitsAt(t, 0, 4) || t[4] != '-' || !digitsAt(t, 5, 7) || t[7] != '-' ||
       !digitsAt(t, 8, 10)) {
     return false;
@@ -65,7 +65,7 @@ struct Clock {
 
 // The 15 bytes "hh.mm.ss.ffffff" behind a date's separator, the points
 // after a hyphen or the colons after a blank, and then the terminator.
-inline bool tailTime(const char *t, Clock &c) noexcept {
+[[gnu::always_inline]] inline bool tailTime(const char *t, Clock &c) noexcept {
   const char separator = t[-1] == '-' ? '.' : t[-1] == ' ' ? ':' : '\0';
   if (separator == '\0' || !digitsAt(t, 0, 2) || t[2] != separator || !digitsAt(t, 3, 5) ||
       t[5] != separator || !digitsAt(t, 6, 8) || t[8] != '.' || !digitsAt(t, 9, 15) ||
@@ -86,7 +86,7 @@ inline bool tailTime(const char *t, Clock &c) noexcept {
 // Whether the general scan would end the date after its ten bytes without
 // trimming anything: at the terminator, or at a separator in a text of at
 // most 32 bytes that does not end in a blank.  What follows is not read.
-inline bool dateEnds(const char *t) noexcept {
+[[gnu::always_inline]] inline bool dateEnds(const char *t) noexcept {
   if (t[10] == '\0') return true;
   if (t[10] != '-' && t[10] != ' ') return false;
   const std::size_t length = 11 + std::strlen(t + 11);
@@ -113,9 +113,9 @@ std::int32_t scanDatePart(char *text, std::int32_t *year, std::int32_t *month,
 // with "04" (the date, or the length) or "06" (the time of day) in `code`.
 // hour, minute and second may be null; they are written only on success.
 // Inline, so that each routine reads the common shapes without a call.
-inline std::int32_t CLI_parseDateText(char *text, std::int32_t *year, std::int32_t *month,
-                                      std::int32_t *day, std::int32_t *hour, std::int32_t *minute,
-                                      std::int32_t *second, char *code) noexcept {
+[[gnu::always_inline]] inline std::int32_t CLI_parseDateText(
+    char *text, std::int32_t *year, std::int32_t *month, std::int32_t *day, std::int32_t *hour,
+    std::int32_t *minute, std::int32_t *second, char *code) noexcept {
   detail::Fields f{};
   detail::Clock c{0, 0, 0};
   if (detail::headDate(text, f) && (text[10] == '\0' || detail::tailTime(text + 11, c))) {
@@ -130,8 +130,9 @@ inline std::int32_t CLI_parseDateText(char *text, std::int32_t *year, std::int32
 
 // Reads the date at the head of the text; what stands behind a separator
 // is not read.  Returns 1 or 0.
-inline std::int32_t CLI_parseDatePart(char *text, std::int32_t *year, std::int32_t *month,
-                                      std::int32_t *day) noexcept {
+[[gnu::always_inline]] inline std::int32_t CLI_parseDatePart(char *text, std::int32_t *year,
+                                                             std::int32_t *month,
+                                                             std::int32_t *day) noexcept {
   detail::Fields f{};
   if (detail::headDate(text, f) && detail::dateEnds(text)) {
     detail::storeDate(f, year, month, day);

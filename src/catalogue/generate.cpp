@@ -199,7 +199,7 @@ std::string exportsSource() {
     names.reserve(p.size());
     for (const std::string &s : p) names.push_back(declared(s));
     out += "\nCLI_EXPORT void " + std::string(r.symbol) + "(" + joined(p, ", ") + ") noexcept {\n" +
-           "  cli::shim::run<" + std::to_string(row) + ">(cli::routine::" + logicName(r) + ", " +
+           "  cli::shim::run<" + std::to_string(row) + ", cli::routine::" + logicName(r) + ">(" +
            joined(names, ", ") + ");\n}\n";
     ++row;
   }

@@ -16,7 +16,7 @@ namespace {
 using cli::Report;
 
 // The scratchpad's data: row count, table pointer, next row index.
-struct Scratch {
+struct FmpScratch {
   std::int32_t count;
   const unsigned char *table;
   std::int32_t next;
@@ -44,7 +44,7 @@ const unsigned char *tableIn(const Slot &slot) {
 
 // Close, both: give the table back if one is held; clear it whatever the
 // callback says.
-Report close(Scratch &s, CLI_tableCallback callback) {
+Report close(FmpScratch &s, CLI_tableCallback callback) {
   if (s.table == nullptr) return {};
   std::int32_t code = kClose;
   Slot request[2] = {slotOf(&code), reinterpret_cast<std::uintptr_t>(s.table)};
@@ -56,7 +56,7 @@ Report close(Scratch &s, CLI_tableCallback callback) {
 
 // Fetch, both: the row at the next index, or null at the end of the table.
 // The index rises on every fetch; no row is read through a null table.
-const unsigned char *nextRow(Scratch &s, std::size_t rowSize) {
+const unsigned char *nextRow(FmpScratch &s, std::size_t rowSize) {
   const std::int32_t index = s.next;
   s.next = static_cast<std::int32_t>(static_cast<std::uint32_t>(index) + 1u);
   if (index >= s.count || index < 0 || s.table == nullptr) return nullptr;
@@ -70,8 +70,6 @@ T field(const unsigned char *row, std::size_t offset) {
   return v;
 }
 
-constexpr Report kEndOfTable = Report::of(Report::Kind::endOfTable);
-
 }  // namespace
 
 namespace cli {
@@ -79,7 +77,7 @@ namespace cli {
 // Rows of six 32-bit numbers, from byte 4 of each 28-byte record.
 Report routine::FmpThreads(std::int32_t selector, Row row, Scratchpad scratchpad,
                            CallType call_type, CLI_tableCallback callback) noexcept {
-  const auto open = [&](Scratch &s) -> Report {
+  const auto open = [&](FmpScratch &s) -> Report {
     s.table = nullptr;
     std::int32_t code = kOpenThreads, input = selector, count = 0;
     Slot request[4] = {slotOf(&code), slotOf(&input), slotOf(&count), 0};
@@ -92,14 +90,14 @@ Report routine::FmpThreads(std::int32_t selector, Row row, Scratchpad scratchpad
     }
     return {};
   };
-  const auto fetch = [&](Scratch &s) -> Report {
+  const auto fetch = [&](FmpScratch &s) -> Report {
     const unsigned char *record = nextRow(s, kThreadRow);
-    if (record == nullptr) return kEndOfTable;
+    if (record == nullptr) return cli::kEndOfTable;
     for (std::size_t i = 0; i < 6; ++i) row.put(i, field<std::int32_t>(record, 4 + 4 * i));
     return {};
   };
-  return tableStep<Scratch>(call_type, scratchpad, open, fetch,
-                            [&](Scratch &s) { return close(s, callback); });
+  return tableStep<FmpScratch>(call_type, scratchpad, open, fetch,
+                               [&](FmpScratch &s) { return close(s, callback); });
 }
 
 // Rows of two 32-bit numbers, two 16-bit ones and two unsigned bytes,
@@ -107,7 +105,7 @@ Report routine::FmpThreads(std::int32_t selector, Row row, Scratchpad scratchpad
 // count and the next index as they were.
 Report routine::FmpRows(Row row, Scratchpad scratchpad, CallType call_type,
                         CLI_tableCallback callback) noexcept {
-  const auto open = [&](Scratch &s) -> Report {
+  const auto open = [&](FmpScratch &s) -> Report {
     s.table = nullptr;
     std::int32_t code = kOpenRows, count = 0;
     Slot request[3] = {slotOf(&code), slotOf(&count), 0};
@@ -118,9 +116,9 @@ Report routine::FmpRows(Row row, Scratchpad scratchpad, CallType call_type,
     s.next = 0;
     return {};
   };
-  const auto fetch = [&](Scratch &s) -> Report {
+  const auto fetch = [&](FmpScratch &s) -> Report {
     const unsigned char *record = nextRow(s, kRowsRow);
-    if (record == nullptr) return kEndOfTable;
+    if (record == nullptr) return cli::kEndOfTable;
     row.put(0, field<std::int32_t>(record, 0));
     row.put(1, field<std::int32_t>(record, 4));
     row.put(2, field<std::int16_t>(record, 8));
@@ -129,8 +127,8 @@ Report routine::FmpRows(Row row, Scratchpad scratchpad, CallType call_type,
     row.put(5, std::int16_t{record[13]});
     return {};
   };
-  return tableStep<Scratch>(call_type, scratchpad, open, fetch,
-                            [&](Scratch &s) { return close(s, callback); });
+  return tableStep<FmpScratch>(call_type, scratchpad, open, fetch,
+                               [&](FmpScratch &s) { return close(s, callback); });
 }
 
 }  // namespace cli

@@ -43,7 +43,7 @@ struct Scratch {
 // The columns past the sixteen numbers: the section text and the statement.
 constexpr std::size_t kSectionColumn = 16, kStatementColumn = 17;
 
-constexpr Report kEndOfTable = Report::of(Report::Kind::endOfTable);
+using cli::kEndOfTable;
 
 // The snapshot name, at the end of a chain of pointers that starts in the
 // process's static data; null where a link is missing.

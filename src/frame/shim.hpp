@@ -67,39 +67,52 @@ auto resultView(Pointer p) noexcept {
   }
 }
 
-template <std::size_t R, class Arguments>
-auto inputViews(const Arguments &a) noexcept {
+// The view of input I of row R as its logic takes it: wrapped with its
+// indicator for a routine that handles NULL.
+template <std::size_t R, std::size_t I, class Arguments>
+auto inputArgument(const Arguments &a) noexcept {
   constexpr std::size_t n = inputCount(cat::kRoutines[R]), m = resultCount(cat::kRoutines[R]);
-  constexpr bool handlesNull = (cat::kRoutines[R].properties & cat::kHandlesNull) != 0;
-  return [&]<std::size_t... I>(std::index_sequence<I...>) {
-    if constexpr (handlesNull) {
-      return std::tuple{Nullable<decltype(inputView<R, I>(std::get<I>(a)))>{
-          inputView<R, I>(std::get<I>(a)), *std::get<n + m + I>(a)}...};
-    } else {
-      return std::tuple{inputView<R, I>(std::get<I>(a))...};
-    }
+  if constexpr ((cat::kRoutines[R].properties & cat::kHandlesNull) != 0) {
+    using View = decltype(inputView<R, I>(std::get<I>(a)));
+    return Nullable<View>{inputView<R, I>(std::get<I>(a)), *std::get<n + m + I>(a)};
+  } else {
+    return inputView<R, I>(std::get<I>(a));
   }
-  (std::make_index_sequence<n>{});
 }
 
-// The extras of the frame, as views.
-template <std::size_t R, class Arguments>
-auto extraViews(const Arguments &a) noexcept {
-  constexpr const cat::Routine &r = cat::kRoutines[R];
-  constexpr std::size_t first = 2 * (inputCount(r) + resultCount(r)) + 4;
-  if constexpr (r.frame == cat::Frame::plain) {
-    return std::tuple{};
-  } else if constexpr (r.frame == cat::Frame::dbinfo) {
-    return std::tuple{DbInfo{std::get<first>(a)}};
-  } else if constexpr (r.frame == cat::Frame::scratchpad) {
-    return std::tuple{Scratchpad{std::get<first>(a)}};
-  } else if constexpr (r.frame == cat::Frame::table) {
-    return std::tuple{Scratchpad{std::get<first>(a)},
-                      static_cast<CallType>(*std::get<first + 1>(a))};
+// Calls `f` with the extras of row R's frame, as views.  The views are
+// handed on as arguments, never gathered in memory first, so that they
+// reach the logic in registers.
+template <std::size_t R, class Arguments, class F>
+decltype(auto) withExtras(const Arguments &a, F f) noexcept {
+  constexpr std::size_t first =
+      2 * (inputCount(cat::kRoutines[R]) + resultCount(cat::kRoutines[R])) + 4;
+  constexpr unsigned extras = cat::extrasOf(cat::kRoutines[R].frame);
+  if constexpr (extras == 0) {
+    return f();
+  } else if constexpr (extras == cat::kDbinfo) {
+    return f(DbInfo{std::get<first>(a)});
+  } else if constexpr (extras == cat::kScratchpad) {
+    return f(Scratchpad{std::get<first>(a)});
+  } else if constexpr (extras == (cat::kScratchpad | cat::kCallType)) {
+    return f(Scratchpad{std::get<first>(a)}, static_cast<CallType>(*std::get<first + 1>(a)));
   } else {
-    return std::tuple{Scratchpad{std::get<first>(a)},
-                      static_cast<CallType>(*std::get<first + 1>(a)), std::get<first + 2>(a)};
+    static_assert(extras == (cat::kScratchpad | cat::kCallType | cat::kCallback));
+    return f(Scratchpad{std::get<first>(a)}, static_cast<CallType>(*std::get<first + 1>(a)),
+             std::get<first + 2>(a));
   }
+}
+
+// Calls the logic with the inputs of row R, then `between` (the result's
+// views), then the extras.
+template <std::size_t R, auto Logic, class Arguments, class... Between>
+decltype(auto) callLogic(const Arguments &a, Between... between) noexcept {
+  return withExtras<R>(a, [&](auto... extras) {
+    return [&]<std::size_t... I>(std::index_sequence<I...>) {
+      return Logic(inputArgument<R, I>(a)..., between..., extras...);
+    }
+    (std::make_index_sequence<inputCount(cat::kRoutines[R])>{});
+  });
 }
 
 // A table's result columns, with their indicators and sizes.
@@ -126,43 +139,37 @@ struct RowArguments {
   }
 };
 
-template <std::size_t R, class Logic, class... Raw>
-void run(Logic logic, Raw... raw) noexcept {
+// The logic is a template argument, not a pointer handed over, so that its
+// call is a direct one that the optimiser can inline into the export.
+template <std::size_t R, auto Logic, class... Raw>
+void run(Raw... raw) noexcept {
   constexpr const cat::Routine &r = cat::kRoutines[R];
   constexpr std::size_t n = inputCount(r), m = resultCount(r);
   static_assert(sizeof...(Raw) == cat::argumentCount(r), "the export's arguments are its row's");
   const std::tuple<Raw...> a{raw...};
   char *const sqlstate = std::get<2 * (n + m)>(a);
   char *const message = std::get<2 * (n + m) + 3>(a);
-  const auto inputs = inputViews<R>(a);
-  const auto extras = extraViews<R>(a);
 
   if constexpr (r.frame == cat::Frame::table || r.frame == cat::Frame::tableCallback) {
     const RowArguments<R, std::tuple<Raw...>> row(a);
-    const Report report = std::apply(logic, std::tuple_cat(inputs, std::tuple{row.view()}, extras));
-    report.store(sqlstate, message);
+    callLogic<R, Logic>(a, row.view()).store(sqlstate, message);
   } else if constexpr ((r.properties & cat::kResultByAddress) != 0) {
     static_assert(m == 1 && isNumber(r.results[0].layout));
-    const Report report =
-        std::apply(logic, std::tuple_cat(inputs, std::tuple{std::get<n>(a)}, extras));
-    report.store(sqlstate, message);
+    callLogic<R, Logic>(a, std::get<n>(a)).store(sqlstate, message);
   } else if constexpr (isNumber(r.results[0].layout)) {
     static_assert(m == 1 && (r.properties & cat::kHandlesNull) == 0);
-    const auto answer = std::apply(logic, std::tuple_cat(inputs, extras));
+    const auto answer = callLogic<R, Logic>(a);
     if (answer.code == Sysfun::none || answer.stored) *std::get<n>(a) = answer.value;
-    Report(answer.code).store(sqlstate, message);
+    if (answer.code != Sysfun::none) Report(answer.code).store(sqlstate, message);
+  } else if constexpr ((r.properties & cat::kHandlesNull) != 0) {
+    static_assert(m == 1);
+    callLogic<R, Logic>(a, resultView<R, 0>(std::get<n>(a)),
+                        ResultIndicator{std::get<2 * n + 1>(a)})
+        .store(sqlstate, message);
   } else {
     static_assert(m == 1);
-    const auto result = std::tuple{resultView<R, 0>(std::get<n>(a))};
-    Report report;
-    if constexpr ((r.properties & cat::kHandlesNull) != 0) {
-      report = std::apply(
-          logic, std::tuple_cat(inputs, result, std::tuple{ResultIndicator{std::get<2 * n + 1>(a)}},
-                                extras));
-    } else {
-      report = std::apply(logic, std::tuple_cat(inputs, result, extras));
-    }
-    report.store(sqlstate, message);
+    const Report report = callLogic<R, Logic>(a, resultView<R, 0>(std::get<n>(a)));
+    if (report.failed()) report.store(sqlstate, message);
   }
 }
 

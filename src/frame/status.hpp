@@ -117,6 +117,9 @@ class Report {
   std::int32_t status_ = 0;
 };
 
+// The end of a table function's table.
+inline constexpr Report kEndOfTable = Report::of(Report::Kind::endOfTable);
+
 // What a routine with a number as its result gives back: the value, or a
 // code, or both where the routine stores its value before it tests it.
 template <typename T>

@@ -25,7 +25,7 @@ Report lcase(In in, Out out) noexcept {
 }
 
 template <class Out>
-Report store(Bytes kept, Out out) noexcept {
+Report copyOut(Bytes kept, Out out) noexcept {
   cli::str::copy(kept, out.area());
   out.finish(kept.size);
   return {};
@@ -86,17 +86,17 @@ Report routine::LCASE1(TextIn string, TextOut result) noexcept { return lcase(st
 Report routine::LCASE2(LobIn string, LobOut result) noexcept { return lcase(string, result); }
 
 Report routine::RTRIM1(TextIn string, TextOut result) noexcept {
-  return store(str::withoutTrailingBlanks(string.bytes()), result);
+  return copyOut(str::withoutTrailingBlanks(string.bytes()), result);
 }
 Report routine::RTRIM2(LobIn string, LobOut result) noexcept {
-  return store(str::withoutTrailingBlanks(string.bytes()), result);
+  return copyOut(str::withoutTrailingBlanks(string.bytes()), result);
 }
 
 Report routine::LTRIM1(TextIn string, TextOut result) noexcept {
-  return store(str::withoutLeadingBlanks(string.bytes()), result);
+  return copyOut(str::withoutLeadingBlanks(string.bytes()), result);
 }
 Report routine::LTRIM2(LobIn string, LobOut result) noexcept {
-  return store(str::withoutLeadingBlanks(string.bytes()), result);
+  return copyOut(str::withoutLeadingBlanks(string.bytes()), result);
 }
 
 Report routine::LEFT1(TextIn string, std::int32_t n, TextOut result) noexcept {

@@ -35,7 +35,8 @@ std::int32_t locate(Bytes search, Bytes searched, std::size_t start) noexcept {
 // Copies n bytes, reading and writing none outside the two ranges: short
 // pieces, the common case between matches, as two overlapping moves of
 // one width instead of a call.
-inline void copyPiece(cli::Byte *to, const cli::Byte *from, std::size_t n) noexcept {
+[[gnu::always_inline]] inline void copyPiece(cli::Byte *to, const cli::Byte *from,
+                                             std::size_t n) noexcept {
   const auto move = [&]<class Word>(Word) {
     Word head, tail;
     std::memcpy(&head, from, sizeof head);
@@ -61,7 +62,7 @@ inline void copyPiece(cli::Byte *to, const cli::Byte *from, std::size_t n) noexc
 class Builder {
  public:
   Builder(cli::Byte *area, std::size_t limit) noexcept : area_(area), limit_(limit) {}
-  bool append(const cli::Byte *data, std::size_t size) noexcept {
+  [[gnu::always_inline]] bool append(const cli::Byte *data, std::size_t size) noexcept {
     if (size > limit_ - length_) return false;
     copyPiece(area_ + length_, data, size);
     length_ += size;
