@@ -74,7 +74,7 @@ inline std::size_t layOut(const cat::Routine &row, const Frame &f, void **args) 
 
 // Calls `fn` with the K arguments at `args`.
 template <std::size_t K>
-void invokeWith(void *fn, void *const *args) noexcept {
+[[gnu::always_inline]] inline void invokeWith(void *fn, void *const *args) noexcept {
   [&]<std::size_t... I>(std::index_sequence<I...>) {
     using Export = void (*)(decltype(I, static_cast<void *>(nullptr))...) noexcept;
     reinterpret_cast<Export>(fn)(args[I]...);
@@ -125,9 +125,10 @@ inline void call(const cat::Routine &row, void *fn, const Frame &f) noexcept {
 }
 
 // The same for a row known at compile time: the counts and the argument
-// count are constants, so the call is as direct as a hand-written one.
+// count are constants, and the whole is inlined into its caller, so the
+// call is as direct as a hand-written one.
 template <std::size_t Row>
-void call(void *fn, const Frame &f) noexcept {
+[[gnu::always_inline]] inline void call(void *fn, const Frame &f) noexcept {
   constexpr std::size_t n = cat::inputCount(cat::kRoutines[Row]);
   constexpr std::size_t m = cat::resultCount(cat::kRoutines[Row]);
   constexpr std::size_t k = cat::argumentCount(cat::kRoutines[Row]);
