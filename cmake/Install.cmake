@@ -1,0 +1,53 @@
+# What `cmake --install` puts where (Linux):
+#   lib/liborvclifn.so.1.0.0 and its SONAME links   the library
+#   lib/orvclifn/libORV*64.so                       the engine's service libraries
+#                                                   (the stand-ins), private to the
+#                                                   library so that they never shadow
+#                                                   an engine's own
+#   lib/orvclifn/orvclifn_sqlite.so                 the SQLite extension
+#   bin/orv_snapshot                                the snapshot writer
+#   include/orvclifn/cliudf.h, orvclifn.h           the frame and every export
+#   lib/cmake/orvclifn/, lib/pkgconfig/orvclifn.pc  for builders
+# Every RUNPATH is relative ($ORIGIN), so an installed tree works wherever
+# it is put; DESTDIR staging works as usual.
+include(GNUInstallDirs)
+include(CMakePackageConfigHelpers)
+
+set(ORV_PRIVATE_LIBDIR ${CMAKE_INSTALL_LIBDIR}/orvclifn)
+set(ORV_HEADERS_DIR ${CMAKE_INSTALL_INCLUDEDIR}/orvclifn)
+
+set_target_properties(orvclifn PROPERTIES INSTALL_RPATH "$ORIGIN/orvclifn")
+set_target_properties(ORVSYS64 ORVAPP64 ORVG11N64 PROPERTIES INSTALL_RPATH "$ORIGIN")
+target_include_directories(orvclifn INTERFACE $<INSTALL_INTERFACE:${ORV_HEADERS_DIR}>)
+
+install(TARGETS orvclifn EXPORT orvclifnTargets
+  LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR} COMPONENT runtime NAMELINK_COMPONENT dev)
+install(TARGETS ORVSYS64 ORVAPP64 ORVG11N64 EXPORT orvclifnTargets
+  LIBRARY DESTINATION ${ORV_PRIVATE_LIBDIR} COMPONENT runtime NAMELINK_SKIP)
+install(FILES ${PROJECT_SOURCE_DIR}/src/frame/cliudf.h ${PROJECT_BINARY_DIR}/src/generated/orvclifn.h
+  DESTINATION ${ORV_HEADERS_DIR} COMPONENT dev)
+
+if(TARGET orvclifn_sqlite)
+  # Beside the service libraries; the library itself is one folder up.
+  set_target_properties(orvclifn_sqlite PROPERTIES INSTALL_RPATH "$ORIGIN/..:$ORIGIN")
+  install(TARGETS orvclifn_sqlite LIBRARY DESTINATION ${ORV_PRIVATE_LIBDIR} COMPONENT sqlite)
+endif()
+if(TARGET orv_snapshot)
+  install(TARGETS orv_snapshot RUNTIME DESTINATION ${CMAKE_INSTALL_BINDIR} COMPONENT runtime)
+endif()
+
+# find_package(orvclifn CONFIG) gives orvclifn::orvclifn.
+set(ORV_CMAKE_DIR ${CMAKE_INSTALL_LIBDIR}/cmake/orvclifn)
+install(EXPORT orvclifnTargets NAMESPACE orvclifn:: DESTINATION ${ORV_CMAKE_DIR} COMPONENT dev)
+configure_package_config_file(${CMAKE_CURRENT_LIST_DIR}/orvclifnConfig.cmake.in
+  ${PROJECT_BINARY_DIR}/orvclifnConfig.cmake INSTALL_DESTINATION ${ORV_CMAKE_DIR})
+write_basic_package_version_file(${PROJECT_BINARY_DIR}/orvclifnConfigVersion.cmake
+  COMPATIBILITY SameMajorVersion)
+install(FILES ${PROJECT_BINARY_DIR}/orvclifnConfig.cmake
+  ${PROJECT_BINARY_DIR}/orvclifnConfigVersion.cmake DESTINATION ${ORV_CMAKE_DIR} COMPONENT dev)
+
+# pkg-config orvclifn, with paths relative to the file so that a moved
+# tree still answers.
+configure_file(${CMAKE_CURRENT_LIST_DIR}/orvclifn.pc.in ${PROJECT_BINARY_DIR}/orvclifn.pc @ONLY)
+install(FILES ${PROJECT_BINARY_DIR}/orvclifn.pc
+  DESTINATION ${CMAKE_INSTALL_LIBDIR}/pkgconfig COMPONENT dev)
