@@ -20,20 +20,26 @@ set_target_properties(orvclifn PROPERTIES INSTALL_RPATH "$ORIGIN/orvclifn")
 set_target_properties(ORVSYS64 ORVAPP64 ORVG11N64 PROPERTIES INSTALL_RPATH "$ORIGIN")
 target_include_directories(orvclifn INTERFACE $<INSTALL_INTERFACE:${ORV_HEADERS_DIR}>)
 
+# Shared objects are read, not run: no execute bit, as Debian has it.
+set(ORV_SHARED_OBJECT_PERMISSIONS OWNER_READ OWNER_WRITE GROUP_READ WORLD_READ)
+
 install(TARGETS orvclifn EXPORT orvclifnTargets
-  LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR} COMPONENT runtime NAMELINK_COMPONENT dev)
+  LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR} PERMISSIONS ${ORV_SHARED_OBJECT_PERMISSIONS}
+          COMPONENT runtime NAMELINK_COMPONENT dev)
 install(TARGETS ORVSYS64 ORVAPP64 ORVG11N64 EXPORT orvclifnTargets
-  LIBRARY DESTINATION ${ORV_PRIVATE_LIBDIR} COMPONENT runtime NAMELINK_SKIP)
+  LIBRARY DESTINATION ${ORV_PRIVATE_LIBDIR} PERMISSIONS ${ORV_SHARED_OBJECT_PERMISSIONS}
+          COMPONENT runtime NAMELINK_SKIP)
 install(FILES ${PROJECT_SOURCE_DIR}/src/frame/cliudf.h ${PROJECT_BINARY_DIR}/src/generated/orvclifn.h
   DESTINATION ${ORV_HEADERS_DIR} COMPONENT dev)
 
 if(TARGET orvclifn_sqlite)
   # Beside the service libraries; the library itself is one folder up.
   set_target_properties(orvclifn_sqlite PROPERTIES INSTALL_RPATH "$ORIGIN/..:$ORIGIN")
-  install(TARGETS orvclifn_sqlite LIBRARY DESTINATION ${ORV_PRIVATE_LIBDIR} COMPONENT sqlite)
+  install(TARGETS orvclifn_sqlite LIBRARY DESTINATION ${ORV_PRIVATE_LIBDIR}
+          PERMISSIONS ${ORV_SHARED_OBJECT_PERMISSIONS} COMPONENT sqlite)
 endif()
 if(TARGET orv_snapshot)
-  install(TARGETS orv_snapshot RUNTIME DESTINATION ${CMAKE_INSTALL_BINDIR} COMPONENT runtime)
+  install(TARGETS orv_snapshot RUNTIME DESTINATION ${CMAKE_INSTALL_BINDIR} COMPONENT tools)
 endif()
 
 # find_package(orvclifn CONFIG) gives orvclifn::orvclifn.
@@ -48,6 +54,8 @@ install(FILES ${PROJECT_BINARY_DIR}/orvclifnConfig.cmake
 
 # pkg-config orvclifn, with paths relative to the file so that a moved
 # tree still answers.
+file(RELATIVE_PATH ORV_PC_TO_PREFIX ${CMAKE_INSTALL_FULL_LIBDIR}/pkgconfig ${CMAKE_INSTALL_PREFIX})
+string(REGEX REPLACE "/$" "" ORV_PC_TO_PREFIX "${ORV_PC_TO_PREFIX}")
 configure_file(${CMAKE_CURRENT_LIST_DIR}/orvclifn.pc.in ${PROJECT_BINARY_DIR}/orvclifn.pc @ONLY)
 install(FILES ${PROJECT_BINARY_DIR}/orvclifn.pc
   DESTINATION ${CMAKE_INSTALL_LIBDIR}/pkgconfig COMPONENT dev)
