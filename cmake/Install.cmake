@@ -38,6 +38,15 @@ if(TARGET orvclifn_sqlite)
   install(TARGETS orvclifn_sqlite LIBRARY DESTINATION ${ORV_PRIVATE_LIBDIR}
           PERMISSIONS ${ORV_SHARED_OBJECT_PERMISSIONS} COMPONENT sqlite)
 endif()
+if(TARGET orvclifn_postgres)
+  # In PostgreSQL's folders, found by the server as $libdir/orvclifn; the
+  # library is reached from there by a path relative to the module.
+  file(RELATIVE_PATH to_library ${CMAKE_INSTALL_PREFIX}/${ORV_PG_LIBDIR} ${CMAKE_INSTALL_FULL_LIBDIR})
+  set_target_properties(orvclifn_postgres PROPERTIES INSTALL_RPATH "$ORIGIN/${to_library}")
+  install(TARGETS orvclifn_postgres LIBRARY DESTINATION ${ORV_PG_LIBDIR}
+          PERMISSIONS ${ORV_SHARED_OBJECT_PERMISSIONS} COMPONENT postgres)
+  install(FILES ${ORV_PG_FILES} DESTINATION ${ORV_PG_EXTENSIONDIR} COMPONENT postgres)
+endif()
 if(TARGET orv_snapshot)
   install(TARGETS orv_snapshot RUNTIME DESTINATION ${CMAKE_INSTALL_BINDIR} COMPONENT tools)
 endif()

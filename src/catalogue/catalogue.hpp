@@ -64,6 +64,10 @@ enum : unsigned {
   // routine hands the result's address to, so the logic gets the address
   // rather than giving back an Answer.
   kResultByAddress = 16u,
+  // Uses state that the whole process shares (the standard library's
+  // random number state), so calls on other threads or in other processes
+  // of one query do not see the same sequence.
+  kSharedState = 32u,
 };
 inline constexpr unsigned kPure = kDeterministic | kInnocuous;
 
@@ -180,8 +184,8 @@ inline constexpr Routine kRoutines[] = {
   {"CLI_udfDEGREES1", "DEGREES", Frame::plain, {real("x")}, {real()}, kPure, "", "Radians in degrees."},
   {"CLI_udfRADIANS1", "RADIANS", Frame::plain, {real("x")}, {real()}, kPure, "", "Degrees in radians."},
   // Random
-  {"CLI_udfRAND1", "RAND", Frame::plain, {}, {real()}, kInnocuous, "", "A pseudo-random double from 0.0 to 1.0."},
-  {"CLI_udfRAND2", "RAND", Frame::scratchpad, {int32("seed")}, {real()}, kInnocuous, "", "A pseudo-random double from 0.0 to 1.0; the first call of a statement seeds the generator."},
+  {"CLI_udfRAND1", "RAND", Frame::plain, {}, {real()}, kInnocuous | kSharedState, "", "A pseudo-random double from 0.0 to 1.0."},
+  {"CLI_udfRAND2", "RAND", Frame::scratchpad, {int32("seed")}, {real()}, kInnocuous | kSharedState, "", "A pseudo-random double from 0.0 to 1.0; the first call of a statement seeds the generator."},
   // Number text
   {"CLI_udfCHARTODOUBLE", "CHARTODOUBLE", Frame::plain, {text("text")}, {real()}, kPure | kResultByAddress, "11", "The number that a text spells, as a double."},
   {"CLI_udfDOUBLETOCHAR", "DOUBLETOCHAR", Frame::plain, {real("x")}, {fixedText(24)}, kPure, "", "A double in short scientific notation, 24 bytes filled up with blanks."},

@@ -1,0 +1,244 @@
+// The PostgreSQL extension's module: loading, the reports of statuses and
+// bad arguments, the database information block and the date and time
+// values in the library's text forms.
+#include "server.hpp"
+// server.hpp first: PostgreSQL's headers want to come before any other.
+#include <dlfcn.h>
+
+#include <array>
+#include <cstddef>
+#include <cstdint>
+#include <cstdio>
+#include <cstring>
+
+#include "frame/cliudf.h"
+#include "frame/status.hpp"
+#include "module.hpp"
+#include "tables.hpp"
+
+extern "C" {
+PG_MODULE_MAGIC;
+PGDLLEXPORT void _PG_init(void);
+}
+
+namespace orv::pg {
+
+std::array<void *, cli::catalogue::kRoutineCount> gExports{};
+
+namespace {
+
+// The library that defines the data export: the one this module was
+// linked with.  Opened again by its path so that every export is found by
+// its name, as an engine finds them.
+void findExports() {
+  Dl_info info{};
+  if (dladdr(&sqlzThisIsAORVLibrary, &info) == 0 || info.dli_fname == nullptr) {
+    ereport(ERROR, (errmsg("orvclifn: cannot tell where the library was loaded from")));
+  }
+  void *library = dlopen(info.dli_fname, RTLD_NOW | RTLD_LOCAL);
+  if (library == nullptr) ereport(ERROR, (errmsg("orvclifn: %s", dlerror())));
+  for (std::size_t i = 0; i < cli::catalogue::kRoutineCount; ++i) {
+    gExports[i] = dlsym(library, cli::catalogue::kRoutines[i].symbol);
+    if (gExports[i] == nullptr) {
+      ereport(ERROR, (errmsg("orvclifn: the library %s has no export %s", info.dli_fname,
+                             cli::catalogue::kRoutines[i].symbol)));
+    }
+  }
+}
+
+const char *functionName(FunctionCallInfo fcinfo) {
+  const char *name = get_func_name(fcinfo->flinfo->fn_oid);
+  return name != nullptr ? name : "orvclifn";
+}
+
+int sqlstateCode(const char *s) { return MAKE_SQLSTATE(s[0], s[1], s[2], s[3], s[4]); }
+
+// Days since 1970-01-01 of a date of the proleptic Gregorian calendar, and
+// back (the era-based method: 400-year eras of 146097 days).
+constexpr std::int64_t daysFromCivil(std::int64_t y, unsigned m, unsigned d) {
+  y -= m <= 2 ? 1 : 0;
+  const std::int64_t era = (y >= 0 ? y : y - 399) / 400;
+  const auto yoe = static_cast<unsigned>(y - era * 400);
+  const unsigned doy = (153 * (m > 2 ? m - 3 : m + 9) + 2) / 5 + d - 1;
+  const unsigned doe = yoe * 365 + yoe / 4 - yoe / 100 + doy;
+  return era * 146097 + static_cast<std::int64_t>(doe) - 719468;
+}
+
+struct Civil {
+  std::int64_t year;
+  unsigned month, day;
+};
+constexpr Civil civilFromDays(std::int64_t z) {
+  z += 719468;
+  const std::int64_t era = (z >= 0 ? z : z - 146096) / 146097;
+  const auto doe = static_cast<unsigned>(z - era * 146097);
+  const unsigned yoe = (doe - doe / 1460 + doe / 36524 - doe / 146096) / 365;
+  const unsigned doy = doe - (365 * yoe + yoe / 4 - yoe / 100);
+  const unsigned mp = (5 * doy + 2) / 153;
+  const unsigned d = doy - (153 * mp + 2) / 5 + 1;
+  const unsigned m = mp < 10 ? mp + 3 : mp - 9;
+  return {static_cast<std::int64_t>(yoe) + era * 400 + (m <= 2 ? 1 : 0), m, d};
+}
+
+// PostgreSQL counts days and microseconds from 2000-01-01.
+constexpr std::int64_t kEpochShift = 10957;  // days from 1970-01-01 to 2000-01-01
+constexpr std::int64_t kDay = USECS_PER_DAY;
+
+void digits(char *out, std::int64_t value, int width) {
+  for (int i = width - 1; i >= 0; --i) {
+    out[i] = static_cast<char>('0' + value % 10);
+    value /= 10;
+  }
+}
+
+// YYYY-MM-DD for days since 2000-01-01; 0 outside the years 1 to 9999.
+std::size_t writeDate(std::int64_t days, char *out) {
+  const Civil c = civilFromDays(days + kEpochShift);
+  if (c.year < 1 || c.year > 9999) return 0;
+  digits(out, c.year, 4);
+  out[4] = '-';
+  digits(out + 5, c.month, 2);
+  out[7] = '-';
+  digits(out + 8, c.day, 2);
+  return 10;
+}
+
+// HH.MM.SS for microseconds since midnight, and .FFFFFF behind it when
+// `fraction` is set.
+std::size_t writeTime(std::int64_t micros, char *out, bool fraction) {
+  const std::int64_t seconds = micros / USECS_PER_SEC;
+  digits(out, seconds / 3600, 2);
+  out[2] = '.';
+  digits(out + 3, seconds / 60 % 60, 2);
+  out[5] = '.';
+  digits(out + 6, seconds % 60, 2);
+  if (!fraction) return 8;
+  out[8] = '.';
+  digits(out + 9, micros % USECS_PER_SEC, 6);
+  return 15;
+}
+
+bool readDigits(const char *p, int width, std::int64_t &out) {
+  out = 0;
+  for (int i = 0; i < width; ++i) {
+    if (p[i] < '0' || p[i] > '9') return false;
+    out = out * 10 + (p[i] - '0');
+  }
+  return true;
+}
+
+}  // namespace
+
+void reportStatus(FunctionCallInfo fcinfo, const cli::call::StatusBuffers &status) {
+  const char *name = functionName(fcinfo);
+  if (const cli::Sysfun code = cli::call::sysfunIn(status.sqlstate, status.message);
+      code != cli::Sysfun::none) {
+    ereport(ERROR, (errcode(sqlstateCode(CLI_SQLSTATE_SYSFUN)),
+                    errmsg("%s: SYSFUN:%s: %s", name, cli::textOf(code).digits,
+                           cli::wordsOf(code))));
+  }
+  // Any other status keeps its own SQLSTATE; some are stored without a
+  // terminator, so both buffers are read to their size only.
+  char sqlstate[6] = {};
+  std::memcpy(sqlstate, status.sqlstate, 5);
+  ereport(ERROR, (errcode(sqlstateCode(sqlstate)),
+                  errmsg("%s: %.*s", name, static_cast<int>(sizeof status.message),
+                         status.message)));
+  pg_unreachable();
+}
+
+void reportArgument(FunctionCallInfo fcinfo, int sqlstate, int i, const char *name,
+                    const char *what) {
+  if (name != nullptr && name[0] != '\0') {
+    ereport(ERROR, (errcode(sqlstate),
+                    errmsg("%s: argument %d (%s) %s", functionName(fcinfo), i + 1, name, what)));
+  }
+  ereport(ERROR,
+          (errcode(sqlstate), errmsg("%s: argument %d %s", functionName(fcinfo), i + 1, what)));
+  pg_unreachable();
+}
+
+const void *databaseInfo(FunctionCallInfo fcinfo) {
+  // The engine's code pages of the encodings that a database can have.
+  struct Known {
+    int encoding;
+    std::uint32_t codePage;
+  };
+  static constexpr Known kKnown[] = {
+      {PG_UTF8, 1208}, {PG_SQL_ASCII, 1208}, {PG_LATIN1, 819}, {PG_WIN1252, 1252}, {PG_EUC_JP, 954},
+  };
+  static std::array<unsigned char, 512> block{};
+  const int encoding = GetDatabaseEncoding();
+  for (const Known &k : kKnown) {
+    if (k.encoding == encoding) {
+      std::memcpy(block.data() + CLI_DBINFO_CODEPAGE_OFFSET, &k.codePage, sizeof k.codePage);
+      return block.data();
+    }
+  }
+  ereport(ERROR, (errcode(ERRCODE_FEATURE_NOT_SUPPORTED),
+                  errmsg("%s: the database encoding %s has no code page that the library knows",
+                         functionName(fcinfo), GetDatabaseEncodingName())));
+  pg_unreachable();
+}
+
+std::size_t dateText(DateADT date, char *out) {
+  if (DATE_NOT_FINITE(date)) return 0;
+  return writeDate(date, out);
+}
+
+std::size_t timeText(TimeADT time, char *out) { return writeTime(time, out, false); }
+
+std::size_t timestampText(Timestamp stamp, char *out) {
+  if (TIMESTAMP_NOT_FINITE(stamp)) return 0;
+  std::int64_t days = stamp / kDay, micros = stamp % kDay;
+  if (micros < 0) {
+    micros += kDay;
+    days -= 1;
+  }
+  if (writeDate(days, out) == 0) return 0;
+  out[10] = '-';
+  return 11 + writeTime(micros, out + 11, true);
+}
+
+bool timestampOf(const char *text, std::size_t size, Timestamp &out) {
+  std::int64_t y = 0, mo = 0, d = 0, h = 0, mi = 0, s = 0, f = 0;
+  if (size != 26 || text[4] != '-' || text[7] != '-' || text[10] != '-' || text[13] != '.' ||
+      text[16] != '.' || text[19] != '.' || !readDigits(text, 4, y) ||
+      !readDigits(text + 5, 2, mo) || !readDigits(text + 8, 2, d) ||
+      !readDigits(text + 11, 2, h) || !readDigits(text + 14, 2, mi) ||
+      !readDigits(text + 17, 2, s) || !readDigits(text + 20, 6, f)) {
+    return false;
+  }
+  if (y < 1 || mo < 1 || mo > 12 || d < 1 || d > 31 || h > 23 || mi > 59 || s > 59) return false;
+  const std::int64_t days =
+      daysFromCivil(y, static_cast<unsigned>(mo), static_cast<unsigned>(d)) - kEpochShift;
+  out = days * kDay + ((h * 60 + mi) * 60 + s) * USECS_PER_SEC + f;
+  return true;
+}
+
+text *resultText(FunctionCallInfo fcinfo, const char *data, std::size_t size) {
+  const int length = static_cast<int>(size);
+  if (!pg_verify_mbstr(GetDatabaseEncoding(), data, length, true)) {
+    ereport(ERROR,
+            (errcode(ERRCODE_CHARACTER_NOT_IN_REPERTOIRE),
+             errmsg("%s: the result is not valid %s text", functionName(fcinfo),
+                    GetDatabaseEncodingName()),
+             errdetail("The library works on bytes; this result cuts or changes a character."),
+             errhint("Pass the string as bytea (convert_to(s, 'UTF8')) to get bytes back.")));
+  }
+  return cstring_to_text_with_len(data, length);
+}
+
+bytea *resultBytes(const void *data, std::size_t size) {
+  auto *out = static_cast<bytea *>(palloc(VARHDRSZ + size));
+  SET_VARSIZE(out, VARHDRSZ + size);
+  if (size != 0) std::memcpy(VARDATA(out), data, size);
+  return out;
+}
+
+}  // namespace orv::pg
+
+void _PG_init(void) {
+  orv::pg::findExports();
+  orv::pg::defineSettings();
+}

@@ -1,0 +1,52 @@
+// What the module's parts share: the exports found in the library, the
+// reports of a status or a bad argument as PostgreSQL errors, and the date
+// and time values in the library's text forms.
+//
+// Include after server.hpp.
+#pragma once
+
+#include <array>
+#include <cstddef>
+#include <cstdint>
+
+#include "catalogue/catalogue.hpp"
+#include "frame/call.hpp"
+
+namespace orv::pg {
+
+// The export of each catalogue row, found by its name in the library when
+// the module is loaded.
+extern std::array<void *, cli::catalogue::kRoutineCount> gExports;
+
+// Raises the status that a routine stored as an ERROR: a SYSFUN error with
+// SQLSTATE 38552 and its code in words, any other status with its own
+// SQLSTATE and message.  Does not return.
+[[noreturn]] void reportStatus(FunctionCallInfo fcinfo, const cli::call::StatusBuffers &status);
+
+// Raises an ERROR about argument `i` (from 0) of the function being called.
+[[noreturn]] void reportArgument(FunctionCallInfo fcinfo, int sqlstate, int i, const char *name,
+                                 const char *what);
+
+// The database information block for DAYNAME and MONTHNAME: the code page
+// of the database's encoding.  Raises an ERROR for an encoding that has none.
+const void *databaseInfo(FunctionCallInfo fcinfo);
+
+// The library's text forms of date and time values, written with integer
+// arithmetic: 2001-09-27, 13.30.15, 2001-09-27-13.30.15.000000.  Each
+// returns the length, or 0 when the value lies outside the years 1 to 9999
+// (or is infinite).
+inline constexpr std::size_t kDatetimeRoom = 32;
+std::size_t dateText(DateADT date, char *out);
+std::size_t timeText(TimeADT time, char *out);
+std::size_t timestampText(Timestamp stamp, char *out);
+
+// A timestamp text of exactly the form 2001-09-27-13.30.15.000000 as a
+// timestamp; false for any other text.
+bool timestampOf(const char *text, std::size_t size, Timestamp &out);
+
+// Text that the database can hold: valid in its encoding.  Raises an ERROR
+// that points to bytea for anything else.
+text *resultText(FunctionCallInfo fcinfo, const char *data, std::size_t size);
+bytea *resultBytes(const void *data, std::size_t size);
+
+}  // namespace orv::pg
