@@ -41,8 +41,11 @@ endif()
 if(TARGET orvclifn_postgres)
   # In PostgreSQL's folders, found by the server as $libdir/orvclifn; the
   # library is reached from there by a path relative to the module.
-  file(RELATIVE_PATH to_library ${CMAKE_INSTALL_PREFIX}/${ORV_PG_LIBDIR} ${CMAKE_INSTALL_FULL_LIBDIR})
-  set_target_properties(orvclifn_postgres PROPERTIES INSTALL_RPATH "$ORIGIN/${to_library}")
+  # In the loader's own folders (a /usr install) it needs no search path.
+  if(NOT CMAKE_INSTALL_FULL_LIBDIR IN_LIST CMAKE_CXX_IMPLICIT_LINK_DIRECTORIES)
+    file(RELATIVE_PATH to_library ${CMAKE_INSTALL_PREFIX}/${ORV_PG_LIBDIR} ${CMAKE_INSTALL_FULL_LIBDIR})
+    set_target_properties(orvclifn_postgres PROPERTIES INSTALL_RPATH "$ORIGIN/${to_library}")
+  endif()
   install(TARGETS orvclifn_postgres LIBRARY DESTINATION ${ORV_PG_LIBDIR}
           PERMISSIONS ${ORV_SHARED_OBJECT_PERMISSIONS} COMPONENT postgres)
   install(FILES ${ORV_PG_FILES} DESTINATION ${ORV_PG_EXTENSIONDIR} COMPONENT postgres)

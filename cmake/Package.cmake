@@ -5,6 +5,7 @@
 #                            pkg-config files
 #   libsqlite3-mod-orvclifn  the SQLite extension
 #   orvclifn-tools           the snapshot writer
+#   postgresql-15-orvclifn   the PostgreSQL extension
 # Each carries the copyright file and changelog that Debian asks of every
 # package; those are installed only when a component is installed on its
 # own (EXCLUDE_FROM_ALL), so that a plain `cmake --install` doesn't get them.
@@ -17,6 +18,9 @@ set(ORV_DEB_PACKAGES
   dev liborvclifn-dev
   sqlite libsqlite3-mod-orvclifn
   tools orvclifn-tools)
+if(TARGET orvclifn_postgres)
+  list(APPEND ORV_DEB_PACKAGES postgres postgresql-${ORV_PG_MAJOR}-orvclifn)
+endif()
 
 configure_file(${PROJECT_SOURCE_DIR}/packaging/deb/changelog.in
   ${PROJECT_BINARY_DIR}/packaging/changelog.Debian @ONLY)
@@ -107,4 +111,12 @@ ${about}
 
 This package holds orv_snapshot, which writes the statement cache snapshots
 that the table function SQLCACHE_SNAPSHOT reads.")
+set(CPACK_DEBIAN_POSTGRES_PACKAGE_SECTION database)
+set(CPACK_DEBIAN_POSTGRES_PACKAGE_DEPENDS
+  "${runtime} (= ${ORV_DEB_VERSION}), postgresql-${ORV_PG_MAJOR}")
+set(CPACK_DEBIAN_POSTGRES_DESCRIPTION "SQL routines under the tag SYSFUN - PostgreSQL ${ORV_PG_MAJOR} extension
+${about}
+
+This package holds the PostgreSQL extension: CREATE EXTENSION orvclifn puts
+every routine into the schema sysfun as an SQL function.")
 include(CPack)

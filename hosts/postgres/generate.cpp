@@ -34,14 +34,13 @@ struct Columns {
   std::vector<const char *> names;
 };
 const Columns kColumns[] = {
-    {"CLI_udfFmpThreads",
-     {"pid", "database_oid", "role_oid", "process_type", "state", "started"}},
+    {"CLI_udfFmpThreads", {"pid", "database_oid", "role_oid", "process_type", "state", "started"}},
     {"CLI_udfFmpRows", {"table_oid", "pages", "columns", "kind", "persistence", "has_index"}},
     {"SQLCACHE_SNAPSHOT",
      {"element_554", "element_540", "element_521", "element_539", "element_446", "element_487",
       "element_522", "element_447", "element_523", "element_532", "element_229_300",
-      "element_229_301", "element_586_300", "element_586_301", "element_585_300",
-      "element_585_301", "section", "statement"}},
+      "element_229_301", "element_586_300", "element_586_301", "element_585_300", "element_585_301",
+      "section", "statement"}},
 };
 
 std::string columnName(const cat::Routine &r, std::size_t i) {
@@ -100,8 +99,8 @@ std::string argumentList(const Signature &s, bool named) {
 std::string summary(const Signature &s) {
   std::string text = cat::kRoutines[s.row()].summary;
   if (s.textRow != orv::pg::kNoRow && s.lobRow != orv::pg::kNoRow) {
-    text += " (" + std::string(cat::kRoutines[s.textRow].symbol) + " for text of up to 4000 bytes, " +
-            cat::kRoutines[s.lobRow].symbol + " beyond.)";
+    text += " (" + std::string(cat::kRoutines[s.textRow].symbol) +
+            " for text of up to 4000 bytes, " + cat::kRoutines[s.lobRow].symbol + " beyond.)";
   } else {
     text += " (" + std::string(cat::kRoutines[s.row()].symbol) + ".)";
   }
@@ -111,8 +110,8 @@ std::string summary(const Signature &s) {
 std::string createFunction(const Signature &s) {
   const cat::Routine &r = cat::kRoutines[s.row()];
   std::ostringstream out;
-  out << "CREATE OR REPLACE FUNCTION @extschema@." << quoted(s.name) << "("
-      << argumentList(s, true) << ")\n  RETURNS ";
+  out << "CREATE OR REPLACE FUNCTION @extschema@." << quoted(s.name) << "(" << argumentList(s, true)
+      << ")\n  RETURNS ";
   if (s.table()) {
     out << "TABLE(";
     for (std::size_t i = 0; i < cat::resultCount(r); ++i) {
@@ -129,12 +128,12 @@ std::string createFunction(const Signature &s) {
     out << "VOLATILE STRICT PARALLEL RESTRICTED";
   } else {
     // A timestamp with time zone is read in the session's time zone.
-    const bool zoned = std::find(s.arguments.begin(), s.arguments.end(), Type::timestamptz) !=
-                       s.arguments.end();
+    const bool zoned =
+        std::find(s.arguments.begin(), s.arguments.end(), Type::timestamptz) != s.arguments.end();
     const bool deterministic = (r.properties & cat::kDeterministic) != 0;
-    out << (deterministic && !zoned                     ? "IMMUTABLE"
+    out << (deterministic && !zoned                          ? "IMMUTABLE"
             : deterministic || r.frame == cat::Frame::dbinfo ? "STABLE"
-                                                        : "VOLATILE");
+                                                             : "VOLATILE");
     out << ((r.properties & cat::kHandlesNull) != 0 ? " CALLED ON NULL INPUT" : " STRICT");
     out << ((r.properties & cat::kSharedState) != 0 ? " PARALLEL RESTRICTED" : " PARALLEL SAFE");
   }
@@ -146,8 +145,7 @@ std::string createFunction(const Signature &s) {
 std::string entryPoint(const Signature &s) {
   std::ostringstream out;
   out << "PG_FUNCTION_INFO_V1(" << s.symbol << ");\nPGDLLEXPORT Datum " << s.symbol
-      << "(PG_FUNCTION_ARGS);\n}\nDatum " << s.symbol
-      << "(PG_FUNCTION_ARGS) {\n  return ";
+      << "(PG_FUNCTION_ARGS);\n}\nDatum " << s.symbol << "(PG_FUNCTION_ARGS) {\n  return ";
   if (s.table()) {
     out << "orv::pg::table<" << s.row() << ">(fcinfo);\n}\n";
   } else {
@@ -200,9 +198,8 @@ int main(int argc, char **argv) {
 
   const std::string header =
       "-- Written by orv_pg_generate from the catalogue of orvclifn " + version + ".\n";
-  const std::string install = header +
-                              "\\echo Use \"CREATE EXTENSION orvclifn\" to load this file. \\quit\n\n" +
-                              functions;
+  const std::string install =
+      header + "\\echo Use \"CREATE EXTENSION orvclifn\" to load this file. \\quit\n\n" + functions;
   const std::string control =
       "# orvclifn: SQL routines under the tag SYSFUN, in the schema sysfun\n"
       "comment = 'Date and time, numeric, string and phonetic functions that report errors "
@@ -222,10 +219,19 @@ int main(int argc, char **argv) {
   // function has gone; one that has is dropped by hand in its script.
   for (int i = 3; ok && i < argc; ++i) {
     const std::string earlier = argv[i];
-    ok = write(folder + "/orvclifn--" + earlier + "--" + version + ".sql",
-               "-- Written by orv_pg_generate: orvclifn " + earlier + " to " + version + ".\n" +
-                   "\\echo Use \"ALTER EXTENSION orvclifn UPDATE\" to load this file. \\quit\n\n" +
-                   functions);
+    std::string update = "-- Written by orv_pg_generate: orvclifn ";
+    update += earlier;
+    update += " to ";
+    update += version;
+    update += ".\n\\echo Use \"ALTER EXTENSION orvclifn UPDATE\" to load this file. \\quit\n\n";
+    update += functions;
+    std::string path = folder;
+    path += "/orvclifn--";
+    path += earlier;
+    path += "--";
+    path += version;
+    path += ".sql";
+    ok = write(path, update);
   }
   return ok ? 0 : 1;
 }

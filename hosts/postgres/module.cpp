@@ -18,6 +18,8 @@
 
 extern "C" {
 PG_MODULE_MAGIC;
+// The name is PostgreSQL's: it calls the function when it loads the module.
+// NOLINTNEXTLINE(bugprone-reserved-identifier,cert-dcl37-c,cert-dcl51-cpp)
 PGDLLEXPORT void _PG_init(void);
 }
 
@@ -133,17 +135,17 @@ void reportStatus(FunctionCallInfo fcinfo, const cli::call::StatusBuffers &statu
   const char *name = functionName(fcinfo);
   if (const cli::Sysfun code = cli::call::sysfunIn(status.sqlstate, status.message);
       code != cli::Sysfun::none) {
-    ereport(ERROR, (errcode(sqlstateCode(CLI_SQLSTATE_SYSFUN)),
-                    errmsg("%s: SYSFUN:%s: %s", name, cli::textOf(code).digits,
-                           cli::wordsOf(code))));
+    ereport(ERROR,
+            (errcode(sqlstateCode(CLI_SQLSTATE_SYSFUN)),
+             errmsg("%s: SYSFUN:%s: %s", name, cli::textOf(code).digits, cli::wordsOf(code))));
   }
   // Any other status keeps its own SQLSTATE; some are stored without a
   // terminator, so both buffers are read to their size only.
   char sqlstate[6] = {};
   std::memcpy(sqlstate, status.sqlstate, 5);
-  ereport(ERROR, (errcode(sqlstateCode(sqlstate)),
-                  errmsg("%s: %.*s", name, static_cast<int>(sizeof status.message),
-                         status.message)));
+  ereport(ERROR,
+          (errcode(sqlstateCode(sqlstate)),
+           errmsg("%s: %.*s", name, static_cast<int>(sizeof status.message), status.message)));
   pg_unreachable();
 }
 
@@ -204,9 +206,9 @@ bool timestampOf(const char *text, std::size_t size, Timestamp &out) {
   std::int64_t y = 0, mo = 0, d = 0, h = 0, mi = 0, s = 0, f = 0;
   if (size != 26 || text[4] != '-' || text[7] != '-' || text[10] != '-' || text[13] != '.' ||
       text[16] != '.' || text[19] != '.' || !readDigits(text, 4, y) ||
-      !readDigits(text + 5, 2, mo) || !readDigits(text + 8, 2, d) ||
-      !readDigits(text + 11, 2, h) || !readDigits(text + 14, 2, mi) ||
-      !readDigits(text + 17, 2, s) || !readDigits(text + 20, 6, f)) {
+      !readDigits(text + 5, 2, mo) || !readDigits(text + 8, 2, d) || !readDigits(text + 11, 2, h) ||
+      !readDigits(text + 14, 2, mi) || !readDigits(text + 17, 2, s) ||
+      !readDigits(text + 20, 6, f)) {
     return false;
   }
   if (y < 1 || mo < 1 || mo > 12 || d < 1 || d > 31 || h > 23 || mi > 59 || s > 59) return false;
@@ -238,7 +240,7 @@ bytea *resultBytes(const void *data, std::size_t size) {
 
 }  // namespace orv::pg
 
-void _PG_init(void) {
+void _PG_init(void) {  // NOLINT(bugprone-reserved-identifier,cert-dcl37-c,cert-dcl51-cpp)
   orv::pg::findExports();
   orv::pg::defineSettings();
 }

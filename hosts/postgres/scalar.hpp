@@ -182,11 +182,11 @@ struct Output<cat::Layout::text, Longest, R> {
     if constexpr (R == Type::timestamp) {
       Timestamp stamp = 0;
       if (!timestampOf(text, size, stamp)) {
-        ereport(ERROR, (errcode(ERRCODE_INTERNAL_ERROR),
-                        errmsg("%s: the library gave the timestamp text \"%.*s\", which is not "
-                               "of the form YYYY-MM-DD-HH.MM.SS.FFFFFF",
-                               get_func_name(fcinfo->flinfo->fn_oid), static_cast<int>(size),
-                               text)));
+        ereport(ERROR,
+                (errcode(ERRCODE_INTERNAL_ERROR),
+                 errmsg("%s: the library gave the timestamp text \"%.*s\", which is not "
+                        "of the form YYYY-MM-DD-HH.MM.SS.FFFFFF",
+                        get_func_name(fcinfo->flinfo->fn_oid), static_cast<int>(size), text)));
       }
       return TimestampGetDatum(stamp);
     } else {
@@ -307,8 +307,7 @@ bool textFits(const Argument *arguments, std::index_sequence<I...>) {
 
 // The first text argument that doesn't fit, reported.
 template <std::size_t Row>
-[[noreturn]] void reportTooLong(FunctionCallInfo fcinfo, const Argument *arguments,
-                                std::size_t n) {
+[[noreturn]] void reportTooLong(FunctionCallInfo fcinfo, const Argument *arguments, std::size_t n) {
   for (std::size_t i = 0; i < n; ++i) {
     if (arguments[i].size > kTextLimit) {
       reportArgument(fcinfo, ERRCODE_STRING_DATA_RIGHT_TRUNCATION, static_cast<int>(i),

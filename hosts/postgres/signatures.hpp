@@ -124,10 +124,10 @@ constexpr bool scalar(const Routine &r) {
 struct Signature {
   std::string name;  // in lower case, in the schema sysfun
   std::vector<Type> arguments;
-  Type result = Type::int4;          // for a scalar function
-  std::size_t textRow = kNoRow;      // the form for text that fits, or the only form
-  std::size_t lobRow = kNoRow;       // the CLI_udfLob form, for longer text
-  std::string symbol;                // the module's C entry point
+  Type result = Type::int4;      // for a scalar function
+  std::size_t textRow = kNoRow;  // the form for text that fits, or the only form
+  std::size_t lobRow = kNoRow;   // the CLI_udfLob form, for longer text
+  std::string symbol;            // the module's C entry point
   [[nodiscard]] std::size_t row() const { return textRow != kNoRow ? textRow : lobRow; }
   [[nodiscard]] bool table() const { return !scalar(kRoutines[row()]); }
 };
@@ -214,8 +214,8 @@ inline std::vector<Signature> signatures() {
                        std::size_t textRow, std::size_t lobRow) {
     std::string symbol = "orv_pg_" + name;
     for (Type t : arguments) symbol += std::string("_") + sqlType(t);
-    out.push_back({std::move(name), std::move(arguments), result, textRow, lobRow,
-                   std::move(symbol)});
+    out.push_back(
+        {std::move(name), std::move(arguments), result, textRow, lobRow, std::move(symbol)});
   };
   const auto typesOf = [](const Routine &r, Type string) {
     std::vector<Type> types;

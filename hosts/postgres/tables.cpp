@@ -52,7 +52,8 @@ void put16(unsigned char *at, std::int16_t v) { std::memcpy(at, &v, sizeof v); }
 Records serverProcesses() {
   const int count = pgstat_fetch_stat_numbackends();
   Records out;
-  out.data = static_cast<unsigned char *>(palloc0(kThreadRecord * static_cast<std::size_t>(count > 0 ? count : 1)));
+  out.data = static_cast<unsigned char *>(
+      palloc0(kThreadRecord * static_cast<std::size_t>(count > 0 ? count : 1)));
   const bool allStats = has_privs_of_role(GetUserId(), ROLE_PG_READ_ALL_STATS);
   for (int id = 1; id <= count; ++id) {
     const LocalPgBackendStatus *local = pgstat_fetch_stat_local_beentry(id);
@@ -66,9 +67,9 @@ Records serverProcesses() {
     put32(row + 16, static_cast<std::int32_t>(b.st_backendType));
     put32(row + 20, visible ? static_cast<std::int32_t>(b.st_state) : -1);
     const TimestampTz start = b.st_proc_start_timestamp;
-    put32(row + 24, static_cast<std::int32_t>(start / USECS_PER_SEC +
-                                              (POSTGRES_EPOCH_JDATE - UNIX_EPOCH_JDATE) *
-                                                  SECS_PER_DAY));
+    constexpr std::int64_t kEpochShift =
+        std::int64_t{POSTGRES_EPOCH_JDATE - UNIX_EPOCH_JDATE} * SECS_PER_DAY;
+    put32(row + 24, static_cast<std::int32_t>(start / USECS_PER_SEC + kEpochShift));
   }
   return out;
 }
@@ -118,15 +119,15 @@ void defineSettings() {
   DefineCustomStringVariable(
       "orvclifn.instance_path",
       "Instance path under which sqlcache_snapshot() reads tmp/<snapshot name>.sql.",
-      "Empty: the environment variable ORVENGINE_INSTANCE_PATH of the server.", &gInstancePath,
-      "", PGC_SUSET, 0, nullptr, nullptr, nullptr);
+      "Empty: the environment variable ORVENGINE_INSTANCE_PATH of the server.", &gInstancePath, "",
+      PGC_SUSET, 0, nullptr, nullptr, nullptr);
   MarkGUCPrefixReserved("orvclifn");
 }
 
 void prepareEngine() {
   // The engine's services read the instance path from the environment.
-  const char *path = gInstancePath != nullptr && gInstancePath[0] != '\0' ? gInstancePath
-                                                                           : gEnvironmentPath;
+  const char *path =
+      gInstancePath != nullptr && gInstancePath[0] != '\0' ? gInstancePath : gEnvironmentPath;
   if (path != nullptr) {
     setenv(kInstanceVariable, path, 1);
   } else {
@@ -195,8 +196,8 @@ Datum columnValue(FunctionCallInfo fcinfo, const cli::catalogue::Slot &slot, con
       std::uint32_t length = 0;
       std::memcpy(&length, area, sizeof length);
       if (length > slot.size) length = slot.size;
-      return PointerGetDatum(resultText(
-          fcinfo, static_cast<const char *>(area) + CLI_LOB_DATA_OFFSET, length));
+      return PointerGetDatum(
+          resultText(fcinfo, static_cast<const char *>(area) + CLI_LOB_DATA_OFFSET, length));
     }
     default:
       ereport(ERROR, (errmsg("orvclifn: a table column of a layout that the host does not know")));

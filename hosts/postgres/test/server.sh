@@ -7,6 +7,8 @@
 # server is stopped when the script ends, also when it fails.
 #
 #   pg_setup BUILD-FOLDER   make the installation (sets PG_WORK and PG_BIN)
+#   pg_setup --system       use the system's installation as it is, where
+#                           the extension's package has been installed
 #   pg_start NAME [PORT]    initdb and start a server; PORT: listen on
 #                           127.0.0.1 too (sets PG_PORT_<NAME>)
 #   as_server CMD...        run CMD as the servers' user
@@ -32,16 +34,21 @@ pg_cleanup() {
 }
 
 pg_setup() {
-  local build=$1 system_bin system_lib system_share root version entry
+  local build=$1 system_bin system_lib system_share root entry
+  PG_WORK=$(mktemp -d "${TMPDIR:-/tmp}/orvclifn-pg.XXXXXX")
+  chmod 755 "$PG_WORK"
+  (($(id -u) == 0)) && chown postgres "$PG_WORK"
+  trap pg_cleanup EXIT
+  if [[ $build == --system ]]; then
+    PG_BIN=/usr/lib/postgresql/15/bin
+    as_server mkdir -p "$PG_WORK/socket"
+    return 0
+  fi
   system_bin=$(sed -n 's/^ORV_PG_CONFIG:FILEPATH=//p' "$build/CMakeCache.txt")
   [[ -x $system_bin ]] || { echo "no pg_config in the build's cache" >&2; return 1; }
   system_lib=$("$system_bin" --pkglibdir)
   system_share=$("$system_bin" --sharedir)
   system_bin=$("$system_bin" --bindir)
-  PG_WORK=$(mktemp -d "${TMPDIR:-/tmp}/orvclifn-pg.XXXXXX")
-  chmod 755 "$PG_WORK"
-  (($(id -u) == 0)) && chown postgres "$PG_WORK"
-  trap pg_cleanup EXIT
   root=$PG_WORK/install
 
   # The server finds its share and lib folders relative to its program,
