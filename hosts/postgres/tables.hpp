@@ -51,7 +51,7 @@ Datum table(FunctionCallInfo fcinfo) {
   std::int16_t indicators[m];
   std::int16_t *resultIndicators[m];
   for (std::size_t i = 0; i < m; ++i) {
-    areas[i] = palloc(cli::call::areaSize(r.results[i]));
+    areas[i] = palloc0(cli::call::areaSize(r.results[i]));
     resultIndicators[i] = &indicators[i];
   }
   std::int32_t input = n == 1 ? PG_GETARG_INT32(0) : 0;
@@ -109,7 +109,9 @@ Datum table(FunctionCallInfo fcinfo) {
       Datum values[m];
       bool nulls[m];
       for (std::size_t i = 0; i < m; ++i) {
-        nulls[i] = indicators[i] < 0;
+        // A column that the routine left alone is NULL; a terminated-text
+        // column, which it writes on every row without its indicator, is not.
+        nulls[i] = indicators[i] < 0 && r.results[i].layout != cat::Layout::text;
         values[i] = nulls[i] ? 0 : columnValue(fcinfo, r.results[i], areas[i]);
       }
       tuplestore_putvalues(rsinfo->setResult, rsinfo->setDesc, values, nulls);

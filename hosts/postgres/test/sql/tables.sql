@@ -11,7 +11,10 @@ CREATE TABLE fmp_seen (a int, b text, c int PRIMARY KEY);
 SELECT columns, chr(kind) AS kind, chr(persistence) AS persistence, has_index
   FROM sysfun.fmprows() WHERE table_oid = 'fmp_seen'::regclass::oid::int4;
 DROP TABLE fmp_seen;
--- SQLCACHE_SNAPSHOT without a snapshot file: an empty table.
+-- SQLCACHE_SNAPSHOT: the snapshot that the test wrote under the server's
+-- ORVENGINE_INSTANCE_PATH, and none under a setting that points elsewhere.
+SELECT element_554, element_540, element_585_301, section, statement
+  FROM sysfun.sqlcache_snapshot() ORDER BY element_554;
 SET orvclifn.instance_path = '/nonexistent';
 SELECT count(*) AS statements FROM sysfun.sqlcache_snapshot();
 RESET orvclifn.instance_path;
