@@ -55,8 +55,8 @@ const char *functionName(FunctionCallInfo fcinfo) {
 
 int sqlstateCode(const char *s) { return MAKE_SQLSTATE(s[0], s[1], s[2], s[3], s[4]); }
 
-// Days since 1970-01-01 of a date of the proleptic Gregorian calendar, and
-// back (the era-based method: 400-year eras of 146097 days).
+// Days since 1970-01-01 of a date of the proleptic Gregorian calendar (the
+// era-based method: 400-year eras of 146097 days).
 constexpr std::int64_t daysFromCivil(std::int64_t y, unsigned m, unsigned d) {
   y -= m <= 2 ? 1 : 0;
   const std::int64_t era = (y >= 0 ? y : y - 399) / 400;
@@ -64,22 +64,6 @@ constexpr std::int64_t daysFromCivil(std::int64_t y, unsigned m, unsigned d) {
   const unsigned doy = (153 * (m > 2 ? m - 3 : m + 9) + 2) / 5 + d - 1;
   const unsigned doe = yoe * 365 + yoe / 4 - yoe / 100 + doy;
   return era * 146097 + static_cast<std::int64_t>(doe) - 719468;
-}
-
-struct Civil {
-  std::int64_t year;
-  unsigned month, day;
-};
-constexpr Civil civilFromDays(std::int64_t z) {
-  z += 719468;
-  const std::int64_t era = (z >= 0 ? z : z - 146096) / 146097;
-  const auto doe = static_cast<unsigned>(z - era * 146097);
-  const unsigned yoe = (doe - doe / 1460 + doe / 36524 - doe / 146096) / 365;
-  const unsigned doy = doe - (365 * yoe + yoe / 4 - yoe / 100);
-  const unsigned mp = (5 * doy + 2) / 153;
-  const unsigned d = doy - (153 * mp + 2) / 5 + 1;
-  const unsigned m = mp < 10 ? mp + 3 : mp - 9;
-  return {static_cast<std::int64_t>(yoe) + era * 400 + (m <= 2 ? 1 : 0), m, d};
 }
 
 // PostgreSQL counts days and microseconds from 2000-01-01.
@@ -93,15 +77,49 @@ void digits(char *out, std::int64_t value, int width) {
   }
 }
 
+// "00" to "99", to write two digits at a time.
+constexpr auto kDigitPairs = [] {
+  std::array<char, 200> pairs{};
+  for (std::size_t i = 0; i < 100; ++i) {
+    pairs[2 * i] = static_cast<char>('0' + i / 10);
+    pairs[2 * i + 1] = static_cast<char>('0' + i % 10);
+  }
+  return pairs;
+}();
+
+void twoDigits(char *out, std::uint32_t value) {
+  std::memcpy(out, &kDigitPairs[2 * std::size_t{value}], 2);
+}
+
+static_assert(kFirstDay == daysFromCivil(1, 1, 1) - kEpochShift);
+static_assert(kLastDay == daysFromCivil(9999, 12, 31) - kEpochShift);
+
 // YYYY-MM-DD for days since 2000-01-01; 0 outside the years 1 to 9999.
+// The hot path of every date argument.  Within those years the days since
+// 0000-03-01 are positive and below 2^22, so the date comes from Neri and
+// Schneider's Euclidean affine functions in unsigned arithmetic: a product
+// and a shift where the era method divides (a year runs from March, so
+// that its leap day comes last).
 std::size_t writeDate(std::int64_t days, char *out) {
-  const Civil c = civilFromDays(days + kEpochShift);
-  if (c.year < 1 || c.year > 9999) return 0;
-  digits(out, c.year, 4);
+  if (days < kFirstDay || days > kLastDay) return 0;
+  const auto n = static_cast<std::uint32_t>(days + kEpochShift + 719468);
+  const std::uint32_t n1 = 4 * n + 3;
+  const std::uint32_t century = n1 / 146097;
+  const std::uint32_t n2 = n1 % 146097 | 3;
+  const std::uint64_t p2 = std::uint64_t{2939745} * n2;
+  const auto yearOfCentury = static_cast<std::uint32_t>(p2 >> 32);
+  const std::uint32_t dayOfYear = static_cast<std::uint32_t>(p2) / 2939745 / 4;
+  const std::uint32_t n3 = 2141 * dayOfYear + 197913;
+  const bool january = dayOfYear >= 306;  // January or February: the next year
+  const std::uint32_t year = 100 * century + yearOfCentury + (january ? 1 : 0);
+  const std::uint32_t month = (n3 >> 16) - (january ? 12 : 0);
+  const std::uint32_t day = (n3 & 0xffff) / 2141 + 1;
+  twoDigits(out, year / 100);
+  twoDigits(out + 2, year % 100);
   out[4] = '-';
-  digits(out + 5, c.month, 2);
+  twoDigits(out + 5, month);
   out[7] = '-';
-  digits(out + 8, c.day, 2);
+  twoDigits(out + 8, day);
   return 10;
 }
 
@@ -118,6 +136,28 @@ std::size_t writeTime(std::int64_t micros, char *out, bool fraction) {
   out[8] = '.';
   digits(out + 9, micros % USECS_PER_SEC, 6);
   return 15;
+}
+
+// Whether the bytes are ASCII without a NUL, which every server encoding
+// takes as it is.  Most results are; for a short one this word-wide test
+// costs less than the call of the encoding's verifier, which does the same
+// test itself on longer text.
+constexpr std::size_t kShortText = 64;
+bool plainAscii(const char *data, std::size_t size) {
+  constexpr std::uint64_t kOnes = 0x0101010101010101, kHigh = 0x8080808080808080;
+  std::size_t i = 0;
+  for (; i + 8 <= size; i += 8) {
+    std::uint64_t w = 0;
+    std::memcpy(&w, data + i, 8);
+    // A high bit, or a zero byte: (w - 1) & ~w sets the high bit of the
+    // lowest zero byte, and of none when there is none.
+    if (((w | ((w - kOnes) & ~w)) & kHigh) != 0) return false;
+  }
+  for (; i < size; ++i) {
+    const auto c = static_cast<unsigned char>(data[i]);
+    if (c == 0 || c >= 0x80) return false;
+  }
+  return true;
 }
 
 bool readDigits(const char *p, int width, std::int64_t &out) {
@@ -220,7 +260,8 @@ bool timestampOf(const char *text, std::size_t size, Timestamp &out) {
 
 text *resultText(FunctionCallInfo fcinfo, const char *data, std::size_t size) {
   const int length = static_cast<int>(size);
-  if (!pg_verify_mbstr(GetDatabaseEncoding(), data, length, true)) {
+  if (!(size <= kShortText && plainAscii(data, size)) &&
+      !pg_verify_mbstr(GetDatabaseEncoding(), data, length, true)) {
     ereport(ERROR,
             (errcode(ERRCODE_CHARACTER_NOT_IN_REPERTOIRE),
              errmsg("%s: the result is not valid %s text", functionName(fcinfo),

@@ -35,10 +35,26 @@ const void *databaseInfo(FunctionCallInfo fcinfo);
 // arithmetic: 2001-09-27, 13.30.15, 2001-09-27-13.30.15.000000.  Each
 // returns the length, or 0 when the value lies outside the years 1 to 9999
 // (or is infinite).
-inline constexpr std::size_t kDatetimeRoom = 32;
 std::size_t dateText(DateADT date, char *out);
 std::size_t timeText(TimeADT time, char *out);
 std::size_t timestampText(Timestamp stamp, char *out);
+
+// The lengths of those forms, and whether a value has one: told apart
+// before the text is written, so that it can be written where the routine
+// reads it.
+inline constexpr std::size_t kDateSize = 10, kTimeSize = 8, kTimestampSize = 26;
+
+// 0001-01-01 and 9999-12-31 in PostgreSQL's days since 2000-01-01.
+inline constexpr std::int64_t kFirstDay = -730119, kLastDay = 2921939;
+
+inline bool dateFits(DateADT date) {
+  return !DATE_NOT_FINITE(date) && date >= kFirstDay && date <= kLastDay;
+}
+inline bool timestampFits(Timestamp stamp) {
+  if (TIMESTAMP_NOT_FINITE(stamp)) return false;
+  const std::int64_t days = stamp / USECS_PER_DAY - (stamp % USECS_PER_DAY < 0 ? 1 : 0);
+  return days >= kFirstDay && days <= kLastDay;
+}
 
 // A timestamp text of exactly the form 2001-09-27-13.30.15.000000 as a
 // timestamp; false for any other text.

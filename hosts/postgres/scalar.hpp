@@ -15,7 +15,6 @@
 #include <cstddef>
 #include <cstdint>
 #include <cstring>
-#include <tuple>
 #include <utility>
 
 #include "catalogue/catalogue.hpp"
@@ -30,20 +29,32 @@ namespace orv::pg {
 inline constexpr std::size_t kTextLimit = CLI_TEXT_LIMIT;
 inline constexpr std::size_t kLobLimit = CLI_LOB_LIMIT;
 
-// One argument as PostgreSQL handed it, read once: a number, or a string's
-// bytes (for a date or time value, its text form, written into `datetime`).
+// What a date or time argument is.  Its text form is written where the
+// routine's input is laid out, with no copy in between.
+enum class Datetime : unsigned char { none, date, time, timestamp };
+
+// One argument as PostgreSQL handed it, read once: a number, a string's
+// bytes, or a date or time value (in `integer`, `size` the length of its
+// text form).
 struct Argument {
   bool null;
+  Datetime datetime;
   std::int64_t integer;
   double real;
   const char *bytes;
   std::size_t size;
-  char datetime[kDatetimeRoom];
 };
 
+// The arguments are not zeroed first, as that costs more on every call
+// than a short routine does: this sets every member.
 template <Type T>
 void readArgument(FunctionCallInfo fcinfo, int i, Argument &a) {
   a.null = PG_ARGISNULL(i);
+  a.datetime = Datetime::none;
+  a.integer = 0;
+  a.real = 0;
+  a.bytes = nullptr;
+  a.size = 0;
   if (a.null) return;
   const Datum d = PG_GETARG_DATUM(i);
   if constexpr (T == Type::int2) {
@@ -59,22 +70,46 @@ void readArgument(FunctionCallInfo fcinfo, int i, Argument &a) {
     a.bytes = VARDATA_ANY(v);
     a.size = VARSIZE_ANY_EXHDR(v);
   } else {
-    a.bytes = a.datetime;
+    bool fits = true;
     if constexpr (T == Type::date) {
-      a.size = dateText(DatumGetDateADT(d), a.datetime);
+      a.datetime = Datetime::date;
+      a.integer = DatumGetDateADT(d);
+      a.size = kDateSize;
+      fits = dateFits(DatumGetDateADT(d));
     } else if constexpr (T == Type::time) {
-      a.size = timeText(DatumGetTimeADT(d), a.datetime);
-    } else if constexpr (T == Type::timestamp) {
-      a.size = timestampText(DatumGetTimestamp(d), a.datetime);
+      a.datetime = Datetime::time;
+      a.integer = DatumGetTimeADT(d);
+      a.size = kTimeSize;
     } else {
-      // In the session's time zone, as PostgreSQL's own cast gives it.
-      const Datum local = DirectFunctionCall1(timestamptz_timestamp, d);
-      a.size = timestampText(DatumGetTimestamp(local), a.datetime);
+      // A timestamp with time zone in the session's time zone, as
+      // PostgreSQL's own cast gives it.
+      const Datum local = T == Type::timestamp ? d : DirectFunctionCall1(timestamptz_timestamp, d);
+      a.datetime = Datetime::timestamp;
+      a.integer = DatumGetTimestamp(local);
+      a.size = kTimestampSize;
+      fits = timestampFits(DatumGetTimestamp(local));
     }
-    if (a.size == 0) {
+    if (!fits) {
       reportArgument(fcinfo, ERRCODE_DATETIME_VALUE_OUT_OF_RANGE, i, nullptr,
                      "lies outside the years 1 to 9999 that the library takes");
     }
+  }
+}
+
+// The text form of a date or time argument that fits, at `out`.
+inline void writeDatetime(const Argument &a, char *out) {
+  switch (a.datetime) {
+    case Datetime::date:
+      dateText(static_cast<DateADT>(a.integer), out);
+      return;
+    case Datetime::time:
+      timeText(a.integer, out);
+      return;
+    case Datetime::timestamp:
+      timestampText(a.integer, out);
+      return;
+    case Datetime::none:
+      break;
   }
 }
 
@@ -112,7 +147,11 @@ struct Input<cat::Layout::text, S> {
       text[0] = '\0';
       return;
     }
-    std::memcpy(text, a.bytes, a.size);
+    if (a.datetime != Datetime::none) {
+      writeDatetime(a, text);
+    } else {
+      std::memcpy(text, a.bytes, a.size);
+    }
     text[a.size] = '\0';
   }
   void *pointer() { return text; }
@@ -141,6 +180,25 @@ struct Input<cat::Layout::fixedBytes, Size> {
   }
   void *pointer() { return value; }
 };
+
+// The inputs of one call, each in its layout, reached by index with
+// inputAt<I>.  Unlike a std::tuple, which value-initialises its members,
+// this is default-initialised: a text input is an area of 4001 bytes, and
+// zeroing those on every call would cost more than most routines do.  Each
+// load() writes everything that the routine reads.
+template <std::size_t I, typename T>
+struct HeldInput {
+  T value;
+};
+template <typename Indices, typename... T>
+struct Inputs;
+template <std::size_t... I, typename... T>
+struct Inputs<std::index_sequence<I...>, T...> : HeldInput<I, T>... {};
+
+template <std::size_t I, typename T>
+T &inputAt(HeldInput<I, T> &held) {
+  return held.value;
+}
 
 // A result in the layout L, and its value for PostgreSQL as type R.
 template <cat::Layout L, std::uint32_t Size, Type R>
@@ -270,13 +328,14 @@ Outcome callRow(FunctionCallInfo fcinfo, const Argument *arguments, Datum &out,
   };
   (checkSize(I), ...);
 
-  // Plain data only: a tuple of such members has no destructor to skip.
-  std::tuple<Input<r.inputs[I].layout, r.inputs[I].size>...> inputs;
-  (..., std::get<I>(inputs).load(arguments[I]));
+  // Plain data only: no destructor to skip, and nothing zeroed.
+  [[maybe_unused]] Inputs<std::index_sequence<I...>, Input<r.inputs[I].layout, r.inputs[I].size>...>
+      inputs;
+  (..., inputAt<I>(inputs).load(arguments[I]));
   Output<r.results[0].layout, r.results[0].size, Result> result;
   result.prepare();
 
-  void *values[] = {std::get<I>(inputs).pointer()..., nullptr};
+  void *values[] = {inputAt<I>(inputs).pointer()..., nullptr};
   void *results[] = {result.pointer()};
   std::int16_t *inputNulls[] = {&inputIndicators[I]..., nullptr};
   std::int16_t *resultNulls[] = {&resultIndicator};
@@ -318,14 +377,34 @@ template <std::size_t Row>
   pg_unreachable();
 }
 
+constexpr bool isDatetime(Type t) {
+  return t == Type::date || t == Type::time || t == Type::timestamp || t == Type::timestamptz;
+}
+
+// Whether every date or time argument reaches an input of terminated text,
+// the only input that writes their text forms.
+template <std::size_t TextRow, std::size_t LobRow, Type... Args>
+constexpr bool datetimeAsText() {
+  constexpr Type types[] = {Args..., Type::int4};
+  for (std::size_t i = 0; i < sizeof...(Args); ++i) {
+    if (!isDatetime(types[i])) continue;
+    if (LobRow != kNoRow || TextRow == kNoRow ||
+        cat::kRoutines[TextRow].inputs[i].layout != cat::Layout::text) {
+      return false;
+    }
+  }
+  return true;
+}
+
 // The scalar function of one signature: TextRow serves text that fits,
 // LobRow longer text, bytea, and calls that TextRow refuses for a length
 // rule.  Either may be kNoRow.
 template <std::size_t TextRow, std::size_t LobRow, Type Result, Type... Args>
 Datum scalar(FunctionCallInfo fcinfo) {
   constexpr std::size_t n = sizeof...(Args);
+  static_assert(datetimeAsText<TextRow, LobRow, Args...>());
   using Indices = std::make_index_sequence<n>;
-  Argument arguments[n > 0 ? n : 1] = {};
+  Argument arguments[n > 0 ? n : 1];
   [&]<std::size_t... I>(std::index_sequence<I...>) {
     (readArgument<Args>(fcinfo, static_cast<int>(I), arguments[I]), ...);
   }

@@ -1,3 +1,4 @@
+# shellcheck shell=bash
 # Throwaway PostgreSQL servers for the extension's tests, sourced by the
 # test scripts.  Nothing here touches the system's own PostgreSQL: the
 # extension is installed into a private copy of the server's installation
