@@ -57,15 +57,9 @@ PreparedCall::PreparedCall(const cat::Routine &row, const void *const *inputs, v
   }
   results_[0] = result;
   resultIndicators_[0] = &indicators_[n];
-  cli::call::Frame f;
-  f.inputs = inputs_.data();
-  f.results = results_.data();
-  f.inputIndicators = inputIndicators_.data();
-  f.resultIndicators = resultIndicators_.data();
-  f.sqlstate = status_.sqlstate;
-  f.functionName = row.sqlName;
-  f.specificName = row.symbol;
-  f.message = status_.message;
+  cli::call::Frame f =
+      cli::call::frameOf(row, inputs_.data(), results_.data(), inputIndicators_.data(),
+                         resultIndicators_.data(), status_);
   f.dbinfo = dbinfo;
   count_ = cli::call::layOut(row, f, args_.data());
 }

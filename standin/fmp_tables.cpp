@@ -89,31 +89,25 @@ std::vector<unsigned char> threadRows(std::int32_t selector) {
   return out;
 }
 
-std::int32_t *slotPointer(std::uint64_t slot) {
-  std::int32_t *p = nullptr;
-  std::memcpy(&p, &slot, sizeof p);
-  return p;
-}
-
 // Open requests hand out a table in a block of its own; close takes it back.
 }  // namespace
 
 std::int32_t fmpCallback(std::int32_t /*slots*/, void *request) {
   auto *slot = static_cast<std::uint64_t *>(request);
-  const std::int32_t code = *slotPointer(slot[0]);
+  const std::int32_t code = *requestField(slot[0]);
   if (code == 1) {
-    std::free(slotPointer(slot[1]));
+    std::free(requestField(slot[1]));
     return 0;
   }
   if (code != 2 && code != 3) return -1;
   const bool threads = code == 3;
   const std::vector<unsigned char> rows =
-      threads ? threadRows(*slotPointer(slot[1])) : routineRows();
+      threads ? threadRows(*requestField(slot[1])) : routineRows();
   const std::size_t rowSize = threads ? 28 : 16;
   void *table = std::malloc(rows.empty() ? 1 : rows.size());
   if (table == nullptr) return -2;
   if (!rows.empty()) std::memcpy(table, rows.data(), rows.size());
-  *slotPointer(slot[threads ? 2 : 1]) = static_cast<std::int32_t>(rows.size() / rowSize);
+  *requestField(slot[threads ? 2 : 1]) = static_cast<std::int32_t>(rows.size() / rowSize);
   std::memcpy(&slot[threads ? 3 : 2], &table, sizeof table);
   return threads && rows.empty() ? -3 : 0;
 }

@@ -7,8 +7,17 @@
 #pragma once
 
 #include <cstdint>
+#include <cstring>
 
 namespace orv::standin {
+
+// The 32-bit field that a slot of a request record points at: the request
+// code, the input, or the row count.
+inline std::int32_t *requestField(std::uint64_t slot) {
+  std::int32_t *p = nullptr;
+  std::memcpy(&p, &slot, sizeof p);
+  return p;
+}
 
 // Answers a request record of the Fmp routines: an open request hands out
 // a table in a block of its own, which the close request takes back.

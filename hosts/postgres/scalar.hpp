@@ -339,15 +339,7 @@ Outcome callRow(FunctionCallInfo fcinfo, const Argument *arguments, Datum &out,
   void *results[] = {result.pointer()};
   std::int16_t *inputNulls[] = {&inputIndicators[I]..., nullptr};
   std::int16_t *resultNulls[] = {&resultIndicator};
-  cli::call::Frame f;
-  f.inputs = values;
-  f.results = results;
-  f.inputIndicators = inputNulls;
-  f.resultIndicators = resultNulls;
-  f.sqlstate = status.sqlstate;
-  f.functionName = r.sqlName;
-  f.specificName = r.symbol;
-  f.message = status.message;
+  cli::call::Frame f = cli::call::frameOf(r, values, results, inputNulls, resultNulls, status);
   if constexpr (r.frame == cat::Frame::dbinfo) f.dbinfo = databaseInfo(fcinfo);
   if constexpr (r.frame == cat::Frame::scratchpad) f.scratchpad = statementScratchpad(fcinfo);
   cli::call::call<Row>(gExports[Row], f);

@@ -18,6 +18,7 @@
 #include <cstdlib>
 #include <cstring>
 
+#include "fmp_tables.hpp"
 #include "tables.hpp"
 
 extern "C" {
@@ -30,6 +31,8 @@ extern "C" {
 
 namespace orv::pg {
 namespace {
+
+using orv::standin::requestField;
 
 char *gInstancePath = nullptr;     // the setting
 char *gEnvironmentPath = nullptr;  // ORVENGINE_INSTANCE_PATH as the server started
@@ -103,12 +106,6 @@ Records databaseTables() {
   return out;
 }
 
-std::int32_t *slotPointer(std::uint64_t slot) {
-  std::int32_t *p = nullptr;
-  std::memcpy(&p, &slot, sizeof p);
-  return p;
-}
-
 }  // namespace
 
 void defineSettings() {
@@ -146,20 +143,20 @@ void releaseEngine() {
 
 std::int32_t engineCallback(std::int32_t /*slots*/, void *request) {
   auto *slot = static_cast<std::uint64_t *>(request);
-  const std::int32_t code = *slotPointer(slot[0]);
+  const std::int32_t code = *requestField(slot[0]);
   if (code == 1) {  // close: the table comes back
     gSelected = nullptr;
     return 0;
   }
   if (code == 2) {  // open FmpRows
-    *slotPointer(slot[1]) = gRows.count;
+    *requestField(slot[1]) = gRows.count;
     std::memcpy(&slot[2], &gRows.data, sizeof gRows.data);
     return 0;
   }
   if (code != 3) return -1;
   // open FmpThreads: the rows of the selected processes, moved to the front
   // of the prepared table, which is the host's to reorder.
-  const std::int32_t selector = *slotPointer(slot[1]);
+  const std::int32_t selector = *requestField(slot[1]);
   std::int32_t kept = 0;
   for (std::int32_t i = 0; i < gThreads.count; ++i) {
     unsigned char *row = gThreads.data + kThreadRecord * static_cast<std::size_t>(i);
@@ -170,7 +167,7 @@ std::int32_t engineCallback(std::int32_t /*slots*/, void *request) {
                  kThreadRecord);
   }
   gSelected = gThreads.data;
-  *slotPointer(slot[2]) = kept;
+  *requestField(slot[2]) = kept;
   std::memcpy(&slot[3], &gSelected, sizeof gSelected);
   return kept == 0 ? -3 : 0;
 }

@@ -61,15 +61,8 @@ Datum table(FunctionCallInfo fcinfo) {
   void *scratchpad = palloc0(256);
   std::int32_t callType = CLI_CALL_OPEN;
   cli::call::StatusBuffers status;
-  cli::call::Frame f;
-  f.inputs = inputs;
-  f.results = areas;
-  f.inputIndicators = inputIndicators;
-  f.resultIndicators = resultIndicators;
-  f.sqlstate = status.sqlstate;
-  f.functionName = r.sqlName;
-  f.specificName = r.symbol;
-  f.message = status.message;
+  cli::call::Frame f =
+      cli::call::frameOf(r, inputs, areas, inputIndicators, resultIndicators, status);
   f.scratchpad = scratchpad;
   f.callType = &callType;
   f.callback = engineCallback;

@@ -92,15 +92,7 @@ void callRow(const Call &c, std::index_sequence<Is...>) {
   std::int16_t *inputNulls[] = {&inputIndicators[Is]..., nullptr};
   std::int16_t *resultNulls[] = {&resultIndicator};
   cli::call::StatusBuffers status;
-  cli::call::Frame f;
-  f.inputs = values;
-  f.results = results;
-  f.inputIndicators = inputNulls;
-  f.resultIndicators = resultNulls;
-  f.sqlstate = status.sqlstate;
-  f.functionName = r.sqlName;
-  f.specificName = r.symbol;
-  f.message = status.message;
+  cli::call::Frame f = cli::call::frameOf(r, values, results, inputNulls, resultNulls, status);
   if constexpr (r.frame == Frame::dbinfo) f.dbinfo = kDatabaseInfo.data();
   if constexpr (r.frame == Frame::scratchpad) {
     f.scratchpad = statementScratchpad(c.context);

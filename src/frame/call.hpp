@@ -162,6 +162,24 @@ struct StatusBuffers {
   [[nodiscard]] bool stored() const noexcept { return sqlstate[0] != '\0'; }
 };
 
+// The frame of one call of `row`: these values and indicators, the buffers
+// of `status`, and the row's SQL name and export name as the function and
+// specific names.  The extras are the caller's to add.
+inline Frame frameOf(const cat::Routine &row, void *const *inputs, void *const *results,
+                     std::int16_t *const *inputIndicators, std::int16_t *const *resultIndicators,
+                     StatusBuffers &status) noexcept {
+  Frame f;
+  f.inputs = inputs;
+  f.results = results;
+  f.inputIndicators = inputIndicators;
+  f.resultIndicators = resultIndicators;
+  f.sqlstate = status.sqlstate;
+  f.functionName = row.sqlName;
+  f.specificName = row.symbol;
+  f.message = status.message;
+  return f;
+}
+
 // The SYSFUN code in a call's status buffers, or none when the status is
 // no SYSFUN error (or there is no status).
 inline Sysfun sysfunIn(const char *sqlstate, const char *message) noexcept {

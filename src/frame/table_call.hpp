@@ -42,15 +42,8 @@ class TableCall {
       resultIndicators[i] = &indicators_[i];
       if (row.results[i].layout == cat::Layout::lob) lobColumns_[lobs_++] = i;
     }
-    Frame f;
-    f.inputs = inputValues_.data();
-    f.results = areas.data();
-    f.inputIndicators = inputIndicators.data();
-    f.resultIndicators = resultIndicators.data();
-    f.sqlstate = status_.sqlstate;
-    f.functionName = row.sqlName;
-    f.specificName = row.symbol;
-    f.message = status_.message;
+    Frame f = frameOf(row, inputValues_.data(), areas.data(), inputIndicators.data(),
+                      resultIndicators.data(), status_);
     f.scratchpad = scratchpad_.data();
     f.callType = &callType_;
     f.callback = callback;
