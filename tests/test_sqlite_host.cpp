@@ -194,6 +194,18 @@ TEST_F(SqliteHost, ReadsTheSnapshotAndTheFmpTablesAsTables) {
   EXPECT_EQ(eval("SELECT column2 FROM fmprows WHERE column1 = 0"), "8");  // SPACE: 8 arguments
   EXPECT_EQ(eval("SELECT count(*) > 0 FROM fmpthreads(0)"), "1");
   EXPECT_EQ(eval("SELECT count(*) FROM fmpthreads(-5)"), "0");
+  // The hidden selector is checked as a scalar argument is.
+  const Case selectors[] = {
+      {"SELECT count(*) FROM fmpthreads WHERE selector = NULL", "0"},
+      {"SELECT count(*) > 0 FROM fmpthreads(0.0)", "1"},
+      {"SELECT count(*) FROM fmpthreads(4294967296)",
+       "error: FmpThreads: argument 1 (selector) is 4294967296, outside the 32-bit range"},
+      {"SELECT count(*) FROM fmpthreads(-1.5)",
+       "error: FmpThreads: argument 1 (selector) is -1.5, not a whole number in the 32-bit range"},
+      {"SELECT count(*) FROM fmpthreads('x')",
+       "error: FmpThreads: argument 1 (selector) is not a number"},
+  };
+  for (const Case &c : selectors) EXPECT_EQ(eval(c.sql), c.expected) << c.sql;
 }
 
 TEST_F(SqliteHost, RegistersDeterministicInnocuousFunctionsWithoutHidingBuiltIns) {

@@ -13,6 +13,7 @@ SQLITE_EXTENSION_INIT3
 
 #include <dlfcn.h>
 
+#include <cmath>
 #include <cstdint>
 #include <memory>
 #include <string>
@@ -119,10 +120,60 @@ int close(sqlite3_vtab_cursor *cur) {
   return SQLITE_OK;
 }
 
+// The hidden input column's value, checked as a scalar argument is: a
+// whole number in the 32-bit range of the routine's input.  NULL matches no
+// row, as `selector = NULL` is never true.
+enum class Hidden : unsigned char { value, null, bad };
+
+Hidden hiddenInput(sqlite3_vtab_cursor *cur, sqlite3_value *v, std::int32_t &out) {
+  const Routine &r = static_cast<Cursor *>(cur)->call.row();
+  const char *name = r.inputs[0].name;
+  switch (sqlite3_value_numeric_type(v)) {
+    case SQLITE_NULL:
+      return Hidden::null;
+    case SQLITE_INTEGER: {
+      const sqlite3_int64 x = sqlite3_value_int64(v);
+      if (x >= INT32_MIN && x <= INT32_MAX) {
+        out = static_cast<std::int32_t>(x);
+        return Hidden::value;
+      }
+      cur->pVtab->zErrMsg = sqlite3_mprintf("%s: argument 1 (%s) is %lld, outside the 32-bit range",
+                                            r.sqlName, name, x);
+      return Hidden::bad;
+    }
+    case SQLITE_FLOAT: {
+      const double d = sqlite3_value_double(v);
+      if (d == std::trunc(d) && d >= INT32_MIN && d <= INT32_MAX) {
+        out = static_cast<std::int32_t>(d);
+        return Hidden::value;
+      }
+      cur->pVtab->zErrMsg =
+          sqlite3_mprintf("%s: argument 1 (%s) is %!.17g, not a whole number in the 32-bit range",
+                          r.sqlName, name, d);
+      return Hidden::bad;
+    }
+    default:
+      cur->pVtab->zErrMsg = sqlite3_mprintf("%s: argument 1 (%s) is not a number", r.sqlName, name);
+      return Hidden::bad;
+  }
+}
+
 int filter(sqlite3_vtab_cursor *cur, int idxNum, const char *, int argc, sqlite3_value **argv) {
   auto *c = static_cast<Cursor *>(cur);
   closeRoutine(*c);
-  c->input = idxNum == 1 && argc > 0 ? sqlite3_value_int(argv[0]) : 0;
+  c->input = 0;
+  c->atEnd = false;
+  if (idxNum == 1 && argc > 0) {
+    switch (hiddenInput(cur, argv[0], c->input)) {
+      case Hidden::value:
+        break;
+      case Hidden::null:
+        c->atEnd = true;
+        return SQLITE_OK;
+      case Hidden::bad:
+        return SQLITE_ERROR;
+    }
+  }
   if (inputCount(c->call.row()) == 1) c->call.setInput(0, &c->input);
   c->rowid = 0;
   const bool opened = c->call.open();
