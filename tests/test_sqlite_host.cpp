@@ -208,6 +208,29 @@ TEST_F(SqliteHost, ReadsTheSnapshotAndTheFmpTablesAsTables) {
   for (const Case &c : selectors) EXPECT_EQ(eval(c.sql), c.expected) << c.sql;
 }
 
+TEST_F(SqliteHost, TellsItsVersionAndWhatEachNameReaches) {
+  const std::string version = eval("SELECT sysfun_version()");
+  EXPECT_EQ(version.find_first_not_of("0123456789."), std::string::npos) << version;
+  EXPECT_EQ(
+      eval("SELECT exports || ' / ' || arguments || ' / ' || sysfun_codes || ' / ' || "
+           "plain_name FROM sysfun_functions WHERE name = 'sysfun_left'"),
+      "CLI_udfLEFT1, CLI_udfLEFT2 / string: text | CLI_udfLob, n: 32-bit integer / 01 / left");
+  EXPECT_EQ(eval("SELECT exports FROM sysfun_functions WHERE name = 'sysfun_julian_day1'"),
+            "CLI_udfJULIAN_DAY1");
+  // Every row names a function that SQLite has with that argument count,
+  // under both names where a plain name is given, and every registered
+  // sysfun_ function has its row.
+  EXPECT_EQ(eval("SELECT count(*) FROM sysfun_functions f WHERE NOT EXISTS (SELECT 1 FROM "
+                 "pragma_function_list p WHERE p.name = f.name AND p.narg = f.argument_count) "
+                 "OR (f.plain_name IS NOT NULL AND NOT EXISTS (SELECT 1 FROM pragma_function_list "
+                 "p WHERE p.name = f.plain_name AND p.narg = f.argument_count))"),
+            "0");
+  EXPECT_EQ(eval("SELECT count(*) FROM pragma_function_list p WHERE substr(p.name, 1, 7) = "
+                 "'sysfun_' AND p.name <> 'sysfun_version' AND NOT EXISTS (SELECT 1 FROM "
+                 "sysfun_functions f WHERE f.name = p.name AND f.argument_count = p.narg)"),
+            "0");
+}
+
 TEST_F(SqliteHost, RegistersDeterministicInnocuousFunctionsWithoutHidingBuiltIns) {
   EXPECT_EQ(eval("SELECT count(*) FROM pragma_function_list WHERE name IN ('sysfun_space', "
                  "'lcase', 'sysfun_ascii3') AND flags & 0x200800 = 0x200800"),

@@ -16,6 +16,7 @@ SQLITE_EXTENSION_INIT1
 #include <string>
 #include <vector>
 
+#include "about.hpp"
 #include "builtin_names.hpp"
 #include "connection.hpp"
 #include "frame/cliudf.h"
@@ -110,6 +111,7 @@ int initialise(sqlite3 *db, char **error) {
       rc = registerFunction(db, groups[g].plainName, groups[g], shared);
   }
   if (--shared->functions == 0) delete shared;
+  if (rc == SQLITE_OK) rc = orv::host::registerAbout(db, groups, plain);
   if (rc != SQLITE_OK) {
     *error = sqlite3_mprintf("orvclifn: %s", sqlite3_errmsg(db));
     return rc;
