@@ -99,6 +99,24 @@ TEST_F(SqliteHost, PicksTheFormByTheKindsOfTheArguments) {
   for (const Case &c : cases) EXPECT_EQ(eval(c.sql), c.expected) << c.sql;
 }
 
+// A call that the terminated-text form refuses only because its result
+// would pass 4000 bytes is served by the CLI_udfLob form, with a TEXT
+// result for TEXT arguments.
+TEST_F(SqliteHost, GrowsPastTheTerminatedTextLimitThroughTheLongForm) {
+  const Case cases[] = {
+      {"SELECT typeof(REPEAT('a', 100000)) || length(REPEAT('a', 100000))", "text100000"},
+      {"SELECT REPEAT('ab', 2001) = sysfun_repeat2('ab', 2001)", "1"},
+      {"SELECT length(sysfun_replace(printf('%.3000c', 'a'), 'a', 'bb'))", "6000"},
+      {"SELECT length(\"INSERT\"(printf('%.3000c', 'a'), 1, 0, printf('%.3000c', 'b')))", "6000"},
+      {"SELECT typeof(REPEAT(x'61', 5000))", "blob"},
+      // By its own name an export takes its own form only.
+      {"SELECT sysfun_repeat1('ab', 2001)",
+       "error: sysfun_repeat1: SQLSTATE 38552, SYSFUN:10: a string would be longer than the "
+       "function allows"},
+  };
+  for (const Case &c : cases) EXPECT_EQ(eval(c.sql), c.expected) << c.sql;
+}
+
 TEST_F(SqliteHost, ReportsSysfunErrorsWithSqlstateCodeAndWords) {
   const Case cases[] = {
       {"SELECT SPACE(4001)",
@@ -107,7 +125,8 @@ TEST_F(SqliteHost, ReportsSysfunErrorsWithSqlstateCodeAndWords) {
       {"SELECT sysfun_left2('abc', 1048576)",
        "error: sysfun_left2: SQLSTATE 38552, SYSFUN:01: an argument lies outside what the "
        "function accepts"},
-      {"SELECT REPEAT('ab', 2001)",
+      // Refused by both forms: the CLI_udfLob form's error.
+      {"SELECT REPEAT('a', 1048577)",
        "error: REPEAT: SQLSTATE 38552, SYSFUN:10: a string would be longer than the function "
        "allows"},
       {"SELECT sysfun_left('abc', 2147483647)",

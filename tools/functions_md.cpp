@@ -104,10 +104,12 @@ argument gives NULL unless the routine handles NULL itself. A SYSFUN error
 becomes an SQLite error such as `LEFT: SQLSTATE 38552, SYSFUN:01: an argument
 lies outside what the function accepts`.
 
-The form follows the arguments, not the result: `REPEAT('ab', 3000)` reaches
-the terminated-text form, whose results stop at 4000 bytes, and fails with
-SYSFUN:10; `sysfun_repeat2` reaches the `CLI_udfLob` form, which builds up to
-1048576 bytes. `LEFT`, `RIGHT` and `INSERT` are keywords of SQLite's grammar:
+The form also follows what fits: a call that the terminated-text form refuses
+only because its result would pass 4000 bytes (SYSFUN:10) is made again with
+the `CLI_udfLob` form, which builds up to 1048576 bytes, so `REPEAT('ab', 3000)`
+gives 6000 bytes of text; a call that both refuse reports the error of the
+`CLI_udfLob` form. By its own name (`sysfun_repeat1`) an export takes its own
+form only. `LEFT`, `RIGHT` and `INSERT` are keywords of SQLite's grammar:
 call them quoted, as `"LEFT"(s, n)`, or as `sysfun_left`, `sysfun_right` and
 `sysfun_insert`.
 

@@ -47,6 +47,10 @@ struct Call {
   Connection &connection;
   const Function &function;
   bool blobResult = false;  // the first string argument was a BLOB
+  // A CLI_udfLob form could serve the call if the chosen form refuses it for
+  // a length rule (SYSFUN:10), and whether it did.
+  bool mayGrow = false;
+  mutable bool refusedForLength = false;
 };
 
 // Most SQL strings are short: these read and write them in at most four

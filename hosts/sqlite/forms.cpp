@@ -101,6 +101,10 @@ void callRow(const Call &c, std::index_sequence<Is...>) {
   cli::call::call<Row>(c.connection.exports[Row], f);
 
   if (status.stored()) {
+    if (c.mayGrow && cli::call::sysfunIn(status.sqlstate, status.message) == cli::Sysfun::tooLong) {
+      c.refusedForLength = true;  // the caller tries the CLI_udfLob form
+      return;
+    }
     reportStatus(c, status);
   } else if (resultIndicator < 0) {
     sqlite3_result_null(c.context);
@@ -166,8 +170,17 @@ void dispatch(sqlite3_context *context, int argc, sqlite3_value **argv) {
                 "and the function has no form for such strings",
                 f.label.c_str(), static_cast<int>(kTextLimit));
   }
+  // The form follows what fits: a call that the terminated-text form
+  // refuses only for a length rule is made again with the CLI_udfLob form,
+  // whose error is the one reported if it fails too.
+  const int wide = f.formFor[mask | f.stringArguments];
+  call.mayGrow = wide != row && wide != orv::host::kNoForm;
   try {
     kRowCalls[static_cast<std::size_t>(row)](call);
+    if (call.refusedForLength) {
+      call.mayGrow = false;
+      kRowCalls[static_cast<std::size_t>(wide)](call);
+    }
   } catch (const std::bad_alloc &) {
     sqlite3_result_error_nomem(context);
   }
