@@ -80,15 +80,20 @@ TEST_F(SqliteHost, PicksTheFormByTheKindsOfTheArguments) {
       // Integers are not cut, reals must be whole, text must be a number.
       {"SELECT SPACE(2.0) || '|' || SPACE('1') || '|'", "  | |"},
       {"SELECT sysfun_left('abc', 2147483648)",
-       "error: LEFT: argument 2 (n) is 2147483648, outside the 32-bit range of CLI_udfLEFT1"},
+       "error: LEFT: argument 2 (n) is 2147483648, outside the 32-bit range"},
       {"SELECT SPACE(2.5)",
-       "error: SPACE: argument 1 (count) is 2.5, not a whole number in the 32-bit range of "
-       "CLI_udfSPACE"},
+       "error: SPACE: argument 1 (count) is 2.5, not a whole number in the 32-bit range"},
       {"SELECT SPACE('two')", "error: SPACE: argument 1 (count) is not a number"},
       // No form for long strings.
       {"SELECT sysfun_lcase1(x'41') IS NULL",
-       "error: sysfun_lcase1: a string argument is a BLOB, holds a NUL byte or is longer than "
-       "4000 bytes, and the function has no form for such strings"},
+       "error: sysfun_lcase1: argument 1 (string) is a BLOB, and the function takes text only; "
+       "sysfun_lcase2 takes such strings"},
+      {"SELECT DIFFERENCE('Robert', 'a' || char(0))",
+       "error: DIFFERENCE: argument 2 (b) holds a NUL byte, and the function takes text without "
+       "NUL bytes"},
+      {"SELECT sysfun_soundex(printf('%5000c', 'A'))",
+       "error: SOUNDEX: argument 1 (string) is 5000 bytes long, and the function takes text of "
+       "at most 4000 bytes"},
       {"SELECT length(LCASE(zeroblob(1048577)))",
        "error: LCASE: argument 1 (string) is 1048577 bytes long; strings are at most 1048576 "
        "bytes"},
@@ -167,7 +172,7 @@ TEST_F(SqliteHost, CallsDateNumberAndSearchRoutines) {
        "error: COLLATIONNAME: argument 1 (collation id) must be exactly 8 bytes"},
       {"SELECT COLLATIONNAME(zeroblob(8)) || COLLATIONNAME(NULL)", "IDENTITYINVALID"},
       {"SELECT sysfun_mod(1, 0.5)",
-       "error: MOD: argument 2 (y) is 0.5, not a whole number in the 64-bit range of CLI_udfMOD3"},
+       "error: MOD: argument 2 (y) is 0.5, not a whole number in the 64-bit range"},
   };
   for (const Case &c : cases) EXPECT_EQ(eval(c.sql), c.expected) << c.sql;
 }

@@ -111,6 +111,28 @@ void fail(sqlite3_context *context, const char *format, Args... args) {
   sqlite3_free(text);
 }
 
+// Reports that string argument i cannot be terminated text, saying why,
+// and which export takes such strings where the function's name has none.
+inline void failNotText(const Call &c, int i) {
+  const Argument &a = c.arguments[static_cast<std::size_t>(i)];
+  const char *label = c.function.label.c_str();
+  const char *name = c.function.argumentNames[static_cast<std::size_t>(i)];
+  const char *hint = c.function.longerForm.c_str();
+  if (a.type == SQLITE_BLOB) {
+    fail(c.context, "%s: argument %d (%s) is a BLOB, and the function takes text only%s", label,
+         i + 1, name, hint);
+  } else if (a.size > kTextLimit) {
+    fail(c.context,
+         "%s: argument %d (%s) is %lld bytes long, and the function takes text of at most %d "
+         "bytes%s",
+         label, i + 1, name, static_cast<long long>(a.size), static_cast<int>(kTextLimit), hint);
+  } else {
+    fail(c.context,
+         "%s: argument %d (%s) holds a NUL byte, and the function takes text without NUL bytes%s",
+         label, i + 1, name, hint);
+  }
+}
+
 inline const char *argumentName(std::size_t row, int i) {
   const char *name = kRoutines[row].inputs[i].name;
   return name != nullptr ? name : "";
@@ -131,8 +153,8 @@ bool loadInteger(const Call &c, std::size_t row, int i, T &out) {
       out = static_cast<T>(x);
       return true;
     }
-    fail(c.context, "%s: argument %d (%s) is %lld, outside the %d-bit range of %s",
-         c.function.label.c_str(), i + 1, argumentName(row, i), x, bits, kRoutines[row].symbol);
+    fail(c.context, "%s: argument %d (%s) is %lld, outside the %d-bit range",
+         c.function.label.c_str(), i + 1, argumentName(row, i), x, bits);
     return false;
   }
   if (type == SQLITE_FLOAT) {
@@ -143,8 +165,8 @@ bool loadInteger(const Call &c, std::size_t row, int i, T &out) {
       out = static_cast<T>(d);
       return true;
     }
-    fail(c.context, "%s: argument %d (%s) is %!.17g, not a whole number in the %d-bit range of %s",
-         c.function.label.c_str(), i + 1, argumentName(row, i), d, bits, kRoutines[row].symbol);
+    fail(c.context, "%s: argument %d (%s) is %!.17g, not a whole number in the %d-bit range",
+         c.function.label.c_str(), i + 1, argumentName(row, i), d, bits);
     return false;
   }
   fail(c.context, "%s: argument %d (%s) is not a number", c.function.label.c_str(), i + 1,
@@ -191,14 +213,10 @@ struct Input<Layout::text, S> {
   // Left uninitialised but for the terminator: a row costs what it copies.
   Input() { text[0] = '\0'; }
   std::array<char, kTextLimit + 1> text;
-  bool load(const Call &c, std::size_t row, int i) {
+  bool load(const Call &c, std::size_t /*row*/, int i) {
     const Argument &a = c.arguments[static_cast<std::size_t>(i)];
     if (!a.fitsText) {
-      fail(c.context,
-           "%s: argument %d (%s) is a BLOB, holds a NUL byte or is longer than %d bytes, "
-           "which %s does not take",
-           c.function.label.c_str(), i + 1, argumentName(row, i), static_cast<int>(kTextLimit),
-           kRoutines[row].symbol);
+      failNotText(c, i);
       return false;
     }
     copyShort(text.data(), a.bytes, a.size);

@@ -47,6 +47,10 @@ struct Function {
   unsigned stringArguments;  // bit i set when argument i is a string
   bool handlesNull;
   std::array<int, 16> formFor;  // row to call for each KindMask
+  std::array<const char *, cli::catalogue::kMaxInputs> argumentNames{};
+  // For an export called by its own name: "; sysfun_lcase2 takes longer
+  // strings", naming the CLI_udfLob export of the same function, if any.
+  std::string longerForm;
 };
 
 // The SQL function itself: classifies the arguments, picks the export

@@ -68,6 +68,10 @@ int registerFunction(sqlite3 *db, const std::string &name, const orv::host::Grou
     if (!orv::host::isNumber(kRoutines[g.rows[0]].inputs[i].layout)) f->stringArguments |= 1u << i;
   }
   for (KindMask m = 0; m < f->formFor.size(); ++m) f->formFor[m] = orv::host::chooseForm(g, m);
+  for (int i = 0; i < g.argumentCount; ++i) {
+    f->argumentNames[static_cast<std::size_t>(i)] = kRoutines[g.rows[0]].inputs[i].name;
+  }
+  f->longerForm = orv::host::longerForm(g);
 
   int flags = SQLITE_UTF8;
   if (properties & cli::catalogue::kDeterministic) flags |= SQLITE_DETERMINISTIC;

@@ -165,10 +165,14 @@ void dispatch(sqlite3_context *context, int argc, sqlite3_value **argv) {
   }
   const int row = f.formFor[mask];
   if (row == orv::host::kNoForm) {
-    return fail(context,
-                "%s: a string argument is a BLOB, holds a NUL byte or is longer than %d bytes, "
-                "and the function has no form for such strings",
-                f.label.c_str(), static_cast<int>(kTextLimit));
+    // The first string argument that terminated text cannot carry.
+    for (int i = 0; i < argc; ++i) {
+      const Argument &a = call.arguments[static_cast<std::size_t>(i)];
+      if ((f.stringArguments >> i & 1u) != 0 && a.type != SQLITE_NULL && !a.fitsText) {
+        return failNotText(call, i);
+      }
+    }
+    return fail(context, "%s: the function has no form for these arguments", f.label.c_str());
   }
   // The form follows what fits: a call that the terminated-text form
   // refuses only for a length rule is made again with the CLI_udfLob form,
