@@ -133,6 +133,30 @@ std::string introduction() {
   return text;
 }
 
+// When the function's names reach export `row`, by the extension's own
+// choice rule (chooseForm) over every kind of the arguments.
+std::string reachedWhen(const orv::host::Group &g, std::size_t row) {
+  unsigned strings = 0;
+  for (int i = 0; i < g.argumentCount; ++i) {
+    if (!orv::host::isNumber(kRoutines[row].inputs[i].layout)) strings |= 1u << i;
+  }
+  bool plain = false, longStrings = false, reals = false;
+  for (orv::host::KindMask m = 0; m < (1u << g.argumentCount); ++m) {
+    if (orv::host::chooseForm(g, m) != static_cast<int>(row)) continue;
+    plain = plain || m == 0;
+    longStrings = longStrings || (m & strings) != 0;
+    reals = reals || (m & ~strings) != 0;
+  }
+  if (plain) return "by default";
+  if (longStrings) {
+    return "for strings over " + std::to_string(CLI_TEXT_LIMIT) +
+           " bytes, holding NUL bytes or BLOBs, and for results that would pass " +
+           std::to_string(CLI_TEXT_LIMIT) + " bytes";
+  }
+  if (reals) return "for REAL arguments";
+  return "only by its own name";
+}
+
 }  // namespace
 
 int main(int argc, char **argv) {
@@ -144,19 +168,24 @@ int main(int argc, char **argv) {
   const auto groups = orv::host::groups();
   for (const auto &g : groups) {
     if (g.plainName.empty()) continue;
-    const Routine &first = kRoutines[g.rows.front()];
+    // The summary of the export that plain arguments reach.
+    const int preferred = orv::host::chooseForm(g, 0);
+    const Routine &first =
+        kRoutines[preferred >= 0 ? static_cast<std::size_t>(preferred) : g.rows.front()];
     out << "\n### " << g.label << " (" << g.argumentCount
         << (g.argumentCount == 1 ? " argument" : " arguments") << ")\n\n"
         << first.summary << "\n\nIn SQLite: `" << g.sysfunName << "`";
     if (!orv::host::sqliteHasFunction(db, g.plainName.c_str(), g.argumentCount)) {
       out << ", `" << g.label << "`";
     }
-    out << "\n\n| Export | Own name | Arguments | Result | SYSFUN errors | What it gives |\n"
-        << "|---|---|---|---|---|---|\n";
+    out << "\n\n| Export | Reached | Own name | Arguments | Result | SYSFUN errors | What it "
+           "gives |\n"
+        << "|---|---|---|---|---|---|---|\n";
     for (std::size_t row : g.rows) {
       const Routine &r = kRoutines[row];
-      out << "| `" << r.symbol << "` | `" << orv::host::exportName(r) << "` | " << arguments(r)
-          << " | " << results(r) << " | " << codes(r) << " | " << r.summary << " |\n";
+      out << "| `" << r.symbol << "` | " << reachedWhen(g, row) << " | `"
+          << orv::host::exportName(r) << "` | " << arguments(r) << " | " << results(r) << " | "
+          << codes(r) << " | " << r.summary << " |\n";
     }
   }
 
