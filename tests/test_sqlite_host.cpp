@@ -3,10 +3,13 @@
 #include <sqlite3.h>
 #include <unistd.h>
 
+#include <atomic>
 #include <cstdlib>
 #include <filesystem>
 #include <fstream>
 #include <string>
+#include <thread>
+#include <vector>
 
 #include "snapshot.hpp"
 
@@ -262,6 +265,36 @@ TEST_F(SqliteHost, RegistersDeterministicInnocuousFunctionsWithoutHidingBuiltIns
   EXPECT_EQ(eval("SELECT count(*) FROM pragma_function_list WHERE name IN ('rtrim', 'ltrim', "
                  "'char') AND builtin = 0"),
             "0");
+}
+
+// Connections load the extension while others run its table functions:
+// whatever the extension shares between connections is set up once (run
+// under the thread sanitizer by ./dev sanitize).
+TEST(SqliteHostThreads, LoadOnNewConnectionsWhileOthersRunTableFunctions) {
+  std::atomic<int> failures{0};
+  const auto work = [&](bool query) {
+    for (int k = 0; k < 20; ++k) {
+      sqlite3 *db = nullptr;
+      char *error = nullptr;
+      if (sqlite3_open(":memory:", &db) != SQLITE_OK ||
+          sqlite3_enable_load_extension(db, 1) != SQLITE_OK ||
+          sqlite3_load_extension(db, ORV_SQLITE_HOST_PATH, nullptr, &error) != SQLITE_OK) {
+        ++failures;
+      } else if (query &&
+                 sqlite3_exec(db,
+                              "SELECT count(*) FROM fmprows; SELECT count(*) FROM fmpthreads(0); "
+                              "SELECT count(*) FROM sysfun_functions; SELECT REPEAT('a', 5000);",
+                              nullptr, nullptr, nullptr) != SQLITE_OK) {
+        ++failures;
+      }
+      sqlite3_free(error);
+      sqlite3_close(db);
+    }
+  };
+  std::vector<std::thread> threads;
+  for (int t = 0; t < 4; ++t) threads.emplace_back(work, t % 2 == 0);
+  for (std::thread &t : threads) t.join();
+  EXPECT_EQ(failures.load(), 0);
 }
 
 }  // namespace

@@ -12,8 +12,10 @@ SQLITE_EXTENSION_INIT1
 #include <dlfcn.h>
 
 #include <memory>
+#include <mutex>
 #include <new>
 #include <string>
+#include <system_error>
 #include <vector>
 
 #include "about.hpp"
@@ -128,11 +130,17 @@ int initialise(sqlite3 *db, char **error) {
 // Entry points: the one SQLite derives from the file name, and the default.
 extern "C" __attribute__((visibility("default"))) int sqlite3_orvclifnsqlite_init(
     sqlite3 *db, char **error, const sqlite3_api_routines *api) {
-  SQLITE_EXTENSION_INIT2(api);
+  // The table of SQLite's routines is the extension's one global, the same
+  // for every connection of the process: set once, so that a connection
+  // loading the extension never writes it while another one reads it.
+  static std::once_flag once;
   try {
+    std::call_once(once, [api] { SQLITE_EXTENSION_INIT2(api); });
     return initialise(db, error);
   } catch (const std::bad_alloc &) {
     return SQLITE_NOMEM;
+  } catch (const std::system_error &) {
+    return SQLITE_ERROR;  // the threads library could not run call_once
   }
 }
 
