@@ -16,33 +16,8 @@
 namespace {
 
 using cli::catalogue::kRoutines;
-using cli::catalogue::Layout;
 using cli::catalogue::Routine;
-using cli::catalogue::Slot;
-
-std::string describe(const Slot &s, bool result) {
-  switch (s.layout) {
-    case Layout::int16:
-      return "16-bit integer";
-    case Layout::int32:
-      return "32-bit integer";
-    case Layout::int64:
-      return "64-bit integer";
-    case Layout::real:
-      return "double";
-    case Layout::text:
-      return result ? "text of at most " + std::to_string(s.size) + " bytes" : "text";
-    case Layout::lob:
-      return result ? "CLI_udfLob, capacity " + std::to_string(s.size) : "CLI_udfLob";
-    case Layout::fixedText:
-      return std::to_string(s.size) + " bytes of text, blank-filled";
-    case Layout::fixedBytes:
-      return std::to_string(s.size) + " bytes";
-    case Layout::none:
-      break;
-  }
-  return "";
-}
+using orv::host::describe;
 
 std::string arguments(const Routine &r) {
   std::string out;

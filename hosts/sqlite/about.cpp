@@ -15,33 +15,6 @@ SQLITE_EXTENSION_INIT3
 namespace orv::host {
 namespace {
 
-using cli::catalogue::Layout;
-using cli::catalogue::Slot;
-
-const char *layoutName(const Slot &s) {
-  switch (s.layout) {
-    case Layout::int16:
-      return "16-bit integer";
-    case Layout::int32:
-      return "32-bit integer";
-    case Layout::int64:
-      return "64-bit integer";
-    case Layout::real:
-      return "double";
-    case Layout::text:
-      return "text";
-    case Layout::lob:
-      return "CLI_udfLob";
-    case Layout::fixedText:
-      return "fixed text";
-    case Layout::fixedBytes:
-      return "fixed bytes";
-    case Layout::none:
-      break;
-  }
-  return "";
-}
-
 // One row of sysfun_functions.
 struct Entry {
   std::string name, plainName, exports, arguments, codes, summary;
@@ -74,7 +47,7 @@ Entry entryOf(const Group &g, bool plain) {
   for (int i = 0; i < g.argumentCount; ++i) {
     std::vector<std::string> layouts;
     for (std::size_t row : g.rows) {
-      const std::string l = layoutName(kRoutines[row].inputs[i]);
+      const std::string l = describe(kRoutines[row].inputs[i], false);
       if (std::find(layouts.begin(), layouts.end(), l) == layouts.end()) layouts.push_back(l);
     }
     std::string joined;

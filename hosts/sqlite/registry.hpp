@@ -73,6 +73,32 @@ inline std::string exportName(const Routine &r) {
   return std::string(kPrefix) + lowerCase(symbol);
 }
 
+// A layout in words: an argument's ("text"), or a result's, with its size
+// ("text of at most 4000 bytes").
+inline std::string describe(const cli::catalogue::Slot &s, bool result) {
+  switch (s.layout) {
+    case Layout::int16:
+      return "16-bit integer";
+    case Layout::int32:
+      return "32-bit integer";
+    case Layout::int64:
+      return "64-bit integer";
+    case Layout::real:
+      return "double";
+    case Layout::text:
+      return result ? "text of at most " + std::to_string(s.size) + " bytes" : "text";
+    case Layout::lob:
+      return result ? "CLI_udfLob, capacity " + std::to_string(s.size) : "CLI_udfLob";
+    case Layout::fixedText:
+      return std::to_string(s.size) + " bytes of text, blank-filled";
+    case Layout::fixedBytes:
+      return std::to_string(s.size) + " bytes";
+    case Layout::none:
+      break;
+  }
+  return "";
+}
+
 // One SQL function: a name (or two) and the exports that can serve it.
 struct Group {
   std::string label;       // name used in messages: LEFT, or sysfun_left2
