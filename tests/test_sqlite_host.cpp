@@ -171,6 +171,12 @@ TEST_F(SqliteHost, CallsDateNumberAndSearchRoutines) {
        "SundayMarchSunday"},
       {"SELECT CHARTODOUBLE('1.5e3 ') || '|' || DOUBLETOCHAR(-1234.5) || '|'",
        "1500.0|-1.2345E3               |"},
+      // Routines that cut blanks off their text in place get a copy; the
+      // others read SQLite's own buffer: the column keeps its blanks either way.
+      {"SELECT n || CHARTODOUBLE(n) || n || '|' FROM (SELECT '15  ' AS n)", "15  15.015  |"},
+      {"SELECT d || '|' || DAYOFYEAR(d) || sysfun_rtrim(d) || d || '|' "
+       "FROM (SELECT '2001-02-03  ' AS d)",
+       "2001-02-03  |342001-02-032001-02-03  |"},
       {"SELECT COLLATIONNAME(zeroblob(8)) || COLLATIONNAME(NULL) || COLLATIONNAME(x'FF')",
        "error: COLLATIONNAME: argument 1 (collation id) must be exactly 8 bytes"},
       {"SELECT COLLATIONNAME(zeroblob(8)) || COLLATIONNAME(NULL)", "IDENTITYINVALID"},

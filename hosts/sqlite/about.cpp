@@ -11,6 +11,7 @@ SQLITE_EXTENSION_INIT3
 #include <vector>
 
 #include "about.hpp"
+#include "module.hpp"
 
 namespace orv::host {
 namespace {
@@ -145,21 +146,8 @@ int rowid(sqlite3_vtab_cursor *c, sqlite3_int64 *out) {
   return SQLITE_OK;
 }
 
-sqlite3_module makeModule() {
-  sqlite3_module m{};
-  m.xConnect = connect;
-  m.xBestIndex = bestIndex;
-  m.xDisconnect = disconnect;
-  m.xOpen = open;
-  m.xClose = close;
-  m.xFilter = filter;
-  m.xNext = next;
-  m.xEof = eof;
-  m.xColumn = column;
-  m.xRowid = rowid;
-  return m;
-}
-const sqlite3_module kModule = makeModule();
+const sqlite3_module kModule =
+    readOnlyModule(connect, bestIndex, disconnect, open, close, filter, next, eof, column, rowid);
 
 void version(sqlite3_context *context, int, sqlite3_value **) {
   sqlite3_result_text(context, ORV_VERSION, -1, SQLITE_STATIC);

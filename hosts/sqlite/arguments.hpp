@@ -11,6 +11,7 @@
 #include <cstdint>
 #include <cstring>
 #include <limits>
+#include <type_traits>
 
 #include "catalogue/catalogue.hpp"
 #include "connection.hpp"
@@ -70,7 +71,7 @@ constexpr bool hasZeroByte(std::uint64_t w) {
   return ((w - 0x0101010101010101u) & ~w & 0x8080808080808080u) != 0;
 }
 
-inline bool holdsNul(const unsigned char *p, std::size_t size) {
+[[gnu::always_inline]] inline bool holdsNul(const unsigned char *p, std::size_t size) {
   if (size >= 8 && size <= 16) return hasZeroByte(word(p)) || hasZeroByte(word(p + size - 8));
   if (size > 16 && size <= 32) {
     return hasZeroByte(word(p)) || hasZeroByte(word(p + 8)) || hasZeroByte(word(p + size - 16)) ||
@@ -207,7 +208,7 @@ struct Input<Layout::real, S> {
   void *pointer() { return &value; }
 };
 
-// Terminated text, copied: the routines may write into their inputs.
+// Terminated text, copied: for a routine that may write into its inputs.
 template <std::uint32_t S>
 struct Input<Layout::text, S> {
   // Left uninitialised but for the terminator: a row costs what it copies.
@@ -224,6 +225,26 @@ struct Input<Layout::text, S> {
     return true;
   }
   void *pointer() { return text.data(); }
+};
+
+// Terminated text for a routine that only reads it: SQLite's own buffer,
+// which sqlite3_value_text ends with a NUL, handed over without a copy.
+// The dispatcher has checked that the text holds no NUL of its own.
+struct BorrowedText {
+  char empty[1] = {};  // a NULL handed to a routine that reads indicators
+  char *text = empty;
+  bool load(const Call &c, std::size_t /*row*/, int i) {
+    const Argument &a = c.arguments[static_cast<std::size_t>(i)];
+    if (!a.fitsText) {
+      failNotText(c, i);
+      return false;
+    }
+    // The routine's parameter is char * by the frame's C signature; a
+    // routine not marked kWritesInputs only reads through it.
+    text = const_cast<char *>(reinterpret_cast<const char *>(a.bytes));
+    return true;
+  }
+  [[nodiscard]] void *pointer() const { return text; }
 };
 
 template <std::uint32_t S>
@@ -263,6 +284,15 @@ struct Input<Layout::fixedBytes, Size> {
   }
   void *pointer() { return value.data(); }
 };
+
+// The adapter of input I of a row: text that the routine only reads is
+// borrowed, anything else laid out in its own storage.
+template <std::size_t Row, std::size_t I>
+using InputOf =
+    std::conditional_t<kRoutines[Row].inputs[I].layout == Layout::text &&
+                           (kRoutines[Row].properties & cli::catalogue::kWritesInputs) == 0,
+                       BorrowedText,
+                       Input<kRoutines[Row].inputs[I].layout, kRoutines[Row].inputs[I].size>>;
 
 // A result in the layout L; Size is the longest text, the capacity of a
 // CLI_udfLob or the byte count of fixed text.

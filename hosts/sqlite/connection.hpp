@@ -53,8 +53,10 @@ struct Function {
   std::string longerForm;
 };
 
-// The SQL function itself: classifies the arguments, picks the export
-// that serves them and calls it.
-void dispatch(sqlite3_context *context, int argc, sqlite3_value **argv);
+// The SQL function of a name, by the row that its plain arguments reach
+// (formFor[0]): classifies the arguments, picks the export that serves them
+// and calls it.  Null for rows that the host cannot call.
+using Entry = void (*)(sqlite3_context *context, int argc, sqlite3_value **argv);
+extern const std::array<Entry, cli::catalogue::kRoutineCount> kEntries;
 
 }  // namespace orv::host

@@ -75,12 +75,18 @@ int registerFunction(sqlite3 *db, const std::string &name, const orv::host::Grou
   }
   f->longerForm = orv::host::longerForm(g);
 
+  // Every group takes plain arguments (short text, integers); the row they
+  // reach names the SQL function's entry.
+  const int usual = f->formFor[0];
+  if (usual == orv::host::kNoForm) return SQLITE_INTERNAL;
+
   int flags = SQLITE_UTF8;
   if (properties & cli::catalogue::kDeterministic) flags |= SQLITE_DETERMINISTIC;
   flags |= (properties & cli::catalogue::kInnocuous) ? SQLITE_INNOCUOUS : SQLITE_DIRECTONLY;
   ++connection->functions;
   return sqlite3_create_function_v2(db, name.c_str(), g.argumentCount, flags, f.release(),
-                                    orv::host::dispatch, nullptr, nullptr, release);
+                                    orv::host::kEntries[static_cast<std::size_t>(usual)], nullptr,
+                                    nullptr, release);
 }
 
 int initialise(sqlite3 *db, char **error) {

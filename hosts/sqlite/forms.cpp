@@ -68,10 +68,10 @@ alignas(8) std::array<unsigned char, 512> kDatabaseInfo = [] {
 }();
 
 template <std::size_t Row, std::size_t... Is>
-void callRow(const Call &c, std::index_sequence<Is...>) {
+[[gnu::always_inline]] inline void callRow(const Call &c, std::index_sequence<Is...>) {
   constexpr const Routine &r = kRoutines[Row];
   constexpr std::size_t n = sizeof...(Is);
-  std::tuple<Input<r.inputs[Is].layout, r.inputs[Is].size>...> inputs;
+  std::tuple<InputOf<Row, Is>...> inputs;
   Result<r.results[0].layout, r.results[0].size> result;
   std::array<std::int16_t, n + 1> inputIndicators{};
   std::int16_t resultIndicator = 0;
@@ -116,7 +116,7 @@ void callRow(const Call &c, std::index_sequence<Is...>) {
 using RowCall = void (*)(const Call &);
 
 template <std::size_t Row>
-void callRow(const Call &c) {
+[[gnu::always_inline]] inline void callRow(const Call &c) {
   if constexpr (orv::host::hostable(kRoutines[Row])) {
     callRow<Row>(c, std::make_index_sequence<inputCount(kRoutines[Row])>{});
   }
@@ -130,39 +130,64 @@ constexpr auto kRowCalls = rowCalls(std::make_index_sequence<kRoutineCount>{});
 
 }  // namespace
 
-// The SQL function itself: classifies the arguments, picks the export and
-// calls it.
-void dispatch(sqlite3_context *context, int argc, sqlite3_value **argv) {
-  const auto &f = *static_cast<const Function *>(sqlite3_user_data(context));
-  Call call(context, argv, *f.connection, f);
-  KindMask mask = 0;
-  bool firstString = true;
-  for (int i = 0; i < argc; ++i) {
-    sqlite3_value *v = argv[i];
-    Argument &a = call.arguments[static_cast<std::size_t>(i)];
-    a.type = sqlite3_value_type(v);
-    const KindMask bit = 1u << i;
-    if (a.type == SQLITE_NULL) {
-      if (!f.handlesNull) return sqlite3_result_null(context);
-      continue;
+namespace {
+
+// Reads SQL argument i of a call as its class asks: a number's type after
+// numeric affinity, a string's bytes.  Sets the argument's bit in `mask`
+// for a REAL number or for a string that terminated text cannot carry.
+// False when the call is over: a NULL to a function that doesn't read its
+// indicators, whose result is then NULL.
+[[gnu::always_inline]] inline bool classify(Call &call, int i, bool isString, KindMask &mask,
+                                            bool &firstString) {
+  sqlite3_value *v = call.argv[i];
+  Argument &a = call.arguments[static_cast<std::size_t>(i)];
+  a.type = sqlite3_value_type(v);
+  const KindMask bit = 1u << i;
+  if (a.type == SQLITE_NULL) {
+    if (!call.function.handlesNull) {
+      sqlite3_result_null(call.context);
+      return false;
     }
-    if ((f.stringArguments & bit) == 0) {
-      // Only text and BLOBs need converting to find their number type.
-      if (a.type == SQLITE_TEXT || a.type == SQLITE_BLOB) a.type = sqlite3_value_numeric_type(v);
-      if (a.type == SQLITE_FLOAT) mask |= bit;
-      continue;
-    }
-    if (a.type == SQLITE_BLOB) {
-      a.bytes = static_cast<const unsigned char *>(sqlite3_value_blob(v));
-      call.blobResult = call.blobResult || firstString;
-    } else {
-      a.bytes = sqlite3_value_text(v);
-    }
-    a.size = static_cast<std::size_t>(sqlite3_value_bytes(v));
-    a.fitsText = a.type != SQLITE_BLOB && a.size <= kTextLimit && !holdsNul(a.bytes, a.size);
-    if (!a.fitsText) mask |= bit;
-    firstString = false;
+    return true;
   }
+  if (!isString) {
+    // Only text and BLOBs need converting to find their number type.
+    if (a.type == SQLITE_TEXT || a.type == SQLITE_BLOB) a.type = sqlite3_value_numeric_type(v);
+    if (a.type == SQLITE_FLOAT) mask |= bit;
+    return true;
+  }
+  if (a.type == SQLITE_BLOB) {
+    a.bytes = static_cast<const unsigned char *>(sqlite3_value_blob(v));
+    call.blobResult = call.blobResult || firstString;
+  } else {
+    a.bytes = sqlite3_value_text(v);
+  }
+  a.size = static_cast<std::size_t>(sqlite3_value_bytes(v));
+  a.fitsText = a.type != SQLITE_BLOB && a.size <= kTextLimit && !holdsNul(a.bytes, a.size);
+  if (!a.fitsText) mask |= bit;
+  firstString = false;
+  return true;
+}
+
+// Calls `row`, and, where it refuses the call only for a length rule, the
+// CLI_udfLob form `wide`, whose error is the one reported if it fails too.
+template <class First>
+void callWithRetry(Call &call, First first, int wide) {
+  try {
+    first(call);
+    if (call.refusedForLength) {
+      call.mayGrow = false;
+      kRowCalls[static_cast<std::size_t>(wide)](call);
+    }
+  } catch (const std::bad_alloc &) {
+    sqlite3_result_error_nomem(call.context);
+  }
+}
+
+// The rest of a call whose arguments are classified: the form that serves
+// them, or the error that says why none does.
+void callForm(Call &call, int argc, KindMask mask) {
+  const Function &f = call.function;
   const int row = f.formFor[mask];
   if (row == orv::host::kNoForm) {
     // The first string argument that terminated text cannot carry.
@@ -172,22 +197,59 @@ void dispatch(sqlite3_context *context, int argc, sqlite3_value **argv) {
         return failNotText(call, i);
       }
     }
-    return fail(context, "%s: the function has no form for these arguments", f.label.c_str());
+    return fail(call.context, "%s: the function has no form for these arguments", f.label.c_str());
   }
-  // The form follows what fits: a call that the terminated-text form
-  // refuses only for a length rule is made again with the CLI_udfLob form,
-  // whose error is the one reported if it fails too.
+  // The form follows what fits: see callWithRetry.
   const int wide = f.formFor[mask | f.stringArguments];
   call.mayGrow = wide != row && wide != orv::host::kNoForm;
-  try {
-    kRowCalls[static_cast<std::size_t>(row)](call);
-    if (call.refusedForLength) {
-      call.mayGrow = false;
-      kRowCalls[static_cast<std::size_t>(wide)](call);
-    }
-  } catch (const std::bad_alloc &) {
-    sqlite3_result_error_nomem(context);
+  callWithRetry(call, kRowCalls[static_cast<std::size_t>(row)], wide);
+}
+
+// The SQL function of a name whose plain arguments reach `Row`: the
+// argument classes are the row's, known when compiled, and the row's call
+// is inlined; arguments that need another form go the general way.
+template <std::size_t Row, std::size_t... Is>
+void entryWith(sqlite3_context *context, sqlite3_value **argv, std::index_sequence<Is...>) {
+  const auto &f = *static_cast<const Function *>(sqlite3_user_data(context));
+  Call call(context, argv, *f.connection, f);
+  KindMask mask = 0;
+  [[maybe_unused]] bool firstString = true;
+  if (!(classify(call, static_cast<int>(Is), !isNumber(kRoutines[Row].inputs[Is].layout), mask,
+                 firstString) &&
+        ...)) {
+    return;
+  }
+  if (f.formFor[mask] != static_cast<int>(Row)) {
+    return callForm(call, static_cast<int>(sizeof...(Is)), mask);
+  }
+  const int wide = f.formFor[mask | f.stringArguments];
+  call.mayGrow = wide != static_cast<int>(Row) && wide != orv::host::kNoForm;
+  callWithRetry(
+      call, [](const Call &c) { callRow<Row>(c); }, wide);
+}
+
+template <std::size_t Row>
+void entry(sqlite3_context *context, int /*argc*/, sqlite3_value **argv) {
+  entryWith<Row>(context, argv, std::make_index_sequence<inputCount(kRoutines[Row])>{});
+}
+
+template <std::size_t Row>
+constexpr Entry entryOf() {
+  if constexpr (orv::host::hostable(kRoutines[Row])) {
+    return &entry<Row>;
+  } else {
+    return nullptr;
   }
 }
+
+template <std::size_t... Rows>
+constexpr std::array<Entry, sizeof...(Rows)> entries(std::index_sequence<Rows...>) {
+  return {entryOf<Rows>()...};
+}
+
+}  // namespace
+
+const std::array<Entry, kRoutineCount> kEntries =
+    entries(std::make_index_sequence<kRoutineCount>{});
 
 }  // namespace orv::host

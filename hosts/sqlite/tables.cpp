@@ -22,6 +22,7 @@ SQLITE_EXTENSION_INIT3
 #include "catalogue/catalogue.hpp"
 #include "fmp_tables.hpp"
 #include "frame/table_call.hpp"
+#include "module.hpp"
 #include "registry.hpp"
 #include "tables.hpp"
 
@@ -226,22 +227,8 @@ int rowid(sqlite3_vtab_cursor *cur, sqlite3_int64 *out) {
   return SQLITE_OK;
 }
 
-sqlite3_module makeModule() {
-  sqlite3_module m{};
-  m.iVersion = 0;
-  m.xConnect = connect;
-  m.xBestIndex = bestIndex;
-  m.xDisconnect = disconnect;
-  m.xOpen = open;
-  m.xClose = close;
-  m.xFilter = filter;
-  m.xNext = next;
-  m.xEof = eof;
-  m.xColumn = column;
-  m.xRowid = rowid;
-  return m;
-}
-const sqlite3_module kModule = makeModule();
+const sqlite3_module kModule =
+    readOnlyModule(connect, bestIndex, disconnect, open, close, filter, next, eof, column, rowid);
 
 bool hasModule(sqlite3 *db, const std::string &name) {
   sqlite3_stmt *s = nullptr;

@@ -68,6 +68,10 @@ enum : unsigned {
   // random number state), so calls on other threads or in other processes
   // of one query do not see the same sequence.
   kSharedState = 32u,
+  // May write into its text inputs: it cuts trailing blanks off them in
+  // place.  A host must hand such a routine a copy it may write; any other
+  // routine only reads its inputs.
+  kWritesInputs = 64u,
 };
 inline constexpr unsigned kPure = kDeterministic | kInnocuous;
 
@@ -107,35 +111,35 @@ inline constexpr std::uint32_t kName = 101;             // a day or month name
 // clang-format off
 inline constexpr Routine kRoutines[] = {
   // Day and second counts
-  {"CLI_udfJULIAN_DAY1", "JULIAN_DAY", Frame::plain, {text("date")}, {int32()}, kPure | kNarrowerForm, "04", "Julian day number of the date at the head of the text; what stands behind the date is not read."},
-  {"CLI_udfJULIAN_DAY2", "JULIAN_DAY", Frame::plain, {text("date")}, {int32()}, kPure, "04 06", "Julian day number of a date or timestamp, validated to its end."},
-  {"CLI_udfMIDNIGHT_SECONDS1", "MIDNIGHT_SECONDS", Frame::plain, {text("time")}, {int32()}, kPure | kNarrowerForm, "05", "Seconds since midnight of a time."},
-  {"CLI_udfMIDNIGHT_SECONDS2", "MIDNIGHT_SECONDS", Frame::plain, {text("value")}, {int32()}, kPure, "04 05 06", "Seconds since midnight of a time, or of the time of day of a timestamp."},
+  {"CLI_udfJULIAN_DAY1", "JULIAN_DAY", Frame::plain, {text("date")}, {int32()}, kPure | kNarrowerForm | kWritesInputs, "04", "Julian day number of the date at the head of the text; what stands behind the date is not read."},
+  {"CLI_udfJULIAN_DAY2", "JULIAN_DAY", Frame::plain, {text("date")}, {int32()}, kPure | kWritesInputs, "04 06", "Julian day number of a date or timestamp, validated to its end."},
+  {"CLI_udfMIDNIGHT_SECONDS1", "MIDNIGHT_SECONDS", Frame::plain, {text("time")}, {int32()}, kPure | kNarrowerForm | kWritesInputs, "05", "Seconds since midnight of a time."},
+  {"CLI_udfMIDNIGHT_SECONDS2", "MIDNIGHT_SECONDS", Frame::plain, {text("value")}, {int32()}, kPure | kWritesInputs, "04 05 06", "Seconds since midnight of a time, or of the time of day of a timestamp."},
   // Timestamps
-  {"CLI_udfTIMESTAMP", "TIMESTAMP", Frame::plain, {text("value")}, {textOf(kStamp)}, kInnocuous, "04 05 06", "Timestamp text from a date, a time (on today's UTC date) or a timestamp."},
-  {"CLI_udfTIMESTAMPDATE", "TIMESTAMPDATE", Frame::plain, {text("date")}, {textOf(kStamp)}, kPure, "04", "Timestamp text of a date at midnight."},
-  {"CLI_udfTIMESTAMPTIME", "TIMESTAMPTIME", Frame::plain, {text("time")}, {textOf(kStamp)}, kInnocuous, "05", "Timestamp text of a time on today's UTC date."},
+  {"CLI_udfTIMESTAMP", "TIMESTAMP", Frame::plain, {text("value")}, {textOf(kStamp)}, kInnocuous | kWritesInputs, "04 05 06", "Timestamp text from a date, a time (on today's UTC date) or a timestamp."},
+  {"CLI_udfTIMESTAMPDATE", "TIMESTAMPDATE", Frame::plain, {text("date")}, {textOf(kStamp)}, kPure | kWritesInputs, "04", "Timestamp text of a date at midnight."},
+  {"CLI_udfTIMESTAMPTIME", "TIMESTAMPTIME", Frame::plain, {text("time")}, {textOf(kStamp)}, kInnocuous | kWritesInputs, "05", "Timestamp text of a time on today's UTC date."},
   // Timestamp durations
   {"CLI_udfTIMESTAMPDIFF", "TIMESTAMPDIFF", Frame::plain, {int32("interval"), text("duration")}, {int32()}, kPure, "03 07 08 10", "A timestamp duration as a number of the unit that the interval code names."},
   // Weeks
-  {"CLI_udfWEEK1", "WEEK", Frame::plain, {text("date")}, {int32()}, kPure | kNarrowerForm, "04", "Week of the year, weeks starting on Sunday, of the date at the head of the text."},
-  {"CLI_udfWEEK2", "WEEK", Frame::plain, {text("date")}, {int32()}, kPure, "04 06", "Week of the year, weeks starting on Sunday, of a date or timestamp."},
-  {"CLI_udfWEEK_ISO1", "WEEK_ISO", Frame::plain, {text("date")}, {int32()}, kPure | kNarrowerForm, "04", "ISO 8601 week number of the date at the head of the text."},
-  {"CLI_udfWEEK_ISO2", "WEEK_ISO", Frame::plain, {text("date")}, {int32()}, kPure, "04 06", "ISO 8601 week number of a date or timestamp."},
+  {"CLI_udfWEEK1", "WEEK", Frame::plain, {text("date")}, {int32()}, kPure | kNarrowerForm | kWritesInputs, "04", "Week of the year, weeks starting on Sunday, of the date at the head of the text."},
+  {"CLI_udfWEEK2", "WEEK", Frame::plain, {text("date")}, {int32()}, kPure | kWritesInputs, "04 06", "Week of the year, weeks starting on Sunday, of a date or timestamp."},
+  {"CLI_udfWEEK_ISO1", "WEEK_ISO", Frame::plain, {text("date")}, {int32()}, kPure | kNarrowerForm | kWritesInputs, "04", "ISO 8601 week number of the date at the head of the text."},
+  {"CLI_udfWEEK_ISO2", "WEEK_ISO", Frame::plain, {text("date")}, {int32()}, kPure | kWritesInputs, "04 06", "ISO 8601 week number of a date or timestamp."},
   // Numbers in a date
-  {"CLI_udfQUARTER1", "QUARTER", Frame::plain, {text("date")}, {int32()}, kPure | kNarrowerForm, "04", "Quarter of the year of the date at the head of the text."},
-  {"CLI_udfQUARTER2", "QUARTER", Frame::plain, {text("date")}, {int32()}, kPure, "04 06", "Quarter of the year of a date or timestamp."},
-  {"CLI_udfDAYOFYEAR1", "DAYOFYEAR", Frame::plain, {text("date")}, {int32()}, kPure | kNarrowerForm, "04", "Ordinal day in the year of the date at the head of the text."},
-  {"CLI_udfDAYOFYEAR2", "DAYOFYEAR", Frame::plain, {text("date")}, {int32()}, kPure, "04 06", "Ordinal day in the year of a date or timestamp."},
-  {"CLI_udfDAYOFWEEK1", "DAYOFWEEK", Frame::plain, {text("date")}, {int32()}, kPure, "04 06", "Day of the week, Sunday = 1, of a date or timestamp."},
-  {"CLI_udfDAYOFWEEK2", "DAYOFWEEK", Frame::plain, {text("date")}, {int32()}, kPure | kNarrowerForm, "04", "Day of the week, Sunday = 1, of the date at the head of the text."},
-  {"CLI_udfDAYOFWEEK_ISO1", "DAYOFWEEK_ISO", Frame::plain, {text("date")}, {int32()}, kPure, "04 06", "Day of the week, Monday = 1, of a date or timestamp."},
-  {"CLI_udfDAYOFWEEK_ISO2", "DAYOFWEEK_ISO", Frame::plain, {text("date")}, {int32()}, kPure | kNarrowerForm, "04", "Day of the week, Monday = 1, of the date at the head of the text."},
+  {"CLI_udfQUARTER1", "QUARTER", Frame::plain, {text("date")}, {int32()}, kPure | kNarrowerForm | kWritesInputs, "04", "Quarter of the year of the date at the head of the text."},
+  {"CLI_udfQUARTER2", "QUARTER", Frame::plain, {text("date")}, {int32()}, kPure | kWritesInputs, "04 06", "Quarter of the year of a date or timestamp."},
+  {"CLI_udfDAYOFYEAR1", "DAYOFYEAR", Frame::plain, {text("date")}, {int32()}, kPure | kNarrowerForm | kWritesInputs, "04", "Ordinal day in the year of the date at the head of the text."},
+  {"CLI_udfDAYOFYEAR2", "DAYOFYEAR", Frame::plain, {text("date")}, {int32()}, kPure | kWritesInputs, "04 06", "Ordinal day in the year of a date or timestamp."},
+  {"CLI_udfDAYOFWEEK1", "DAYOFWEEK", Frame::plain, {text("date")}, {int32()}, kPure | kWritesInputs, "04 06", "Day of the week, Sunday = 1, of a date or timestamp."},
+  {"CLI_udfDAYOFWEEK2", "DAYOFWEEK", Frame::plain, {text("date")}, {int32()}, kPure | kNarrowerForm | kWritesInputs, "04", "Day of the week, Sunday = 1, of the date at the head of the text."},
+  {"CLI_udfDAYOFWEEK_ISO1", "DAYOFWEEK_ISO", Frame::plain, {text("date")}, {int32()}, kPure | kWritesInputs, "04 06", "Day of the week, Monday = 1, of a date or timestamp."},
+  {"CLI_udfDAYOFWEEK_ISO2", "DAYOFWEEK_ISO", Frame::plain, {text("date")}, {int32()}, kPure | kNarrowerForm | kWritesInputs, "04", "Day of the week, Monday = 1, of the date at the head of the text."},
   // Names in a date
-  {"CLI_udfDAYNAME1", "DAYNAME", Frame::dbinfo, {text("date")}, {textOf(kName)}, kInnocuous, "03 04 06", "Name of the day of the week of a date or timestamp, in the server's language."},
-  {"CLI_udfDAYNAME2", "DAYNAME", Frame::dbinfo, {text("date")}, {textOf(kName)}, kInnocuous | kNarrowerForm, "03 04", "Name of the day of the week of the date at the head of the text."},
-  {"CLI_udfMONTHNAME1", "MONTHNAME", Frame::dbinfo, {text("date")}, {textOf(kName)}, kInnocuous | kNarrowerForm, "03 04", "Name of the month of the date at the head of the text, in the server's language."},
-  {"CLI_udfMONTHNAME2", "MONTHNAME", Frame::dbinfo, {text("date")}, {textOf(kName)}, kInnocuous, "03 04 06", "Name of the month of a date or timestamp."},
+  {"CLI_udfDAYNAME1", "DAYNAME", Frame::dbinfo, {text("date")}, {textOf(kName)}, kInnocuous | kWritesInputs, "03 04 06", "Name of the day of the week of a date or timestamp, in the server's language."},
+  {"CLI_udfDAYNAME2", "DAYNAME", Frame::dbinfo, {text("date")}, {textOf(kName)}, kInnocuous | kNarrowerForm | kWritesInputs, "03 04", "Name of the day of the week of the date at the head of the text."},
+  {"CLI_udfMONTHNAME1", "MONTHNAME", Frame::dbinfo, {text("date")}, {textOf(kName)}, kInnocuous | kNarrowerForm | kWritesInputs, "03 04", "Name of the month of the date at the head of the text, in the server's language."},
+  {"CLI_udfMONTHNAME2", "MONTHNAME", Frame::dbinfo, {text("date")}, {textOf(kName)}, kInnocuous | kWritesInputs, "03 04 06", "Name of the month of a date or timestamp."},
   // Integer and sign
   {"CLI_udfABS1", "ABS", Frame::plain, {real("x")}, {real()}, kPure, "", "Absolute value of a double: its sign bit cleared."},
   {"CLI_udfABS2", "ABS", Frame::plain, {int32("x")}, {int32()}, kPure, "01", "Absolute value of a 32-bit integer."},
@@ -187,7 +191,7 @@ inline constexpr Routine kRoutines[] = {
   {"CLI_udfRAND1", "RAND", Frame::plain, {}, {real()}, kInnocuous | kSharedState, "", "A pseudo-random double from 0.0 to 1.0."},
   {"CLI_udfRAND2", "RAND", Frame::scratchpad, {int32("seed")}, {real()}, kInnocuous | kSharedState, "", "A pseudo-random double from 0.0 to 1.0; the first call of a statement seeds the generator."},
   // Number text
-  {"CLI_udfCHARTODOUBLE", "CHARTODOUBLE", Frame::plain, {text("text")}, {real()}, kPure | kResultByAddress, "11", "The number that a text spells, as a double."},
+  {"CLI_udfCHARTODOUBLE", "CHARTODOUBLE", Frame::plain, {text("text")}, {real()}, kPure | kResultByAddress | kWritesInputs, "11", "The number that a text spells, as a double."},
   {"CLI_udfDOUBLETOCHAR", "DOUBLETOCHAR", Frame::plain, {real("x")}, {fixedText(24)}, kPure, "", "A double in short scientific notation, 24 bytes filled up with blanks."},
   // Basic strings
   {"CLI_udfSPACE", "SPACE", Frame::plain, {int32("count")}, {textOf(kText)}, kPure, "01", "A text of count blanks, count from 0 to 4000."},

@@ -149,7 +149,8 @@ std::string logicDeclaration(const Routine &r) {
   std::vector<std::string> p;
   for (std::size_t i = 0; i < inputCount(r); ++i) {
     const Slot &s = r.inputs[i];
-    std::string type = s.layout == Layout::text  ? "TextIn"
+    const bool writable = (r.properties & cli::catalogue::kWritesInputs) != 0;
+    std::string type = s.layout == Layout::text  ? (writable ? "WritableTextIn" : "TextIn")
                        : s.layout == Layout::lob ? "LobIn"
                        : s.layout == Layout::fixedBytes
                            ? "BytesIn"

@@ -22,7 +22,7 @@ using DateNumber = std::int32_t (*)(std::int32_t, std::int32_t, std::int32_t);
 
 // Reads only the date at the head of the text; every failure is 04.
 template <DateNumber compute>
-Answer<std::int32_t> fromDatePart(cli::TextIn text) noexcept {
+Answer<std::int32_t> fromDatePart(cli::WritableTextIn text) noexcept {
   std::int32_t y = 0, m = 0, d = 0;
   if (cli::CLI_parseDatePart(text.chars(), &y, &m, &d) == 0) {
     return cli::failure<std::int32_t>(Sysfun::badDate);
@@ -32,7 +32,7 @@ Answer<std::int32_t> fromDatePart(cli::TextIn text) noexcept {
 
 // Validates the whole text, a time of day included; fails with 04 or 06.
 template <DateNumber compute>
-Answer<std::int32_t> fromDateText(cli::TextIn text) noexcept {
+Answer<std::int32_t> fromDateText(cli::WritableTextIn text) noexcept {
   std::int32_t y = 0, m = 0, d = 0;
   char code[3];
   if (cli::CLI_parseDateText(text.chars(), &y, &m, &d, nullptr, nullptr, nullptr, code) == 0) {
@@ -49,52 +49,52 @@ constexpr std::int32_t secondsOf(std::int32_t h, std::int32_t m, std::int32_t s)
 
 namespace cli {
 
-Answer<std::int32_t> routine::JULIAN_DAY1(TextIn date) noexcept {
+Answer<std::int32_t> routine::JULIAN_DAY1(WritableTextIn date) noexcept {
   return fromDatePart<cli::CLI_julianDay>(date);
 }
-Answer<std::int32_t> routine::JULIAN_DAY2(TextIn date) noexcept {
+Answer<std::int32_t> routine::JULIAN_DAY2(WritableTextIn date) noexcept {
   return fromDateText<cli::CLI_julianDay>(date);
 }
-Answer<std::int32_t> routine::WEEK1(TextIn date) noexcept {
+Answer<std::int32_t> routine::WEEK1(WritableTextIn date) noexcept {
   return fromDatePart<cli::CLI_weekOfYear>(date);
 }
-Answer<std::int32_t> routine::WEEK2(TextIn date) noexcept {
+Answer<std::int32_t> routine::WEEK2(WritableTextIn date) noexcept {
   return fromDateText<cli::CLI_weekOfYear>(date);
 }
-Answer<std::int32_t> routine::WEEK_ISO1(TextIn date) noexcept {
+Answer<std::int32_t> routine::WEEK_ISO1(WritableTextIn date) noexcept {
   return fromDatePart<cli::CLI_isoWeekOfYear>(date);
 }
-Answer<std::int32_t> routine::WEEK_ISO2(TextIn date) noexcept {
+Answer<std::int32_t> routine::WEEK_ISO2(WritableTextIn date) noexcept {
   return fromDateText<cli::CLI_isoWeekOfYear>(date);
 }
-Answer<std::int32_t> routine::QUARTER1(TextIn date) noexcept {
+Answer<std::int32_t> routine::QUARTER1(WritableTextIn date) noexcept {
   return fromDatePart<cli::CLI_quarter>(date);
 }
-Answer<std::int32_t> routine::QUARTER2(TextIn date) noexcept {
+Answer<std::int32_t> routine::QUARTER2(WritableTextIn date) noexcept {
   return fromDateText<cli::CLI_quarter>(date);
 }
-Answer<std::int32_t> routine::DAYOFYEAR1(TextIn date) noexcept {
+Answer<std::int32_t> routine::DAYOFYEAR1(WritableTextIn date) noexcept {
   return fromDatePart<cli::CLI_dayOfYear>(date);
 }
-Answer<std::int32_t> routine::DAYOFYEAR2(TextIn date) noexcept {
+Answer<std::int32_t> routine::DAYOFYEAR2(WritableTextIn date) noexcept {
   return fromDateText<cli::CLI_dayOfYear>(date);
 }
 // For the days of the week the digits run the other way.
-Answer<std::int32_t> routine::DAYOFWEEK1(TextIn date) noexcept {
+Answer<std::int32_t> routine::DAYOFWEEK1(WritableTextIn date) noexcept {
   return fromDateText<cli::CLI_dayOfWeek>(date);
 }
-Answer<std::int32_t> routine::DAYOFWEEK2(TextIn date) noexcept {
+Answer<std::int32_t> routine::DAYOFWEEK2(WritableTextIn date) noexcept {
   return fromDatePart<cli::CLI_dayOfWeek>(date);
 }
-Answer<std::int32_t> routine::DAYOFWEEK_ISO1(TextIn date) noexcept {
+Answer<std::int32_t> routine::DAYOFWEEK_ISO1(WritableTextIn date) noexcept {
   return fromDateText<cli::CLI_isoDayOfWeek>(date);
 }
-Answer<std::int32_t> routine::DAYOFWEEK_ISO2(TextIn date) noexcept {
+Answer<std::int32_t> routine::DAYOFWEEK_ISO2(WritableTextIn date) noexcept {
   return fromDatePart<cli::CLI_isoDayOfWeek>(date);
 }
 
 // A time alone; 05 when it is no time.
-Answer<std::int32_t> routine::MIDNIGHT_SECONDS1(TextIn time) noexcept {
+Answer<std::int32_t> routine::MIDNIGHT_SECONDS1(WritableTextIn time) noexcept {
   std::int32_t h = 0, m = 0, s = 0;
   if (CLI_parseTimeText(kTimeMode, time.chars(), &h, &m, &s) == 0) {
     return failure<std::int32_t>(Sysfun::badTime);
@@ -104,7 +104,7 @@ Answer<std::int32_t> routine::MIDNIGHT_SECONDS1(TextIn time) noexcept {
 
 // A time, or a date or timestamp: 9 bytes or more after trimming is read as
 // a date, as no time text is that long.
-Answer<std::int32_t> routine::MIDNIGHT_SECONDS2(TextIn value) noexcept {
+Answer<std::int32_t> routine::MIDNIGHT_SECONDS2(WritableTextIn value) noexcept {
   char *text = value.chars();
   std::int32_t y = 0, mo = 0, d = 0, h = 0, m = 0, s = 0;
   if (CLI_trimBlanks(text) >= 9) {

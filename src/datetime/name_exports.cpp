@@ -32,7 +32,7 @@ enum class Reader { wholeText, datePart };
 // Parse, fetch the name, store it in the database's code page.  A null
 // information block ends the call after the date is validated.
 template <Name name, Reader reader>
-Report nameOf(cli::TextIn date, cli::TextOut out, cli::DbInfo dbinfo) noexcept {
+Report nameOf(cli::WritableTextIn date, cli::TextOut out, cli::DbInfo dbinfo) noexcept {
   char *text = date.chars();
   char *result = out.chars();
   std::int32_t y = 0, m = 0, d = 0;
@@ -79,16 +79,16 @@ Report nameOf(cli::TextIn date, cli::TextOut out, cli::DbInfo dbinfo) noexcept {
 namespace cli {
 
 // The digits run the opposite way in the two routines.
-Report routine::DAYNAME1(TextIn date, TextOut result, DbInfo dbinfo) noexcept {
+Report routine::DAYNAME1(WritableTextIn date, TextOut result, DbInfo dbinfo) noexcept {
   return nameOf<Name::day, Reader::wholeText>(date, result, dbinfo);
 }
-Report routine::DAYNAME2(TextIn date, TextOut result, DbInfo dbinfo) noexcept {
+Report routine::DAYNAME2(WritableTextIn date, TextOut result, DbInfo dbinfo) noexcept {
   return nameOf<Name::day, Reader::datePart>(date, result, dbinfo);
 }
-Report routine::MONTHNAME1(TextIn date, TextOut result, DbInfo dbinfo) noexcept {
+Report routine::MONTHNAME1(WritableTextIn date, TextOut result, DbInfo dbinfo) noexcept {
   return nameOf<Name::month, Reader::datePart>(date, result, dbinfo);
 }
-Report routine::MONTHNAME2(TextIn date, TextOut result, DbInfo dbinfo) noexcept {
+Report routine::MONTHNAME2(WritableTextIn date, TextOut result, DbInfo dbinfo) noexcept {
   return nameOf<Name::month, Reader::wholeText>(date, result, dbinfo);
 }
 

@@ -66,18 +66,18 @@ Report stampDate(char *text, char *result) noexcept {
 
 namespace cli {
 
-Report routine::TIMESTAMPTIME(TextIn time, TextOut result) noexcept {
+Report routine::TIMESTAMPTIME(WritableTextIn time, TextOut result) noexcept {
   return stampTime(time.chars(), result.chars());
 }
 
-Report routine::TIMESTAMPDATE(TextIn date, TextOut result) noexcept {
+Report routine::TIMESTAMPDATE(WritableTextIn date, TextOut result) noexcept {
   return stampDate(date.chars(), result.chars());
 }
 
 // By its form: longer than 10 bytes a timestamp, copied up to the result's
 // 26 bytes (a longer fraction is cut); otherwise a date when it holds a
 // hyphen, a time when it has 8 bytes, and nothing that is taken else.
-Report routine::TIMESTAMP(TextIn value, TextOut result) noexcept {
+Report routine::TIMESTAMP(WritableTextIn value, TextOut result) noexcept {
   char *text = value.chars();
   const std::size_t length = CLI_trimBlanks(text);
   if (length > 10) {

@@ -29,12 +29,16 @@ struct Bytes {
   std::size_t size;
 };
 
-// An input of terminated text: bytes up to the first NUL.  Input buffers
-// are writable, and the date routines cut trailing blanks in place.
-class TextIn {
+// An input of terminated text: bytes up to the first NUL.  The engine's
+// input buffers are writable, and a routine marked kWritesInputs (the date
+// and number parsers, which cut trailing blanks in place) gets its text as
+// WritableTextIn; every other routine gets a TextIn, which can only read,
+// so a host may hand those routines a buffer it must not have written.
+template <class Char>
+class BasicTextIn {
  public:
-  explicit TextIn(char *value) noexcept : value_(value) {}
-  [[nodiscard]] char *chars() const noexcept { return value_; }
+  explicit BasicTextIn(Char *value) noexcept : value_(value) {}
+  [[nodiscard]] Char *chars() const noexcept { return value_; }
   [[nodiscard]] Bytes bytes() const noexcept {
     return {reinterpret_cast<const Byte *>(value_), std::strlen(value_)};
   }
@@ -44,8 +48,10 @@ class TextIn {
   }
 
  private:
-  char *value_;
+  Char *value_;
 };
+using TextIn = BasicTextIn<const char>;
+using WritableTextIn = BasicTextIn<char>;
 
 // A CLI_udfLob: a 32-bit length word, then the data.  Read through memcpy
 // so that the word may stand at any address.

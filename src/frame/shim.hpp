@@ -8,7 +8,8 @@
 // parameters don't take the views that the row implies does not compile.
 //
 // The logic of a routine takes, in this order:
-//   its inputs: a number by value, TextIn, LobIn or BytesIn, each wrapped
+//   its inputs: a number by value, TextIn (WritableTextIn for a routine
+//     marked kWritesInputs), LobIn or BytesIn, each wrapped
 //     in Nullable for a routine that reads its input indicators;
 //   its result, unless that is a single number, which it returns in an
 //     Answer (or, marked kResultByAddress, gets as the result's address):
@@ -42,7 +43,11 @@ template <std::size_t R, std::size_t I, class Pointer>
 auto inputView(Pointer p) noexcept {
   constexpr cat::Layout layout = cat::kRoutines[R].inputs[I].layout;
   if constexpr (layout == cat::Layout::text) {
-    return TextIn{p};
+    if constexpr ((cat::kRoutines[R].properties & cat::kWritesInputs) != 0) {
+      return WritableTextIn{p};
+    } else {
+      return TextIn{p};
+    }
   } else if constexpr (layout == cat::Layout::lob) {
     return LobIn{p};
   } else if constexpr (layout == cat::Layout::fixedBytes) {

@@ -45,7 +45,7 @@ namespace cli {
 // Cuts trailing white space in the caller's buffer, then asks the number
 // service, which writes the result itself; leading white space is the
 // service's to judge.
-Report routine::CHARTODOUBLE(TextIn text, double *result) noexcept {
+Report routine::CHARTODOUBLE(WritableTextIn text, double *result) noexcept {
   char *chars = text.chars();
   const std::size_t full = std::strlen(chars);
   std::size_t n = full;
