@@ -79,32 +79,9 @@ constexpr const char *sqlType(Type t) {
   return "";
 }
 
-// The spelling of a Type in C++, for the generated entry points.
-constexpr const char *cppType(Type t) {
-  switch (t) {
-    case Type::int2:
-      return "Type::int2";
-    case Type::int4:
-      return "Type::int4";
-    case Type::int8:
-      return "Type::int8";
-    case Type::float8:
-      return "Type::float8";
-    case Type::text:
-      return "Type::text";
-    case Type::bytea:
-      return "Type::bytea";
-    case Type::date:
-      return "Type::date";
-    case Type::time:
-      return "Type::time";
-    case Type::timestamp:
-      return "Type::timestamp";
-    case Type::timestamptz:
-      return "Type::timestamptz";
-  }
-  return "";
-}
+// The spelling of a Type in C++, for the generated entry points: each
+// enumerator is named as its SQL type.
+inline std::string cppType(Type t) { return std::string("Type::") + sqlType(t); }
 
 inline constexpr std::size_t kNoRow = static_cast<std::size_t>(-1);
 
