@@ -244,8 +244,12 @@ std::string publicHeader() {
       "#ifndef ORVCLIFN_H\n#define ORVCLIFN_H\n\n#include \"cliudf.h\"\n\n"
       "#ifdef __cplusplus\nextern \"C\" {\n#endif\n";
   for (const Routine &r : kRoutines) {
-    out += "\n/* " + std::string(r.sqlName) + ": " + r.summary + " */\nvoid " + r.symbol + "(" +
-           joined(parameters(r), ", ") + ");\n";
+    // A caller that passes a buffer it must keep as it is needs to know.
+    const char *writes = (r.properties & cli::catalogue::kWritesInputs) != 0
+                             ? " Cuts trailing blanks off its text input in place."
+                             : "";
+    out += "\n/* " + std::string(r.sqlName) + ": " + r.summary + writes + " */\nvoid " + r.symbol +
+           "(" + joined(parameters(r), ", ") + ");\n";
   }
   return out + "\n#ifdef __cplusplus\n}\n#endif\n\n#endif /* ORVCLIFN_H */\n";
 }
