@@ -312,7 +312,7 @@ def find_sites(file, text):
             continue
         lead = len(line) - len(line.lstrip())
         found = []  # (kind, start, end, change), columns in the full line
-        found += _operator_sites(masked)
+        found += _operator_sites(masked, line)
         found += _constant_sites(masked)
         found += _branch_sites(masked, line)
         found += _return_sites(masked, line)
@@ -354,15 +354,23 @@ def _template_arguments(masked):
     return spans
 
 
-def _operator_sites(masked):
+def _operator_sites(masked, line):
     """Relational, arithmetic and logical operators, and increments outside a for's header."""
     found = []
+    chains = set()
     for match in _SPACED_OPERATOR.finditer(masked):
         op = match.group(1)
         if op in RELATIONAL:
             found.append(("relational", match.start(), match.end(), RELATIONAL[op]))
         elif op in LOGICAL:
-            found.append(("logical", match.start(), match.end(), LOGICAL[op]))
+            chain = _logical_group(masked, match.start())
+            if chain is not None and chain not in chains:
+                chains.add(chain)
+                start, end = chain[0], chain[-1] + 2
+                turned = list(line[start:end])
+                for position in chain:
+                    turned[position - start:position - start + 2] = LOGICAL[op]
+                found.append(("logical", start, end, "".join(turned)))
         else:
             found.append(("arithmetic", match.start(), match.end(), ARITHMETIC[op]))
     # A loop's own step turned around only runs off its range, so it is left
@@ -380,6 +388,53 @@ def _operator_sites(masked):
         replacement = "--" if match.group() == "++" else "++"
         found.append(("arithmetic", match.start(), match.end(), replacement))
     return found
+
+
+def _logical_group(masked, at):
+    """The positions of the `&&` or `||` operators of the chain that holds the one at `at`.
+
+    A chain is the logical operators at one level of parentheses.  Turning
+    one link of `a && b && c` alone would mix `&&` and `||` without
+    parentheses, which the build refuses as a warning, so the whole chain
+    is turned.  None for a chain that goes on over another line, or one
+    that mixes both operators (they stand only parenthesised here).
+    """
+    depth, start, opened = 0, at, False
+    while start > 0:
+        c = masked[start - 1]
+        if c in ")]":
+            depth += 1
+        elif c in "([":
+            if depth == 0:
+                opened = True
+                break
+            depth -= 1
+        start -= 1
+    depth, end, closed = 0, at, False
+    while end < len(masked):
+        c = masked[end]
+        if c in "([":
+            depth += 1
+        elif c in ")]":
+            if depth == 0:
+                closed = True
+                break
+            depth -= 1
+        end += 1
+    if opened != closed or (not opened and not masked.rstrip().endswith((";", "{"))):
+        return None  # the chain goes on over another line
+    links, depth = [], 0
+    for match in re.finditer(r"[()\[\]]|(?<= )(&&|\|\|)(?= )", masked[start:end]):
+        token = match.group()
+        if token in "([":
+            depth += 1
+        elif token in ")]":
+            depth -= 1
+        elif depth == 0:
+            links.append((start + match.start(), token))
+    if len({token for _, token in links}) != 1:
+        return None
+    return tuple(position for position, _ in links)
 
 
 def _constant_sites(masked):
