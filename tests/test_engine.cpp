@@ -96,12 +96,6 @@ TEST(CollationName, NamesKnownIdentifiersAndGivesInvalidOtherwise) {
 
 // ---- DAYNAME and MONTHNAME ------------------------------------------------
 
-// A database information block whose code page is `codePage`.
-struct DatabaseInfo {
-  explicit DatabaseInfo(std::uint32_t codePage) { std::memcpy(block + 268, &codePage, 4); }
-  unsigned char block[512] = {};
-};
-
 class Names : public ::testing::Test {
  protected:
   void SetUp() override { orv::test::setEnvironment("ORVENGINE_LOCALE", "en_US"); }

@@ -41,21 +41,16 @@ class Fakes : public ::testing::Test {
 
 // ---- Names -----------------------------------------------------------------
 
-struct Block {
-  explicit Block(std::uint32_t codePage) { std::memcpy(bytes + 268, &codePage, 4); }
-  unsigned char bytes[300] = {};
-};
-
 TEST_F(Fakes, NamesFillOneFieldOfTheTimeRecord) {
-  Block utf8(1208);
+  DatabaseInfo utf8(1208);
   const CLI_nlsTimeRecord zero{};
-  EXPECT_EQ(call("CLI_udfMONTHNAME1", {text("2001-12-01")}, textArea(102), {utf8.bytes}),
+  EXPECT_EQ(call("CLI_udfMONTHNAME1", {text("2001-12-01")}, textArea(102), {utf8.block}),
             ok("Sunday"));
   CLI_nlsTimeRecord want = zero;
   want.month = 11;
   EXPECT_EQ(std::memcmp(&fakes->lastTime, &want, sizeof want), 0);
   EXPECT_EQ(fakes->lastNameSize, 101u);
-  call("CLI_udfDAYNAME2", {text("2001-01-06")}, textArea(102), {utf8.bytes});
+  call("CLI_udfDAYNAME2", {text("2001-01-06")}, textArea(102), {utf8.block});
   want = zero;
   want.dayOfWeek = 6;
   EXPECT_EQ(std::memcmp(&fakes->lastTime, &want, sizeof want), 0);
@@ -63,21 +58,21 @@ TEST_F(Fakes, NamesFillOneFieldOfTheTimeRecord) {
 }
 
 TEST_F(Fakes, NamesFailWithTheNameServiceAndTheConversion) {
-  Block utf8(1208), wide(70000);
+  DatabaseInfo utf8(1208), wide(70000);
   fakes->nameLength = 0;
-  EXPECT_EQ(call("CLI_udfDAYNAME1", {text("2001-01-07")}, textArea(102), {utf8.bytes}),
+  EXPECT_EQ(call("CLI_udfDAYNAME1", {text("2001-01-07")}, textArea(102), {utf8.block}),
             fails("03"));
   fakes->nameLength = 102;  // more than the buffer holds
-  EXPECT_EQ(call("CLI_udfDAYNAME1", {text("2001-01-07")}, textArea(102), {utf8.bytes}),
+  EXPECT_EQ(call("CLI_udfDAYNAME1", {text("2001-01-07")}, textArea(102), {utf8.block}),
             fails("03"));
   fakes->nameLength = 101;
   std::memset(fakes->name, 'n', 101);
-  EXPECT_EQ(call("CLI_udfDAYNAME1", {text("2001-01-07")}, textArea(102), {utf8.bytes}),
+  EXPECT_EQ(call("CLI_udfDAYNAME1", {text("2001-01-07")}, textArea(102), {utf8.block}),
             ok(std::string(101, 'n')));
   // A code page above 65535 never equals the name's: the name is converted.
   fakes->nameLength = 6;
   std::memcpy(fakes->name, "Sunday", 6);
-  EXPECT_EQ(call("CLI_udfDAYNAME1", {text("2001-01-07")}, textArea(102), {wide.bytes}),
+  EXPECT_EQ(call("CLI_udfDAYNAME1", {text("2001-01-07")}, textArea(102), {wide.block}),
             ok("Sunday"));
   const CLI_conversionRecord &r = fakes->lastRecord;
   EXPECT_EQ(r.space, 101u);
@@ -88,7 +83,7 @@ TEST_F(Fakes, NamesFailWithTheNameServiceAndTheConversion) {
   // Any status but 0 fails, positive ones too; what was written stays, terminated.
   fakes->convertStatus = 5;
   fakes->convertBytes = 3;
-  EXPECT_EQ(call("CLI_udfDAYNAME1", {text("2001-01-07")}, textArea(102), {wide.bytes}),
+  EXPECT_EQ(call("CLI_udfDAYNAME1", {text("2001-01-07")}, textArea(102), {wide.block}),
             failsLeaving("03", "Sun"));
 }
 
@@ -157,7 +152,7 @@ TEST_F(Fakes, VeblobTakesPositiveStatusesAsSuccessAndAsksTheEncodingClass) {
   EXPECT_EQ(copy("CLI_udfVEBLOB_CP_SMALL", 300000, 1200, 37).indicator, 1);
   fakes->encodingClass = 1;
   const int calls = fakes->convertCalls;
-  EXPECT_EQ(copy("CLI_udfVEBLOB_CP_SMALL", 300000, 1200, 37).error, "38601");
+  EXPECT_EQ(copy("CLI_udfVEBLOB_CP_SMALL", 300000, 1200, 37).error, "38601/sqlocpcv");
   EXPECT_EQ(fakes->convertCalls, calls);  // refused before converting
 }
 

@@ -5,13 +5,17 @@
 // routine: nothing written past the result area, null indicators never
 // touched, status buffers untouched on success, and on failure exactly
 // "38552" and "SYSFUN:NN" stored with the result area left as it was.
+// Calls may come from several threads at once.
 #pragma once
 
 #include <bit>
 #include <cstdint>
+#include <cstring>
 #include <ostream>
 #include <string>
 #include <vector>
+
+#include "frame/cliudf.h"
 
 namespace orv::test {
 
@@ -64,9 +68,10 @@ struct Outcome {
   std::string error;  // two-digit SYSFUN code, empty on success
   std::string bytes;  // a string result
   std::int64_t number = 0;
-  bool stored = false;  // a failure that left a value in the result area
-  bool real = false;    // `number` holds the bits of a double
-  int indicator = 0;    // the result indicator, from callNullable only
+  bool stored = false;     // a failure that left a value in the result area
+  bool real = false;       // `number` holds the bits of a double
+  int indicator = 0;       // the result indicator, from callNullable only
+  bool leftAlone = false;  // a success that wrote nothing to a string result
   bool operator==(const Outcome &) const = default;
 };
 
@@ -86,6 +91,15 @@ inline Outcome failsLeaving(std::string code, std::string bytes) {
   return {std::move(code), std::move(bytes), 0, true};
 }
 
+// A success that left the string result area as it was, with this result
+// indicator (callNullable's; 0 for call).
+inline Outcome leftAlone(int indicator = 0) {
+  Outcome o;
+  o.indicator = indicator;
+  o.leftAlone = true;
+  return o;
+}
+
 void PrintTo(const Outcome &o, std::ostream *os);
 
 // Calls the export `name`, a routine of one result, through the frame
@@ -99,7 +113,17 @@ Outcome call(const char *name, const std::vector<Value> &inputs, const Value &re
 // The same for a routine that handles NULL itself: input indicators are -1
 // for inputs made with nullOf and 0 otherwise, and the result indicator
 // that the routine leaves (0x5A5A if it leaves it alone) is in `indicator`.
+// A status of its own (VEBLOB_CP's) is the error "SSSSS/message": five
+// characters and eight, neither terminated, and nothing written behind.
 Outcome callNullable(const char *name, const std::vector<Value> &inputs, const Value &result);
+
+// A database information block of a database in `codePage`.
+struct DatabaseInfo {
+  explicit DatabaseInfo(std::uint32_t codePage) {
+    std::memcpy(block + CLI_DBINFO_CODEPAGE_OFFSET, &codePage, sizeof codePage);
+  }
+  unsigned char block[512] = {};
+};
 
 // The address of an export of the library in use, or null.
 void *exportAddress(const char *name);
