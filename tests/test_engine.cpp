@@ -2,17 +2,15 @@
 // text, collation names, day and month names.
 #include <gtest/gtest.h>
 
+#include <bit>
 #include <cmath>
 #include <cstdint>
+#include <cstdio>
 #include <cstdlib>
-#include <cstring>
-#include <limits>
 #include <random>
 #include <string>
-#include <vector>
 
 #include "catalogue/catalogue.hpp"
-#include "frame/call.hpp"
 #include "support/frame_call.hpp"
 #include "support/platform.hpp"
 
@@ -74,7 +72,7 @@ TEST(DoubleToChar, RoundTripsThroughCharToDoubleAt15Digits) {
     const Outcome shortText = call("CLI_udfDOUBLETOCHAR", {f64(x)}, fixedArea(24));
     const std::string trimmed = shortText.bytes.substr(0, shortText.bytes.find(' '));
     char expected[40];
-    std::snprintf(expected, sizeof expected, "%.14E", x);
+    static_cast<void>(std::snprintf(expected, sizeof expected, "%.14E", x));
     EXPECT_EQ(call("CLI_udfCHARTODOUBLE", {text(trimmed)}, numberArea(Value::Layout::real)),
               number(std::strtod(expected, nullptr)))
         << trimmed;
@@ -100,7 +98,7 @@ class Names : public ::testing::Test {
  protected:
   void SetUp() override { orv::test::setEnvironment("ORVENGINE_LOCALE", "en_US"); }
   void TearDown() override { orv::test::unsetEnvironment("ORVENGINE_LOCALE"); }
-  Outcome name(const char *routine, const char *date, void *dbinfo) {
+  static Outcome name(const char *routine, const char *date, void *dbinfo) {
     return call(routine, {text(date)}, textArea(102), {dbinfo});
   }
   DatabaseInfo utf8{1208};
@@ -131,30 +129,7 @@ TEST_F(Names, GiveTheServersNamesForEachReader) {
 
 TEST_F(Names, ValidateTheDateButFetchNothingWithoutTheBlock) {
   EXPECT_EQ(name("CLI_udfDAYNAME1", "2001-13-05", nullptr), fails("04"));
-  void *fn = exportAddress("CLI_udfMONTHNAME2");
-  ASSERT_NE(fn, nullptr);
-  char date[] = "2001-01-05";
-  char result[102];
-  std::memset(result, 'R', sizeof result);
-  std::int16_t ind[2] = {7, 7};
-  char status[6 + 70] = {};
-  void *const inputs[] = {date};
-  void *const results[] = {result};
-  std::int16_t *const inputIndicators[] = {&ind[0]};
-  std::int16_t *const resultIndicators[] = {&ind[1]};
-  cli::call::Frame f;
-  f.inputs = inputs;
-  f.results = results;
-  f.inputIndicators = inputIndicators;
-  f.resultIndicators = resultIndicators;
-  f.sqlstate = status;
-  f.functionName = "";
-  f.specificName = "";
-  f.message = status + 6;
-  f.dbinfo = nullptr;  // no database information block
-  cli::call::call(*cli::catalogue::find("CLI_udfMONTHNAME2"), fn, f);
-  EXPECT_EQ(std::string(result, sizeof result), std::string(sizeof result, 'R'));
-  EXPECT_EQ(status[0], '\0');
+  EXPECT_EQ(name("CLI_udfMONTHNAME2", "2001-01-05", nullptr), leftAlone());
 }
 
 TEST_F(Names, ConvertIntoTheDatabasesCodePage) {
@@ -169,13 +144,6 @@ TEST_F(Names, ConvertIntoTheDatabasesCodePage) {
 
 // ---- VEBLOB_CP ------------------------------------------------------------
 
-struct Copied {
-  std::string data;     // the result's data, by its length word, when it was set
-  std::string status;   // five SQLSTATE characters, empty when none
-  std::string message;  // eight characters
-  int indicator = 0x5A5A;
-};
-
 // A record: head, tag, length field in the given byte order, string.
 std::string record(unsigned char tag, const std::string &text, bool bigEndian = false) {
   std::string r(22, 'H');
@@ -188,109 +156,90 @@ std::string record(unsigned char tag, const std::string &text, bool bigEndian = 
   return r + text;
 }
 
-Copied copy(const char *routine, const std::string &object, std::int32_t from, std::int32_t to,
-            std::int32_t order, bool null = false) {
-  const cli::catalogue::Routine *row = cli::catalogue::find(routine);
-  void *fn = exportAddress(routine);
-  EXPECT_NE(row, nullptr);
-  EXPECT_NE(fn, nullptr);
-  if (row == nullptr || fn == nullptr) return {};
-  std::vector<unsigned char> in(4 + object.size());
-  const auto n = static_cast<std::uint32_t>(object.size());
-  std::memcpy(in.data(), &n, 4);
-  std::memcpy(in.data() + 4, object.data(), object.size());
-  std::vector<unsigned char> out(4 + 1000000 + 64, 0xCD);
-  std::int16_t ind[5] = {static_cast<std::int16_t>(null ? -1 : 0), 0, 0, 0, 0x5A5A};
-  char sqlstate[6] = {}, message[16] = {};
-  void *const inputs[] = {in.data(), &from, &to, &order};
-  void *const results[] = {out.data()};
-  std::int16_t *const inputIndicators[] = {&ind[0], &ind[1], &ind[2], &ind[3]};
-  std::int16_t *const resultIndicators[] = {&ind[4]};
-  cli::call::Frame f;
-  f.inputs = inputs;
-  f.results = results;
-  f.inputIndicators = inputIndicators;
-  f.resultIndicators = resultIndicators;
-  f.sqlstate = sqlstate;
-  f.functionName = "";
-  f.specificName = "";
-  f.message = message;
-  cli::call::call(*row, fn, f);
-  Copied c;
-  c.indicator = ind[4];
-  if (sqlstate[0] != '\0') {
-    c.status.assign(sqlstate, 5);
-    c.message.assign(message, 8);
-    return c;
-  }
-  std::uint32_t length = 0;
-  std::memcpy(&length, out.data(), 4);
-  if (c.indicator == 1) c.data.assign(reinterpret_cast<char *>(out.data()) + 4, length);
-  return c;
+const char *const kLarge = "CLI_udfVEBLOB_CP_LARGE";
+const char *const kSmall = "CLI_udfVEBLOB_CP_SMALL";
+
+Outcome copy(const Value &object, std::int32_t from, std::int32_t to, std::int32_t order = 0,
+             const char *routine = kLarge) {
+  return callNullable(routine, {object, i32(from), i32(to), i32(order)},
+                      lobArea(cli::catalogue::find(routine)->results[0].size));
+}
+Outcome copy(const std::string &object, std::int32_t from, std::int32_t to, std::int32_t order = 0,
+             const char *routine = kLarge) {
+  return copy(lob(object), from, to, order, routine);
 }
 
-TEST(VeblobCopy, ConvertsEachStringAndRewritesItsLength) {
-  const char *large = "CLI_udfVEBLOB_CP_LARGE";
-  EXPECT_EQ(copy(large, "", 819, 1208, 0, true).indicator, -1);
-  EXPECT_EQ(copy(large, std::string(22, 'H'), 819, 1208, 0).indicator, 1);
-  EXPECT_EQ(copy(large, std::string(22, 'H'), 819, 1208, 0).data, "");
-  EXPECT_EQ(copy(large, record(0x4B, ""), 819, 1208, 0).data, record(0x4B, ""));
-  EXPECT_EQ(copy(large, record(0x4B, "M\xE4rz"), 819, 1208, 0).data, record(0x4B, "M\xC3\xA4rz"));
-  // Two records, 16- and 32-bit fields, the second in the object's order.
+// A copy, which sets the result indicator to 1, and a refusal, which
+// leaves it alone.
+Outcome copied(std::string data) {
+  Outcome o = ok(std::move(data));
+  o.indicator = 1;
+  return o;
+}
+Outcome refused(const std::string &status) {
+  Outcome o = fails(status + "/sqlocpcv");
+  o.indicator = 0x5A5A;
+  return o;
+}
+
+TEST(VeblobCopy, ConvertsEachStringAndRewritesItsLengthOrRefuses) {
+  EXPECT_EQ(copy(nullOf(lob("")), 819, 1208), leftAlone(-1));
   const std::string two = record(0x8B, "\xE4\xE4", true) + record(0xCB, "\xFC", true);
-  EXPECT_EQ(copy(large, two, 819, 1208, -1).data,
-            record(0x8B, "\xC3\xA4\xC3\xA4", true) + record(0xCB, "\xC3\xBC", true));
-  EXPECT_EQ(copy(large, two, 819, 819, 1).data, two);  // 1 swaps as -1 does
-  // Bytes behind the last whole record are dropped.
-  EXPECT_EQ(copy(large, record(0x4B, "ab") + "HHHH", 1208, 1208, 0).data, record(0x4B, "ab"));
-  EXPECT_EQ(copy(large, record(0x4B, "ab") + std::string(22, 'H'), 1208, 1208, 0).data,
-            record(0x4B, "ab"));
+  std::string unknownTag = record(0x4B, "ab");
+  unknownTag[22] = 0x11;
+  // The space for each string is the object's size; a converted string
+  // longer than that fails, and one longer than its 8-bit field can say.
+  const std::string grows = record(0x4B, std::string(200, '\xE4'));
+  const std::string cut = record(0xCB, "abcdef");
+  const struct {
+    std::string object;
+    std::int32_t from, to, order;
+    Outcome want;
+  } cases[] = {
+      {std::string(22, 'H'), 819, 1208, 0, copied("")},
+      {record(0x4B, ""), 819, 1208, 0, copied(record(0x4B, ""))},
+      {record(0x4B, "M\xE4rz"), 819, 1208, 0, copied(record(0x4B, "M\xC3\xA4rz"))},
+      // Two records, 16- and 32-bit fields, the second in the object's order.
+      {two, 819, 1208, -1,
+       copied(record(0x8B, "\xC3\xA4\xC3\xA4", true) + record(0xCB, "\xC3\xBC", true))},
+      {two, 819, 819, 1, copied(two)},  // 1 swaps as -1 does
+      // Bytes behind the last whole record are dropped.
+      {record(0x4B, "ab") + "HHHH", 1208, 1208, 0, copied(record(0x4B, "ab"))},
+      {record(0x4B, "ab") + std::string(22, 'H'), 1208, 1208, 0, copied(record(0x4B, "ab"))},
+      {unknownTag, 1208, 1208, 0, refused("38603")},
+      {record(0x4B, "\xFF"), 1208, 819, 0, refused("38602")},
+      {grows, 819, 1208, 0, refused("38602")},
+      {grows + record(0x4B, std::string(250, 'a')), 819, 1208, 0, refused("38601")},
+      // Lengths and strings that run past the end of the object.
+      {cut.substr(0, cut.size() - 2), 1208, 1208, 0, refused("38603")},
+      {cut.substr(0, 25), 1208, 1208, 0, refused("38603")},
+  };
+  for (const auto &c : cases) {
+    EXPECT_EQ(copy(c.object, c.from, c.to, c.order), c.want) << ::testing::PrintToString(c.object);
+  }
 }
 
 // Many code pages in turn on one thread: opening a conversion's target must
 // never close its source (the stand-in keeps a few converters per thread).
 TEST(VeblobCopy, RoundTripsThroughManyCodePagesInTurn) {
-  const char *large = "CLI_udfVEBLOB_CP_LARGE";
   const std::string text = record(0x4B, "Marz 2001");
   for (int round = 0; round < 3; ++round) {
     for (const std::int32_t page : {1252, 37, 1208, 1200, 1202, 13488, 13490, 17584, 17586, 819}) {
-      const Copied there = copy(large, text, 819, page, 0);
-      ASSERT_EQ(there.status, "") << page;
-      EXPECT_EQ(copy(large, there.data, page, 819, 0).data, text) << page;
+      const Outcome there = copy(text, 819, page);
+      ASSERT_EQ(there.error, "") << page;
+      EXPECT_EQ(copy(there.bytes, page, 819), copied(text)) << page;
     }
   }
-}
-
-TEST(VeblobCopy, ReportsRoomFormAndConversionFailures) {
-  const auto status = [](const Copied &c) { return c.status + "/" + c.message; };
-  const char *large = "CLI_udfVEBLOB_CP_LARGE";
-  std::string unknownTag = record(0x4B, "ab");
-  unknownTag[22] = 0x11;
-  EXPECT_EQ(status(copy(large, unknownTag, 1208, 1208, 0)), "38603/sqlocpcv");
-  EXPECT_EQ(status(copy(large, record(0x4B, "\xFF"), 1208, 819, 0)), "38602/sqlocpcv");
-  EXPECT_EQ(copy(large, record(0x4B, "\xFF"), 1208, 819, 0).indicator, 0x5A5A);
-  // The space for each string is the object's size; a converted string
-  // longer than that fails, and one longer than its 8-bit field can say.
-  const std::string grows = record(0x4B, std::string(200, '\xE4'));
-  EXPECT_EQ(status(copy(large, grows, 819, 1208, 0)), "38602/sqlocpcv");
-  EXPECT_EQ(status(copy(large, grows + record(0x4B, std::string(250, 'a')), 819, 1208, 0)),
-            "38601/sqlocpcv");
-  // Lengths and strings that run past the end of the object.
-  std::string cut = record(0xCB, "abcdef");
-  EXPECT_EQ(status(copy(large, cut.substr(0, cut.size() - 2), 1208, 1208, 0)), "38603/sqlocpcv");
-  EXPECT_EQ(status(copy(large, cut.substr(0, 25), 1208, 1208, 0)), "38603/sqlocpcv");
 }
 
 TEST(VeblobCopy, GivesASeveralByteCodePageTwiceTheRoom) {
 #if defined(_WIN32)
   GTEST_SKIP() << "EUC-JP (954) needs ICU, which the Windows stand-ins do without";
 #endif
-  const char *large = "CLI_udfVEBLOB_CP_LARGE", *small = "CLI_udfVEBLOB_CP_SMALL";
-  const auto status = [](const Copied &c) { return c.status + "/" + c.message; };
   // Factor 2 (EUC-JP to UTF-8) on a string of 400000 bytes fits only LARGE.
   const std::string big = record(0xCB, std::string(400000, 'a'));
-  EXPECT_EQ(copy(large, big, 954, 1208, 0).data, big);
-  EXPECT_EQ(status(copy(small, big, 954, 1208, 0)), "38601/sqlocpcv");
+  EXPECT_EQ(copy(big, 954, 1208), copied(big));
+  EXPECT_EQ(copy(big, 954, 1208, 0, kSmall), refused("38601"));
 }
 
 }  // namespace
