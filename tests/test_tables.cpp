@@ -9,8 +9,8 @@
 #include <vector>
 
 #include "catalogue/catalogue.hpp"
-#include "frame/call.hpp"
 #include "frame/cliudf.h"
+#include "frame/table_call.hpp"
 #include "support/frame_call.hpp"
 
 namespace {
@@ -21,17 +21,22 @@ using orv::test::exportAddress;
 struct Engine {
   std::int32_t openStatus = 0, closeStatus = 0, count = 0;
   std::vector<unsigned char> table;
-  bool giveTable = true;
   std::vector<std::int32_t> codes;    // request codes, in order
   std::vector<std::int32_t> inputs;   // FmpThreads' input value on open
   std::vector<std::uint64_t> closed;  // table pointers handed back
 };
 Engine *engine = nullptr;
 
+// The number that a request slot points at.
+std::int32_t *numberAt(std::uint64_t slot) {
+  std::int32_t *p = nullptr;
+  std::memcpy(&p, &slot, sizeof p);
+  return p;
+}
+
 std::int32_t callback(std::int32_t slots, void *request) {
   auto *slot = static_cast<std::uint64_t *>(request);
-  std::int32_t code = 0;
-  std::memcpy(&code, reinterpret_cast<void *>(slot[0]), 4);
+  const std::int32_t code = *numberAt(slot[0]);
   engine->codes.push_back(code);
   if (code == 1) {
     EXPECT_EQ(slots, 2);
@@ -40,13 +45,12 @@ std::int32_t callback(std::int32_t slots, void *request) {
   }
   const bool threads = code == 3;
   EXPECT_EQ(slots, threads ? 4 : 3);
-  if (threads) engine->inputs.push_back(*reinterpret_cast<std::int32_t *>(slot[1]));
-  auto *count = reinterpret_cast<std::int32_t *>(slot[threads ? 2 : 1]);
+  if (threads) engine->inputs.push_back(*numberAt(slot[1]));
+  std::int32_t *count = numberAt(slot[threads ? 2 : 1]);
   EXPECT_EQ(*count, 0);
   EXPECT_EQ(slot[threads ? 3 : 2], 0u);
   *count = engine->count;
-  if (engine->giveTable)
-    slot[threads ? 3 : 2] = reinterpret_cast<std::uintptr_t>(engine->table.data());
+  slot[threads ? 3 : 2] = reinterpret_cast<std::uintptr_t>(engine->table.data());
   return engine->openStatus;
 }
 
@@ -57,51 +61,31 @@ struct Call {
   std::array<std::int16_t, 6> indicators{};
 };
 
+// FmpThreads gives six 32-bit columns, FmpRows two and then four 16-bit
+// ones; each keeps its scratchpad from call to call.
 class Tables : public ::testing::Test {
  protected:
   void SetUp() override { engine = &fake; }
   void TearDown() override { engine = nullptr; }
 
+  // `selector` is FmpThreads' one input; FmpRows has none.
   Call run(bool threads, std::int32_t callType, std::int32_t selector = 7) {
-    Call c;
-    c.indicators.fill(0x5A5A);
-    char sqlstate[6] = {}, message[28] = {};
-    std::int32_t r32[6] = {};
-    std::int16_t r16[4] = {};
-    std::int16_t inputIndicator = 0;
-    const char *name = threads ? "CLI_udfFmpThreads" : "CLI_udfFmpRows";
-    // FmpThreads gives six 32-bit columns, FmpRows two and then four
-    // 16-bit ones.
-    void *const inputs[] = {&selector};
-    std::int16_t *const inputIndicators[] = {&inputIndicator};
-    std::array<void *, 6> results{};
-    std::array<std::int16_t *, 6> resultIndicators{};
+    cli::call::TableCall &t = threads ? fmpThreads : fmpRows;
+    if (threads) t.setInput(0, &selector);
+    t.step(callType);
+    Call c{t.status().sqlstate, t.status().message};
     for (std::size_t i = 0; i < 6; ++i) {
-      results[i] = threads || i < 2 ? static_cast<void *>(&r32[i]) : &r16[i - 2];
-      resultIndicators[i] = &c.indicators[i];
+      c.row[i] = t.number(i);
+      c.indicators[i] = t.indicator(i);
     }
-    cli::call::Frame f;
-    f.inputs = inputs;
-    f.results = results.data();
-    f.inputIndicators = inputIndicators;
-    f.resultIndicators = resultIndicators.data();
-    f.sqlstate = sqlstate;
-    f.functionName = "";
-    f.specificName = "";
-    f.message = message;
-    f.scratchpad = scratchpad.data();
-    f.callType = &callType;
-    f.callback = callback;
-    cli::call::call(*cli::catalogue::find(name), exportAddress(name), f);
-    for (std::size_t i = 0; i < 6; ++i) c.row[i] = threads || i < 2 ? r32[i] : r16[i - 2];
-    EXPECT_EQ(inputIndicator, 0);
-    c.sqlstate = sqlstate;
-    c.message = message;
     return c;
   }
 
   Engine fake;
-  std::array<unsigned char, 128> scratchpad{};
+  cli::call::TableCall fmpThreads{*cli::catalogue::find("CLI_udfFmpThreads"),
+                                  exportAddress("CLI_udfFmpThreads"), callback, 0x5A5A};
+  cli::call::TableCall fmpRows{*cli::catalogue::find("CLI_udfFmpRows"),
+                               exportAddress("CLI_udfFmpRows"), callback, 0x5A5A};
 };
 
 std::vector<unsigned char> words(std::initializer_list<std::int32_t> values) {
