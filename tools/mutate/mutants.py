@@ -316,9 +316,9 @@ def find_sites(file, text):
         found += _constant_sites(masked)
         found += _branch_sites(masked, line)
         found += _return_sites(masked, line)
-        arguments = _template_arguments(masked)
+        fixed = _template_arguments(masked) + _declared_sizes(masked)
         for kind, start, end, change in found:
-            if any(a <= start < b for a, b in arguments):
+            if any(a <= start < b for a, b in fixed):
                 continue
             widened = _unique_fragment(stripped, start - lead, end - lead)
             if widened is None:
@@ -351,6 +351,19 @@ def _template_arguments(masked):
                     break
             elif c in ";{":
                 break
+    return spans
+
+
+def _declared_sizes(masked):
+    """The spans of the sizes of arrays being declared, such as `31 * 12` in `int t[31 * 12]`."""
+    spans = []
+    for match in re.finditer(r"\[", masked):
+        declared = _DECLARED_SIZE.search(masked[:match.end()])
+        if not declared or declared.group(1) in _NOT_TYPES:
+            continue
+        close = masked.find("]", match.end())
+        if close != -1:
+            spans.append((match.end(), close))
     return spans
 
 
@@ -438,15 +451,12 @@ def _logical_group(masked, at):
 
 
 def _constant_sites(masked):
-    """Integer literals, except sizes of arrays being declared and template arguments."""
+    """Integer literals, except those of template arguments and alignments."""
     found = []
     for match in _INTEGER.finditer(masked):
         before = masked[:match.start()]
         after = masked[match.end():]
         if before.endswith("<") or after.startswith(">") or before.endswith("alignas("):
-            continue
-        declared = _DECLARED_SIZE.search(before)
-        if declared and declared.group(1) not in _NOT_TYPES:
             continue
         found.append(("constant", match.start(), match.end(),
                       ("int", match.group(1), match.group(2))))
