@@ -1,5 +1,6 @@
-// Routines that call the engine's services, against the stand-ins: number
-// text, collation names, day and month names.
+// Routines that call the engine's services: number text, collation names,
+// day and month names and VEBLOB_CP, against the stand-ins and against fake
+// services that fail where a test says.
 #include <gtest/gtest.h>
 
 #include <bit>
@@ -11,6 +12,7 @@
 #include <string>
 
 #include "catalogue/catalogue.hpp"
+#include "fakes/fakes.h"
 #include "support/frame_call.hpp"
 #include "support/platform.hpp"
 
@@ -94,13 +96,15 @@ TEST(CollationName, NamesKnownIdentifiersAndGivesInvalidOtherwise) {
 
 // ---- DAYNAME and MONTHNAME ------------------------------------------------
 
+// A name of the date `date`, with the block `dbinfo`.
+Outcome name(const char *routine, const char *date, void *dbinfo) {
+  return call(routine, {text(date)}, textArea(102), {dbinfo});
+}
+
 class Names : public ::testing::Test {
  protected:
   void SetUp() override { orv::test::setEnvironment("ORVENGINE_LOCALE", "en_US"); }
   void TearDown() override { orv::test::unsetEnvironment("ORVENGINE_LOCALE"); }
-  static Outcome name(const char *routine, const char *date, void *dbinfo) {
-    return call(routine, {text(date)}, textArea(102), {dbinfo});
-  }
   DatabaseInfo utf8{1208};
 };
 
@@ -240,6 +244,110 @@ TEST(VeblobCopy, GivesASeveralByteCodePageTwiceTheRoom) {
   const std::string big = record(0xCB, std::string(400000, 'a'));
   EXPECT_EQ(copy(big, 954, 1208), copied(big));
   EXPECT_EQ(copy(big, 954, 1208, 0, kSmall), refused("38601"));
+}
+
+// ---- Against the fake services -------------------------------------------
+
+// A copy of the library linked to fake services (tests/fakes), for what
+// the routines hand each service and what they do when it fails.
+class Fakes : public ::testing::Test {
+ protected:
+  void SetUp() override {
+    fakes = orvFreshFakes();
+    ASSERT_NE(fakes, nullptr) << loaderError();
+  }
+  LibraryInUse use{ORV_FAKES_LIBRARY_PATH};
+  OrvFakes *fakes = nullptr;
+};
+
+TEST_F(Fakes, NamesFillOneFieldOfTheTimeRecord) {
+  DatabaseInfo utf8(1208);
+  const CLI_nlsTimeRecord zero{};
+  EXPECT_EQ(name("CLI_udfMONTHNAME1", "2001-12-01", utf8.block), ok("Sunday"));
+  CLI_nlsTimeRecord want = zero;
+  want.month = 11;
+  EXPECT_EQ(std::memcmp(&fakes->lastTime, &want, sizeof want), 0);
+  EXPECT_EQ(fakes->lastNameSize, 101u);
+  name("CLI_udfDAYNAME2", "2001-01-06", utf8.block);
+  want = zero;
+  want.dayOfWeek = 6;
+  EXPECT_EQ(std::memcmp(&fakes->lastTime, &want, sizeof want), 0);
+  EXPECT_EQ(fakes->convertCalls, 0);  // the name was in the database's code page
+}
+
+TEST_F(Fakes, NamesFailWithTheNameServiceAndTheConversion) {
+  DatabaseInfo utf8(1208), wide(70000);
+  fakes->nameLength = 0;
+  EXPECT_EQ(name("CLI_udfDAYNAME1", "2001-01-07", utf8.block), fails("03"));
+  fakes->nameLength = 102;  // more than the buffer holds
+  EXPECT_EQ(name("CLI_udfDAYNAME1", "2001-01-07", utf8.block), fails("03"));
+  fakes->nameLength = 101;
+  std::memset(fakes->name, 'n', 101);
+  EXPECT_EQ(name("CLI_udfDAYNAME1", "2001-01-07", utf8.block), ok(std::string(101, 'n')));
+  // A code page above 65535 never equals the name's: the name is converted.
+  fakes->nameLength = 6;
+  std::memcpy(fakes->name, "Sunday", 6);
+  EXPECT_EQ(name("CLI_udfDAYNAME1", "2001-01-07", wide.block), ok("Sunday"));
+  const CLI_conversionRecord &r = fakes->lastRecord;
+  EXPECT_EQ(r.space, 101u);
+  EXPECT_TRUE(r.fixed20 == 0 && r.fixed24 == 0 && r.fixed25 == 0 && r.fixed26 == 1 &&
+              r.fixed27 == 1 && r.fixed28 == 1 && r.fixed29 == 0 && r.fixed30 == 0xFFFF);
+  EXPECT_EQ(fakes->lastSourceCodePage, 1208u);
+  EXPECT_EQ(fakes->lastTargetCodePage, 70000u);
+  // Any status but 0 fails, positive ones too; what was written stays, terminated.
+  fakes->convertStatus = 5;
+  fakes->convertBytes = 3;
+  EXPECT_EQ(name("CLI_udfDAYNAME1", "2001-01-07", wide.block), failsLeaving("03", "Sun"));
+}
+
+TEST_F(Fakes, CollationNameTakesTheServicesLength) {
+  const auto named = [&] {
+    return callNullable("CLI_udfCOLLATIONNAME", {fixed(std::string(8, '\x07'))}, textArea(129));
+  };
+  EXPECT_EQ(named(), ok("NAME"));
+  EXPECT_EQ(fakes->lastCollationSize, 129u);
+  for (std::int32_t length : {0, -1, 129}) {
+    fakes->collationLength = length;
+    EXPECT_EQ(named(), ok("INVALID")) << length;
+  }
+  const int calls = fakes->collationCalls;
+  callNullable("CLI_udfCOLLATIONNAME", {nullOf(fixed(std::string(8, '\0')))}, textArea(129));
+  EXPECT_EQ(fakes->collationCalls, calls);
+}
+
+TEST_F(Fakes, NumberTextHandsOverTheTrimmedLengthAndShortensTheRawText) {
+  fakes->a2fValue = 2.5;
+  EXPECT_EQ(call("CLI_udfCHARTODOUBLE", {text("12 \t\n")}, numberArea(Value::Layout::real)),
+            okReal(2.5));
+  EXPECT_EQ(fakes->lastA2fLength, 2u);
+  fakes->a2fStatus = -4;
+  EXPECT_EQ(call("CLI_udfCHARTODOUBLE", {text("12")}, numberArea(Value::Layout::real)),
+            fails("11"));
+  const std::pair<const char *, const char *> raw[] = {
+      {"+1.00000000000000E+000", "1.0E0"},
+      {"-9.87654321098765E-099", "-9.87654321098765E-99"},
+      {"+5.00000000000000E+300", "5.0E300"},
+  };
+  for (const auto &[in, out] : raw) {
+    std::memcpy(fakes->rawText, in, 23);
+    EXPECT_EQ(call("CLI_udfDOUBLETOCHAR", {f64(1.0)}, fixedArea(24)), ok(padded(out))) << in;
+  }
+}
+
+TEST_F(Fakes, VeblobTakesPositiveStatusesAsSuccessAndAsksTheEncodingClass) {
+  fakes->convertStatus = 4;
+  EXPECT_EQ(copy(record(0xCB, "sss"), 819, 1208), copied(record(0xCB, "sss")));
+  EXPECT_EQ(fakes->lastRecord.space, 30u);  // the object's size
+  // UTF-16 to a class-2 code page may not grow (factor 1); to another class
+  // it may double (factor 2): 300000 bytes then pass SMALL's room test or not.
+  const std::string big = record(0xCB, std::string(300000, 's'));
+  fakes->convertStatus = 0;
+  fakes->encodingClass = 2;
+  EXPECT_EQ(copy(big, 1200, 37, 0, kSmall), copied(big));
+  fakes->encodingClass = 1;
+  const int calls = fakes->convertCalls;
+  EXPECT_EQ(copy(big, 1200, 37, 0, kSmall), refused("38601"));
+  EXPECT_EQ(fakes->convertCalls, calls);  // refused before converting
 }
 
 }  // namespace

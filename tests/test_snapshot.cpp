@@ -4,21 +4,20 @@
 
 #include <array>
 #include <chrono>
-#include <condition_variable>
 #include <cstdint>
-#include <cstdlib>
+#include <cstdio>
 #include <cstring>
 #include <filesystem>
 #include <fstream>
-#include <mutex>
+#include <future>
 #include <optional>
 #include <string>
-#include <thread>
 #include <utility>
 #include <vector>
 
 #include "catalogue/catalogue.hpp"
 #include "engine/services.h"
+#include "fakes/fakes.h"
 #include "frame/cliudf.h"
 #include "frame/table_call.hpp"
 #include "snapshot.hpp"
@@ -44,7 +43,6 @@ struct Row {
 class Snapshot : public ::testing::Test {
  protected:
   void SetUp() override {
-    dir = fs::temp_directory_path() / ("orv_snapshot_" + std::to_string(orv::test::processId()));
     fs::create_directories(dir / "tmp");
     orv::test::setEnvironment("ORVENGINE_INSTANCE_PATH", dir.string().c_str());
     orv::test::setEnvironment("ORVENGINE_SNAPSHOT_NAME", "cache");
@@ -108,7 +106,8 @@ class Snapshot : public ::testing::Test {
     std::memset(table->scratchpad(), 0, cli::call::TableCall::kScratchpadSize);
   }
 
-  fs::path dir;
+  fs::path dir =
+      fs::temp_directory_path() / ("orv_snapshot_" + std::to_string(orv::test::processId()));
   std::optional<cli::call::TableCall> table;
 };
 
@@ -133,8 +132,12 @@ TEST_F(Snapshot, DeliversEveryColumnOfEachStatement) {
   }
 }
 
-TEST_F(Snapshot, ReadsSectionsInEveryOrder) {
+// Streams that break their limits end the table; nothing outside the
+// areas is read or written.
+TEST_F(Snapshot, ReadsSectionsInEveryOrderAndEndsOnHostileStreams) {
   const auto st = [](const char *text) { return statement(numbered(1, text)); };
+  std::string lying = element(19, element(554, "1234"));
+  lying[8] = 100;  // an inner element that claims more than its statement holds
   const struct {
     std::string stream;
     std::vector<std::string> want;
@@ -149,41 +152,19 @@ TEST_F(Snapshot, ReadsSectionsInEveryOrder) {
       {section("LONGTEXT") + st("a") + section("S") + st("b"), {"LONGTEXT:a", "S:b"}},
       {section("S1") + st("a") + element(77, "") + st("b"), {"S1:a"}},
       {st("a") + element(19, element(9999, "zz") + element(312, "kept")), {":a", ":kept"}},
+      {element(30, "") + element(321, "NINEBYTES") + element(322, "") + st("a"), {}},
+      {element(30, "") + element(321, "S") + element(322, std::string(265, 'd')) + st("a"), {}},
+      {element(19, element(554, "12345678") + element(540, "1")), {}},  // too short for its column
+      {element(19, element(229, element(300, "1234"))), {}},            // no child 301
+      {element(19, element(554, "1234").substr(0, 6)), {}},             // a header cut short
+      {element(19, element(312, std::string(1048576, 's'))), {}},       // no room for the NUL
+      {st("a").substr(0, st("a").size() - 1), {}},                      // the file ends early
+      {lying, {}},
   };
   for (const auto &c : cases) {
     write(c.stream);
     EXPECT_EQ(texts(), c.want);
   }
-}
-
-// Streams that break their limits end the table; nothing outside the
-// areas is read or written.
-TEST_F(Snapshot, EndsTheTableOnHostileStreams) {
-  const std::string good = statement(numbered(1, "a"));
-  const std::string cases[] = {
-      element(30, "") + element(321, "NINEBYTES") + element(322, "") + good,
-      element(30, "") + element(321, "S") + element(322, std::string(265, 'd')) + good,
-      element(19, element(554, "12345678") + element(540, "1")),  // too short for its column
-      element(19, element(229, element(300, "1234"))),            // no child 301
-      element(19, element(554, "1234").substr(0, 6)),             // a header cut short
-      element(19, element(312, std::string(1048576, 's'))),       // no room for the NUL
-      good.substr(0, good.size() - 1),                            // the file ends early
-  };
-  for (const std::string &stream : cases) {
-    std::string claims = stream;
-    write(claims);
-    EXPECT_EQ(texts().size(), 0u);
-  }
-  // An inner element that claims more than its statement holds.
-  std::string lying = element(19, element(554, "1234"));
-  lying[8] = 100;
-  write(lying);
-  EXPECT_EQ(texts().size(), 0u);
-  // A statement whose size word asks for gigabytes in a file of 16 bytes.
-  std::string huge = element(19, "12345678");
-  huge.replace(0, 4, "\xF0\xFF\xFF\xDD", 4);
-  write(huge);
-  EXPECT_EQ(texts().size(), 0u);
 }
 
 // Elements lie packed at any byte offset: a pair element behind an unknown
@@ -213,42 +194,6 @@ TEST_F(Snapshot, EndsTheTableWhenTheFileCannotBeFound) {
   call(CLI_CALL_CLOSE);
 }
 
-// Should a call wait in the open of the FIFO at `fifo`, writers are let in
-// after a minute, so that the test fails instead of hanging.
-class Watchdog {
- public:
-  explicit Watchdog(std::string fifo)
-      : fifo_(std::move(fifo)), thread_([this] {
-          std::unique_lock<std::mutex> lock(mutex_);
-          auto wait = std::chrono::milliseconds(60000);
-          while (!done_.wait_for(lock, wait, [this] { return finished_; })) {
-            stepped_ = true;
-            orv::test::letAWriterIn(fifo_);
-            wait = std::chrono::milliseconds(100);  // and again for every open behind it
-          }
-        }) {}
-  ~Watchdog() { finish(); }
-  Watchdog(const Watchdog &) = delete;
-  Watchdog &operator=(const Watchdog &) = delete;
-  // True when a call had to be let go.
-  bool finish() {
-    {
-      const std::lock_guard<std::mutex> lock(mutex_);
-      finished_ = true;
-    }
-    done_.notify_one();
-    if (thread_.joinable()) thread_.join();
-    return stepped_;
-  }
-
- private:
-  std::string fifo_;
-  std::mutex mutex_;
-  std::condition_variable done_;
-  bool finished_ = false, stepped_ = false;
-  std::thread thread_;
-};
-
 // The stand-in's file service opens a regular file and nothing else, at
 // once: a FIFO that nobody writes to, a device and a folder are refused, so
 // that the table ends as it does for a missing file.
@@ -273,15 +218,132 @@ TEST_F(Snapshot, OpensOnlyARegularFileAndNeverWaits) {
   fs::remove(file);
   const bool fifo = orv::test::makeFifo(file);
   if (fifo) refused.emplace_back("a FIFO with no writer", file);
-  Watchdog watchdog(file);
-  for (const auto &[what, path] : refused) {
-    EXPECT_NE(open(path.c_str(), 20, 1024, &handle, 0), 0) << what;
+  auto opens = std::async(std::launch::async, [&] {
+    for (const auto &[what, path] : refused) {
+      EXPECT_NE(open(path.c_str(), 20, 1024, &handle, 0), 0) << what;
+    }
+    EXPECT_TRUE(!fifo || texts().empty()) << "the table over a FIFO";
+  });
+  // Should an open wait for a writer, writers are let in after a minute, and
+  // again for every open behind it, so that the test fails instead of hanging.
+  bool waited = false;
+  while (opens.wait_for(std::chrono::milliseconds(waited ? 100 : 60000)) !=
+         std::future_status::ready) {
+    waited = true;
+    orv::test::letAWriterIn(file);
   }
-  if (fifo) {
-    EXPECT_EQ(texts().size(), 0u) << "the table over a FIFO";
-  }
-  EXPECT_FALSE(watchdog.finish()) << "an open waited for a writer";
+  EXPECT_FALSE(waited) << "an open waited for a writer";
   orv::test::closeLibrary(services);
+}
+
+// ---- Against the fake services -------------------------------------------
+
+// The same over a copy of the library linked to fake services (tests/fakes),
+// which fail where a test says and count what they are asked.
+class FakeSnapshot : public Snapshot {
+ protected:
+  void SetUp() override {
+    fakes = orvFreshFakes();
+    ASSERT_NE(fakes, nullptr) << orv::test::loaderError();
+    static_cast<void>(
+        std::snprintf(fakes->instancePath, sizeof fakes->instancePath, "%s", dir.string().c_str()));
+    Snapshot::SetUp();
+  }
+  // Rows until the table ends.
+  int rowCount() { return static_cast<int>(rows(200000).size()); }
+  orv::test::LibraryInUse use{ORV_FAKES_LIBRARY_PATH};
+  OrvFakes *fakes = nullptr;
+};
+
+TEST_F(FakeSnapshot, EndsTheTableOnAFailedReadInEachStepOfTheSectionScan) {
+  // Statement first, so that the scan skips it and goes back to it.
+  const Statement st{{}, "s"};
+  write(element(30, "") + statement(st) + element(321, "T") + element(322, "dd"));
+  ASSERT_EQ(rowCount(), 1);
+  // Reads in order: 30, the statement's header, 321 and its text, 322 and its
+  // data, the statement's header again, the last byte of its data (to see
+  // that the file holds it), then its data.
+  for (int failing = 1; failing <= 9; ++failing) {
+    fakes->reads = 0;
+    fakes->failReadAt = failing;
+    EXPECT_EQ(rowCount(), 0) << "read " << failing;
+  }
+  fakes->failReadAt = 0;
+  fakes->seekFails = 1;
+  EXPECT_EQ(rowCount(), 0);
+}
+
+TEST_F(FakeSnapshot, LogsAFailedAllocationAndKeepsNoBlock) {
+  write(statement({{}, "s"}));
+  fakes->allocationStatus = 7;
+  zeroScratchpad();
+  call(CLI_CALL_OPEN);
+  EXPECT_EQ(call(CLI_CALL_FETCH).second, "02000");
+  EXPECT_EQ(fakes->logCalls, 1);
+  EXPECT_STREQ(fakes->logMessage, "SQLCACHE_SNAPSHOT: unable to allocate temporary sqlcache stmt");
+  EXPECT_EQ(fakes->logStatus, 7);
+  call(CLI_CALL_CLOSE);
+  EXPECT_EQ(fakes->frees, 0);
+  EXPECT_EQ(fakes->closes, 1);
+}
+
+// A statement that claims more than the rest of the file is refused before
+// a block is asked for, and logged as a block that can't be had; the block
+// of the statements before it goes back as it does before any new block.
+TEST_F(FakeSnapshot, RefusesAStatementLargerThanTheFileAndLogsIt) {
+  std::string huge = element(19, "12345678");
+  huge.replace(0, 4, "\xF0\xFF\xFF\xDD", 4);  // 3.7 GB in a file of a few bytes
+  write(statement({{}, "s"}) + huge);
+  zeroScratchpad();
+  call(CLI_CALL_OPEN);
+  EXPECT_EQ(call(CLI_CALL_FETCH).second, "");
+  EXPECT_EQ(call(CLI_CALL_FETCH).second, "02000");
+  EXPECT_EQ(fakes->logCalls, 1);
+  EXPECT_STREQ(fakes->logMessage, "SQLCACHE_SNAPSHOT: unable to allocate temporary sqlcache stmt");
+  EXPECT_EQ(fakes->logStatus, -1);
+  EXPECT_EQ(fakes->allocations, 1);
+  EXPECT_EQ(fakes->frees, 1);
+  call(CLI_CALL_CLOSE);
+  EXPECT_EQ(fakes->frees, 1);
+  EXPECT_EQ(fakes->closes, 1);
+}
+
+// The static data is asked for once on every entry, open included.
+TEST_F(FakeSnapshot, AsksForTheStaticDataOncePerCall) {
+  write(statement({{}, "s"}));
+  zeroScratchpad();
+  for (const std::int32_t type : {CLI_CALL_OPEN, CLI_CALL_FETCH, CLI_CALL_FETCH, CLI_CALL_CLOSE}) {
+    fakes->staticDataCalls = 0;
+    call(type);
+    EXPECT_EQ(fakes->staticDataCalls, 1) << "call type " << type;
+  }
+}
+
+TEST_F(FakeSnapshot, NeedsNoInstancePathOrFileToCloseCleanly) {
+  fakes->instanceStatus = 3;
+  zeroScratchpad();
+  EXPECT_EQ(call(CLI_CALL_OPEN).second, "02000");
+  EXPECT_EQ(call(CLI_CALL_FETCH).second, "02000");
+  call(CLI_CALL_CLOSE);
+  EXPECT_EQ(fakes->opens + fakes->closes, 0);
+}
+
+// One block serves a whole scan: it is replaced only by a larger one.
+TEST_F(FakeSnapshot, AllocatesOnlyForNewLargestStatements) {
+  std::string stream;
+  int largest = 0, expected = 0;
+  for (int i = 0; i < 100000; ++i) {
+    const int size = (i * 7919) % 97;
+    if (size > largest || i == 0) {
+      largest = size;
+      ++expected;
+    }
+    stream += statement({{}, std::string(static_cast<std::size_t>(size), 'q')});
+  }
+  write(stream);
+  EXPECT_EQ(rowCount(), 100000);
+  EXPECT_EQ(fakes->allocations, expected);
+  EXPECT_EQ(fakes->frees, expected);
 }
 
 }  // namespace

@@ -29,7 +29,6 @@ struct StaticData {
 StaticData chain;
 
 uint8_t name(const CLI_nlsTimeRecord *time, uint32_t size, unsigned char *out, uint16_t *codePage) {
-  ++fakes.nameCalls;
   fakes.lastTime = *time;
   fakes.lastNameSize = size;
   std::memcpy(out, fakes.name, std::min<std::size_t>(fakes.nameLength, size));
@@ -61,7 +60,6 @@ int32_t sqlocpcv(const unsigned char **source, uint32_t length, uint32_t from, u
   fakes.lastRecord = *record;
   fakes.lastSourceCodePage = from;
   fakes.lastTargetCodePage = to;
-  fakes.lastLength = length;
   uint32_t n = fakes.convertBytes < 0 ? length : static_cast<uint32_t>(fakes.convertBytes);
   n = std::min(n, record->space);
   std::memcpy(record->target, *source, std::min(n, length));

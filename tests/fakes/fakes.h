@@ -21,7 +21,6 @@ typedef struct OrvFakes {
   uint8_t nameLength;
   unsigned char name[256];
   uint16_t nameCodePage;
-  int nameCalls;
   CLI_nlsTimeRecord lastTime;
   uint32_t lastNameSize;
 
@@ -31,7 +30,7 @@ typedef struct OrvFakes {
   int32_t convertBytes;
   int convertCalls;
   CLI_conversionRecord lastRecord; /* as it was handed in */
-  uint32_t lastSourceCodePage, lastTargetCodePage, lastLength;
+  uint32_t lastSourceCodePage, lastTargetCodePage;
 
   int32_t encodingClass; /* sqlnls_Encoding2 */
 
@@ -70,4 +69,18 @@ CLI_SERVICE_API void orv_fakes_reset(void);
 #endif
 
 /* NOLINTEND(modernize-deprecated-headers, modernize-use-using) */
+
+#if defined(__cplusplus) && defined(ORV_FAKE_SERVICES_PATH)
+#include "support/platform.hpp"
+
+// For the tests: the control block, reset; null when the fake services
+// can't be loaded.  It is the fake services' own, found in their file, not
+// in the library linked to them.
+inline OrvFakes *orvFreshFakes() {
+  void *services = orv::test::openLibrary(ORV_FAKE_SERVICES_PATH);
+  if (services == nullptr) return nullptr;
+  reinterpret_cast<void (*)()>(orv::test::findExport(services, "orv_fakes_reset"))();
+  return reinterpret_cast<OrvFakes *(*)()>(orv::test::findExport(services, "orv_fakes"))();
+}
+#endif
 #endif

@@ -16,7 +16,7 @@
 #include <cstdlib>
 #endif
 
-#include <cstring>
+#include <algorithm>
 
 namespace orv::test {
 
@@ -116,7 +116,7 @@ BytesBeforeAGuardPage::~BytesBeforeAGuardPage() { ::munmap(pages_, 2 * page_); }
 
 const char *BytesBeforeAGuardPage::place(const std::string &bytes) {
   unsigned char *at = pages_ + page_ - bytes.size();
-  std::memcpy(at, bytes.data(), bytes.size());
+  std::copy(bytes.begin(), bytes.end(), at);
   return reinterpret_cast<const char *>(at);
 }
 

@@ -4,14 +4,13 @@
 // process id, and the raw file calls of the fake services.
 #pragma once
 
+#include <fcntl.h>
+
 #include <cstdint>
 #include <string>
-
 #if defined(_WIN32)
-#include <fcntl.h>
 #include <io.h>
 #else
-#include <fcntl.h>
 #include <unistd.h>
 #endif
 
@@ -66,40 +65,26 @@ class BytesBeforeAGuardPage {
   std::size_t page_;
 };
 
-// A file descriptor opened for binary reading, or -1.  Header-only, for the
-// fake services, which link nothing of the tests.
-inline int openForReading(const char *path) {
+// The raw file calls of the fake services, header-only since they link
+// nothing of the tests: open for binary reading (-1 on failure), read
+// exactly `count` bytes, move the position by `offset` from where it is,
+// close.
 #if defined(_WIN32)
-  return ::_open(path, _O_RDONLY | _O_BINARY);
-#else
-  return ::open(path, O_RDONLY | O_CLOEXEC);
-#endif
-}
-
-// True when exactly `count` bytes were read.
+inline int openForReading(const char *path) { return ::_open(path, _O_RDONLY | _O_BINARY); }
 inline bool readExactly(int fd, void *out, std::uint32_t count) {
-#if defined(_WIN32)
   return ::_read(fd, out, count) == static_cast<int>(count);
+}
+inline bool seekBy(int fd, std::int64_t offset) { return ::_lseeki64(fd, offset, SEEK_CUR) >= 0; }
+inline int closeFile(int fd) { return ::_close(fd); }
 #else
+inline int openForReading(const char *path) { return ::open(path, O_RDONLY | O_CLOEXEC); }
+inline bool readExactly(int fd, void *out, std::uint32_t count) {
   return ::read(fd, out, count) == static_cast<ssize_t>(count);
-#endif
 }
-
-// Moves the position by `offset` from where it is; false on failure.
 inline bool seekBy(int fd, std::int64_t offset) {
-#if defined(_WIN32)
-  return ::_lseeki64(fd, offset, SEEK_CUR) >= 0;
-#else
   return ::lseek(fd, static_cast<off_t>(offset), SEEK_CUR) >= 0;
-#endif
 }
-
-inline int closeFile(int fd) {
-#if defined(_WIN32)
-  return ::_close(fd);
-#else
-  return ::close(fd);
+inline int closeFile(int fd) { return ::close(fd); }
 #endif
-}
 
 }  // namespace orv::test
