@@ -18,28 +18,23 @@ def connect(path):
 def main(path):
     db = connect(path)
     checks = [
-        ("SELECT sysfun_repeat('ab', 3), JULIAN_DAY('2001-09-27')", ("ababab", 2452180)),
-        ("SELECT length(REPEAT('a', 100000))", (100000,)),
-        ("SELECT sysfun_left(?, 5) || '|'", ("abc  |",), ("abc",)),
-        ("SELECT DAYOFWEEK(?), WEEK_ISO(?)", (3, 48), ("2026-11-24", "2026-11-24")),
-        ("SELECT sysfun_lcase(?)", (b"abc",), (b"ABC",)),
+        ("SELECT sysfun_left(?, 5) || '|', JULIAN_DAY(?)", ("abc  |", 2452180),
+         ("abc", "2001-09-27")),
+        ("SELECT sysfun_lcase(?), length(REPEAT('a', 100000))", (b"abc", 100000), (b"ABC",)),
         ("SELECT count(*) > 0 FROM sysfun_functions", (1,)),
     ]
-    failures = 0
+    problems = []
     for sql, expected, *params in checks:
         got = db.execute(sql, *params).fetchone()
         if got != expected:
-            print(f"{sql}: got {got!r}, expected {expected!r}", file=sys.stderr)
-            failures += 1
+            problems.append(f"{sql}: got {got!r}, expected {expected!r}")
     # A SYSFUN error reaches Python as sqlite3.OperationalError with its words.
     try:
         db.execute("SELECT JULIAN_DAY('2001-02-29')").fetchone()
-        print("JULIAN_DAY('2001-02-29') did not fail", file=sys.stderr)
-        failures += 1
+        problems.append("JULIAN_DAY('2001-02-29') did not fail")
     except sqlite3.OperationalError as error:
         if "SYSFUN:04" not in str(error):
-            print(f"unexpected error: {error}", file=sys.stderr)
-            failures += 1
+            problems.append(f"unexpected error: {error}")
     # Python's own functions and ours in one query, over a table.
     db.execute("CREATE TABLE sales (sold_on TEXT, amount REAL)")
     db.executemany("INSERT INTO sales VALUES (?, ?)",
@@ -48,8 +43,7 @@ def main(path):
     got = db.execute("SELECT QUARTER(sold_on), sum(halve(amount)) FROM sales "
                      "GROUP BY 1 ORDER BY 1").fetchall()
     if got != [(1, 30.0), (2, 75.0), (3, 120.0), (4, 165.0)]:
-        print(f"quarters: {got!r}", file=sys.stderr)
-        failures += 1
+        problems.append(f"quarters: {got!r}")
     # One connection per thread, each loading the extension.
     results = []
 
@@ -62,9 +56,10 @@ def main(path):
     for t in threads:
         t.join()
     if results != [("R163",)] * 4:
-        print(f"threads: {results!r}", file=sys.stderr)
-        failures += 1
-    return 1 if failures else 0
+        problems.append(f"threads: {results!r}")
+    for problem in problems:
+        print(problem, file=sys.stderr)
+    return 1 if problems else 0
 
 
 if __name__ == "__main__":
