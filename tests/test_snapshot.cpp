@@ -83,8 +83,7 @@ class Snapshot : public ::testing::Test {
   // Opens, fetches until the table ends (at most `limit` rows), closes.
   std::vector<Row> rows(std::size_t limit = 100) {
     std::vector<Row> out;
-    zeroScratchpad();
-    EXPECT_EQ(call(CLI_CALL_OPEN).second, "");
+    EXPECT_EQ(openTable(), "");
     for (std::size_t i = 0; i < limit; ++i) {
       auto [row, state] = call(CLI_CALL_FETCH);
       if (state == "02000") break;
@@ -101,9 +100,10 @@ class Snapshot : public ::testing::Test {
     return out;
   }
 
-  // A fresh scratchpad, as the engine gives before an open.
-  void zeroScratchpad() {
+  // An open on a fresh scratchpad, as the engine gives; its SQLSTATE.
+  std::string openTable() {
     std::memset(table->scratchpad(), 0, cli::call::TableCall::kScratchpadSize);
+    return call(CLI_CALL_OPEN).second;
   }
 
   fs::path dir =
@@ -187,11 +187,6 @@ TEST_F(Snapshot, EndsTheTableWhenTheFileCannotBeFound) {
   EXPECT_EQ(texts().size(), 0u);
   orv::test::setEnvironment("ORVENGINE_SNAPSHOT_NAME", "missing");
   EXPECT_EQ(texts().size(), 0u);
-  orv::test::unsetEnvironment("ORVENGINE_INSTANCE_PATH");
-  zeroScratchpad();
-  EXPECT_EQ(call(CLI_CALL_OPEN).second, "02000");
-  EXPECT_EQ(call(CLI_CALL_FETCH).second, "02000");
-  call(CLI_CALL_CLOSE);
 }
 
 // The stand-in's file service opens a regular file and nothing else, at
@@ -243,11 +238,16 @@ TEST_F(Snapshot, OpensOnlyARegularFileAndNeverWaits) {
 class FakeSnapshot : public Snapshot {
  protected:
   void SetUp() override {
-    fakes = orvFreshFakes();
+    resetFakes();
     ASSERT_NE(fakes, nullptr) << orv::test::loaderError();
+    Snapshot::SetUp();
+  }
+  // Services that succeed, with the instance path of the test's folder.
+  void resetFakes() {
+    fakes = orvFreshFakes();
+    if (fakes == nullptr) return;
     static_cast<void>(
         std::snprintf(fakes->instancePath, sizeof fakes->instancePath, "%s", dir.string().c_str()));
-    Snapshot::SetUp();
   }
   // Rows until the table ends.
   int rowCount() { return static_cast<int>(rows(200000).size()); }
@@ -273,45 +273,41 @@ TEST_F(FakeSnapshot, EndsTheTableOnAFailedReadInEachStepOfTheSectionScan) {
   EXPECT_EQ(rowCount(), 0);
 }
 
-TEST_F(FakeSnapshot, LogsAFailedAllocationAndKeepsNoBlock) {
-  write(statement({{}, "s"}));
-  fakes->allocationStatus = 7;
-  zeroScratchpad();
-  call(CLI_CALL_OPEN);
-  EXPECT_EQ(call(CLI_CALL_FETCH).second, "02000");
-  EXPECT_EQ(fakes->logCalls, 1);
-  EXPECT_STREQ(fakes->logMessage, "SQLCACHE_SNAPSHOT: unable to allocate temporary sqlcache stmt");
-  EXPECT_EQ(fakes->logStatus, 7);
-  call(CLI_CALL_CLOSE);
-  EXPECT_EQ(fakes->frees, 0);
-  EXPECT_EQ(fakes->closes, 1);
-}
-
-// A statement that claims more than the rest of the file is refused before
-// a block is asked for, and logged as a block that can't be had; the block
-// of the statements before it goes back as it does before any new block.
-TEST_F(FakeSnapshot, RefusesAStatementLargerThanTheFileAndLogsIt) {
+// A block that can't be had is logged and ends the table: one that the
+// service fails to give, or one for a statement that claims more than the
+// rest of the file, refused before it is asked for.  The block of the
+// statements before goes back as it does before any new block.
+TEST_F(FakeSnapshot, LogsABlockThatCannotBeHadAndKeepsNone) {
   std::string huge = element(19, "12345678");
   huge.replace(0, 4, "\xF0\xFF\xFF\xDD", 4);  // 3.7 GB in a file of a few bytes
-  write(statement({{}, "s"}) + huge);
-  zeroScratchpad();
-  call(CLI_CALL_OPEN);
-  EXPECT_EQ(call(CLI_CALL_FETCH).second, "");
-  EXPECT_EQ(call(CLI_CALL_FETCH).second, "02000");
-  EXPECT_EQ(fakes->logCalls, 1);
-  EXPECT_STREQ(fakes->logMessage, "SQLCACHE_SNAPSHOT: unable to allocate temporary sqlcache stmt");
-  EXPECT_EQ(fakes->logStatus, -1);
-  EXPECT_EQ(fakes->allocations, 1);
-  EXPECT_EQ(fakes->frees, 1);
-  call(CLI_CALL_CLOSE);
-  EXPECT_EQ(fakes->frees, 1);
-  EXPECT_EQ(fakes->closes, 1);
+  const struct {
+    std::string stream;
+    std::int32_t failure, logged;
+    int blocks;  // and rows before the end
+  } cases[] = {{statement({{}, "s"}), 7, 7, 0}, {statement({{}, "s"}) + huge, 0, -1, 1}};
+  for (const auto &c : cases) {
+    resetFakes();
+    fakes->allocationStatus = c.failure;
+    write(c.stream);
+    openTable();
+    for (int i = 0; i < c.blocks; ++i) EXPECT_EQ(call(CLI_CALL_FETCH).second, "");
+    EXPECT_EQ(call(CLI_CALL_FETCH).second, "02000");
+    EXPECT_EQ(fakes->logCalls, 1);
+    EXPECT_STREQ(fakes->logMessage,
+                 "SQLCACHE_SNAPSHOT: unable to allocate temporary sqlcache stmt");
+    EXPECT_EQ(fakes->logStatus, c.logged);
+    EXPECT_EQ(fakes->allocations, c.blocks);
+    EXPECT_EQ(fakes->frees, c.blocks);
+    call(CLI_CALL_CLOSE);
+    EXPECT_EQ(fakes->frees, c.blocks);
+    EXPECT_EQ(fakes->closes, 1);
+  }
 }
 
 // The static data is asked for once on every entry, open included.
 TEST_F(FakeSnapshot, AsksForTheStaticDataOncePerCall) {
   write(statement({{}, "s"}));
-  zeroScratchpad();
+  std::memset(table->scratchpad(), 0, cli::call::TableCall::kScratchpadSize);
   for (const std::int32_t type : {CLI_CALL_OPEN, CLI_CALL_FETCH, CLI_CALL_FETCH, CLI_CALL_CLOSE}) {
     fakes->staticDataCalls = 0;
     call(type);
@@ -321,8 +317,7 @@ TEST_F(FakeSnapshot, AsksForTheStaticDataOncePerCall) {
 
 TEST_F(FakeSnapshot, NeedsNoInstancePathOrFileToCloseCleanly) {
   fakes->instanceStatus = 3;
-  zeroScratchpad();
-  EXPECT_EQ(call(CLI_CALL_OPEN).second, "02000");
+  EXPECT_EQ(openTable(), "02000");
   EXPECT_EQ(call(CLI_CALL_FETCH).second, "02000");
   call(CLI_CALL_CLOSE);
   EXPECT_EQ(fakes->opens + fakes->closes, 0);
