@@ -48,26 +48,20 @@ Oracle oracle(sys_days day) {
 }
 
 // Writes the date as text: full width, or month and day without leading
-// zeros, optionally with a time of day behind it.
-std::size_t spell(char *out, const year_month_day &ymd, bool shortFields, const char *time) {
-  const auto two = [&](std::size_t at, unsigned v) {
-    if (shortFields && v < 10) {
-      out[at] = static_cast<char>('0' + v);
-      return at + 1;
-    }
-    out[at] = static_cast<char>('0' + v / 10);
-    out[at + 1] = static_cast<char>('0' + v % 10);
-    return at + 2;
+// zeros, with a time of day (or anything else) behind it.
+void spell(char *out, const year_month_day &ymd, bool shortFields, const char *time) {
+  const auto two = [&](unsigned v, bool full) {
+    if (full || v >= 10) *out++ = static_cast<char>('0' + v / 10);
+    *out++ = static_cast<char>('0' + v % 10);
   };
   const auto y = static_cast<unsigned>(static_cast<int>(ymd.year()));
-  for (int i = 3, v = static_cast<int>(y); i >= 0; --i, v /= 10)
-    out[i] = static_cast<char>('0' + v % 10);
-  out[4] = '-';
-  std::size_t at = two(5, static_cast<unsigned>(ymd.month()));
-  out[at++] = '-';
-  at = two(at, static_cast<unsigned>(ymd.day()));
-  std::memcpy(out + at, time, std::strlen(time) + 1);
-  return at;
+  two(y / 100, true);
+  two(y % 100, true);
+  *out++ = '-';
+  two(static_cast<unsigned>(ymd.month()), !shortFields);
+  *out++ = '-';
+  two(static_cast<unsigned>(ymd.day()), !shortFields);
+  std::memcpy(out, time, std::strlen(time) + 1);
 }
 
 TEST(DateNumbers, AgreeWithChronoOnEveryDateOfTheCalendar) {
