@@ -148,6 +148,48 @@ TEST_F(SqliteHost, AnswersQueries) {
       {"SELECT COLLATIONNAME(zeroblob(8)) || COLLATIONNAME(NULL) || COLLATIONNAME(x'FF')",
        "error: COLLATIONNAME: argument 1 (collation id) must be exactly 8 bytes"},
       {"SELECT COLLATIONNAME(zeroblob(8)) || COLLATIONNAME(NULL)", "IDENTITYINVALID"},
+      // FmpRows lists the catalogue: every routine with its property bits,
+      // among them the three that handle NULL themselves.  Table functions
+      // are table-valued functions, whose hidden selector is checked as a
+      // scalar argument is.
+      {"SELECT count(*) || '/' || sum(column6 & 4 != 0) FROM fmprows", "104/3"},
+      {"SELECT column2 FROM fmprows WHERE column1 = 0", "8"},  // SPACE: 8 arguments
+      {"SELECT count(*) > 0 FROM fmpthreads(0)", "1"},
+      {"SELECT count(*) FROM fmpthreads(-5)", "0"},
+      {"SELECT count(*) FROM fmpthreads WHERE selector = NULL", "0"},
+      {"SELECT count(*) > 0 FROM fmpthreads(0.0)", "1"},
+      {"SELECT count(*) FROM fmpthreads(4294967296)",
+       "error: FmpThreads: argument 1 (selector) is 4294967296, outside the 32-bit range"},
+      {"SELECT count(*) FROM fmpthreads(-1.5)",
+       "error: FmpThreads: argument 1 (selector) is -1.5, not a whole number in the 32-bit range"},
+      {"SELECT count(*) FROM fmpthreads('x')",
+       "error: FmpThreads: argument 1 (selector) is not a number"},
+      // The version, and what each name reaches.
+      {"SELECT sysfun_version() NOT GLOB '*[^0-9.]*' AND sysfun_version() GLOB '[0-9]*'", "1"},
+      {"SELECT exports || ' / ' || arguments || ' / ' || sysfun_codes || ' / ' || plain_name "
+       "FROM sysfun_functions WHERE name = 'sysfun_left'",
+       "CLI_udfLEFT1, CLI_udfLEFT2 / string: text | CLI_udfLob, n: 32-bit integer / 01 / left"},
+      {"SELECT exports FROM sysfun_functions WHERE name = 'sysfun_julian_day1'",
+       "CLI_udfJULIAN_DAY1"},
+      // Every row names a function that SQLite has with that argument count,
+      // under both names where a plain name is given, and every registered
+      // sysfun_ function has its row.
+      {"SELECT count(*) FROM sysfun_functions f WHERE NOT EXISTS (SELECT 1 FROM "
+       "pragma_function_list p WHERE p.name = f.name AND p.narg = f.argument_count) "
+       "OR (f.plain_name IS NOT NULL AND NOT EXISTS (SELECT 1 FROM pragma_function_list "
+       "p WHERE p.name = f.plain_name AND p.narg = f.argument_count))",
+       "0"},
+      {"SELECT count(*) FROM pragma_function_list p WHERE substr(p.name, 1, 7) = "
+       "'sysfun_' AND p.name <> 'sysfun_version' AND NOT EXISTS (SELECT 1 FROM "
+       "sysfun_functions f WHERE f.name = p.name AND f.argument_count = p.narg)",
+       "0"},
+      // Deterministic and innocuous, and no built-in function hidden.
+      {"SELECT count(*) FROM pragma_function_list WHERE name IN ('sysfun_space', 'lcase', "
+       "'sysfun_ascii3') AND flags & 0x200800 = 0x200800",
+       "3"},
+      {"SELECT count(*) FROM pragma_function_list WHERE name IN ('rtrim', 'ltrim', 'char') "
+       "AND builtin = 0",
+       "0"},
   };
   for (const Case &c : cases) EXPECT_EQ(eval(c.sql), c.expected) << c.sql;
 }
@@ -169,8 +211,8 @@ TEST_F(SqliteHost, SeedsRandOncePerStatement) {
   EXPECT_NE(first.substr(0, space), first.substr(space + 1, space));
 }
 
-// Table functions are table-valued functions: one row per fetch.
-TEST_F(SqliteHost, ReadsTheSnapshotAndTheFmpTablesAsTables) {
+// The snapshot is read where the instance path says, one row per fetch.
+TEST_F(SqliteHost, ReadsTheSnapshotAsATable) {
   namespace fs = std::filesystem;
   const fs::path dir = fs::temp_directory_path() / ("orv_host_" + std::to_string(::getpid()));
   fs::create_directories(dir / "tmp");
@@ -187,56 +229,6 @@ TEST_F(SqliteHost, ReadsTheSnapshotAndTheFmpTablesAsTables) {
   unsetenv("ORVENGINE_INSTANCE_PATH");
   EXPECT_EQ(eval("SELECT count(*) FROM sysfun_sqlcache_snapshot"), "0");
   fs::remove_all(dir);
-  // FmpRows lists the catalogue: every routine with its property bits,
-  // among them the three that handle NULL themselves.
-  EXPECT_EQ(eval("SELECT count(*) || '/' || sum(column6 & 4 != 0) FROM fmprows"), "104/3");
-  EXPECT_EQ(eval("SELECT column2 FROM fmprows WHERE column1 = 0"), "8");  // SPACE: 8 arguments
-  EXPECT_EQ(eval("SELECT count(*) > 0 FROM fmpthreads(0)"), "1");
-  EXPECT_EQ(eval("SELECT count(*) FROM fmpthreads(-5)"), "0");
-  // The hidden selector is checked as a scalar argument is.
-  const Case selectors[] = {
-      {"SELECT count(*) FROM fmpthreads WHERE selector = NULL", "0"},
-      {"SELECT count(*) > 0 FROM fmpthreads(0.0)", "1"},
-      {"SELECT count(*) FROM fmpthreads(4294967296)",
-       "error: FmpThreads: argument 1 (selector) is 4294967296, outside the 32-bit range"},
-      {"SELECT count(*) FROM fmpthreads(-1.5)",
-       "error: FmpThreads: argument 1 (selector) is -1.5, not a whole number in the 32-bit range"},
-      {"SELECT count(*) FROM fmpthreads('x')",
-       "error: FmpThreads: argument 1 (selector) is not a number"},
-  };
-  for (const Case &c : selectors) EXPECT_EQ(eval(c.sql), c.expected) << c.sql;
-}
-
-TEST_F(SqliteHost, TellsItsVersionAndWhatEachNameReaches) {
-  const std::string version = eval("SELECT sysfun_version()");
-  EXPECT_EQ(version.find_first_not_of("0123456789."), std::string::npos) << version;
-  EXPECT_EQ(
-      eval("SELECT exports || ' / ' || arguments || ' / ' || sysfun_codes || ' / ' || "
-           "plain_name FROM sysfun_functions WHERE name = 'sysfun_left'"),
-      "CLI_udfLEFT1, CLI_udfLEFT2 / string: text | CLI_udfLob, n: 32-bit integer / 01 / left");
-  EXPECT_EQ(eval("SELECT exports FROM sysfun_functions WHERE name = 'sysfun_julian_day1'"),
-            "CLI_udfJULIAN_DAY1");
-  // Every row names a function that SQLite has with that argument count,
-  // under both names where a plain name is given, and every registered
-  // sysfun_ function has its row.
-  EXPECT_EQ(eval("SELECT count(*) FROM sysfun_functions f WHERE NOT EXISTS (SELECT 1 FROM "
-                 "pragma_function_list p WHERE p.name = f.name AND p.narg = f.argument_count) "
-                 "OR (f.plain_name IS NOT NULL AND NOT EXISTS (SELECT 1 FROM pragma_function_list "
-                 "p WHERE p.name = f.plain_name AND p.narg = f.argument_count))"),
-            "0");
-  EXPECT_EQ(eval("SELECT count(*) FROM pragma_function_list p WHERE substr(p.name, 1, 7) = "
-                 "'sysfun_' AND p.name <> 'sysfun_version' AND NOT EXISTS (SELECT 1 FROM "
-                 "sysfun_functions f WHERE f.name = p.name AND f.argument_count = p.narg)"),
-            "0");
-}
-
-TEST_F(SqliteHost, RegistersDeterministicInnocuousFunctionsWithoutHidingBuiltIns) {
-  EXPECT_EQ(eval("SELECT count(*) FROM pragma_function_list WHERE name IN ('sysfun_space', "
-                 "'lcase', 'sysfun_ascii3') AND flags & 0x200800 = 0x200800"),
-            "3");
-  EXPECT_EQ(eval("SELECT count(*) FROM pragma_function_list WHERE name IN ('rtrim', 'ltrim', "
-                 "'char') AND builtin = 0"),
-            "0");
 }
 
 // Connections load the extension while others run its table functions:
