@@ -1,21 +1,38 @@
-// The Fmp table functions, driven through open, fetch and close with a
-// callback that plays the engine's part.
+// The table functions, driven through open, fetch and close as an engine
+// drives them: the Fmp tables with a callback that plays the engine's part,
+// and SQLCACHE_SNAPSHOT over snapshot files written with the snapshot
+// writer, against the stand-in services and against fake ones.
 #include <gtest/gtest.h>
 
 #include <array>
+#include <chrono>
 #include <cstdint>
+#include <cstdio>
 #include <cstring>
+#include <filesystem>
+#include <fstream>
+#include <future>
+#include <optional>
 #include <string>
+#include <utility>
 #include <vector>
 
 #include "catalogue/catalogue.hpp"
+#include "engine/services.h"
+#include "fakes/fakes.h"
 #include "frame/cliudf.h"
 #include "frame/table_call.hpp"
+#include "snapshot.hpp"
 #include "support/frame_call.hpp"
+#include "support/platform.hpp"
 
 namespace {
 
 using orv::test::exportAddress;
+namespace fs = std::filesystem;
+using namespace orv::snapshot;
+
+// ---- FmpThreads and FmpRows -------------------------------------------------
 
 // The engine's side: its answers to open and close, and what it was asked.
 struct Engine {
@@ -152,6 +169,320 @@ TEST_F(Tables, RowsWidenTheirUnsignedBytes) {
   run(false, CLI_CALL_OPEN);
   EXPECT_EQ(run(false, CLI_CALL_FETCH).row, (std::array<std::int64_t, 6>{1, 2, -1, 4, 255, 128}));
   EXPECT_EQ(run(false, CLI_CALL_FETCH).sqlstate, "02000");
+}
+
+// ---- SQLCACHE_SNAPSHOT ------------------------------------------------------
+
+// What each result indicator holds before a call, to see which of them
+// the routine writes.
+constexpr std::int16_t kUnset = 0x5A5A;
+
+struct Row {
+  std::array<std::int32_t, 16> columns{};
+  std::string text;       // column 17
+  std::string statement;  // column 18
+  std::array<std::int16_t, 18> indicators{};
+};
+
+class Snapshot : public ::testing::Test {
+ protected:
+  void SetUp() override {
+    fs::create_directories(dir / "tmp");
+    orv::test::setEnvironment("ORVENGINE_INSTANCE_PATH", dir.string().c_str());
+    orv::test::setEnvironment("ORVENGINE_SNAPSHOT_NAME", "cache");
+    const cli::catalogue::Routine *routine = cli::catalogue::find("SQLCACHE_SNAPSHOT");
+    ASSERT_NE(routine, nullptr);
+    table.emplace(*routine, orv::test::exportAddress("SQLCACHE_SNAPSHOT"), nullptr, kUnset);
+  }
+  void TearDown() override {
+    fs::remove_all(dir);
+    orv::test::unsetEnvironment("ORVENGINE_INSTANCE_PATH");
+    orv::test::unsetEnvironment("ORVENGINE_SNAPSHOT_NAME");
+  }
+  void write(const std::string &stream) {
+    std::ofstream(dir / "tmp" / "cache.sql", std::ios::binary) << stream;
+  }
+
+  // One call; a fetch's row is returned with the SQLSTATE it stored.  The
+  // number columns hold -7 and column 17 "unset" before it, so that a
+  // column the routine leaves alone shows.
+  std::pair<Row, std::string> call(std::int32_t callType) {
+    cli::call::TableCall &t = *table;
+    for (std::size_t i = 0; i < 16; ++i) {
+      const std::int32_t unset = -7;
+      std::memcpy(t.area(i), &unset, sizeof unset);
+    }
+    std::memset(t.area(16), 0, cli::call::areaSize(t.row().results[16]));
+    std::memcpy(t.area(16), "unset", 5);
+    t.step(callType);
+    Row row;
+    for (std::size_t i = 0; i < 16; ++i) row.columns[i] = static_cast<std::int32_t>(t.number(i));
+    row.text = t.text(16);
+    if (t.indicator(17) == 0) row.statement = t.text(17);
+    for (std::size_t i = 0; i < 18; ++i) row.indicators[i] = t.indicator(i);
+    const char *sqlstate = t.status().sqlstate;
+    return {row, std::string(sqlstate, ::strnlen(sqlstate, sizeof t.status().sqlstate))};
+  }
+
+  // Opens, fetches until the table ends (at most `limit` rows), closes.
+  std::vector<Row> rows(std::size_t limit = 100) {
+    std::vector<Row> out;
+    EXPECT_EQ(openTable(), "");
+    for (std::size_t i = 0; i < limit; ++i) {
+      auto [row, state] = call(CLI_CALL_FETCH);
+      if (state == "02000") break;
+      EXPECT_EQ(state, "");
+      out.push_back(row);
+    }
+    call(CLI_CALL_CLOSE);
+    return out;
+  }
+
+  std::vector<std::string> texts(std::size_t limit = 100) {
+    std::vector<std::string> out;
+    for (const Row &r : rows(limit)) out.push_back(r.text + ":" + r.statement);
+    return out;
+  }
+
+  // An open on a fresh scratchpad, as the engine gives; its SQLSTATE.
+  std::string openTable() {
+    std::memset(table->scratchpad(), 0, cli::call::TableCall::kScratchpadSize);
+    return call(CLI_CALL_OPEN).second;
+  }
+
+  fs::path dir =
+      fs::temp_directory_path() / ("orv_snapshot_" + std::to_string(orv::test::processId()));
+  std::optional<cli::call::TableCall> table;
+};
+
+Statement numbered(std::int32_t base, std::string text) {
+  Statement s;
+  for (std::size_t i = 0; i < 16; ++i) s.columns[i] = base + static_cast<std::int32_t>(i);
+  s.text = std::move(text);
+  return s;
+}
+
+TEST_F(Snapshot, DeliversEveryColumnOfEachStatement) {
+  write(section("PKG1") + statement(numbered(100, "SELECT 1")) +
+        statement(numbered(-200, std::string("x\0y", 3))));
+  const std::vector<Row> got = rows();
+  ASSERT_EQ(got.size(), 2u);
+  EXPECT_EQ(got[0].columns, numbered(100, "").columns);
+  EXPECT_EQ(got[1].columns, numbered(-200, "").columns);
+  EXPECT_EQ(got[1].statement, std::string("x\0y", 3));
+  EXPECT_EQ(got[0].text, "PKG1");
+  for (std::size_t i = 0; i < 18; ++i) {
+    EXPECT_EQ(got[0].indicators[i], i == 16 ? 0x5A5A : 0) << "column " << i + 1;
+  }
+}
+
+// Streams that break their limits end the table; nothing outside the
+// areas is read or written.
+TEST_F(Snapshot, ReadsSectionsInEveryOrderAndEndsOnHostileStreams) {
+  const auto st = [](const char *text) { return statement(numbered(1, text)); };
+  std::string lying = element(19, element(554, "1234"));
+  lying[8] = 100;  // an inner element that claims more than its statement holds
+  const struct {
+    std::string stream;
+    std::vector<std::string> want;
+  } cases[] = {
+      {"", {}},
+      {st("a"), {":a"}},  // no section: column 17 is empty
+      {section("S1") + st("a") + st("b"), {"S1:a", "S1:b"}},
+      // Statements before the section's text and data are read after them.
+      {element(30, "") + st("a") + st("b") + element(321, "S2") + element(322, "dd") + st("c"),
+       {"S2:a", "S2:b"}},
+      {section("S1") + section("S2") + st("a"), {}},
+      {section("LONGTEXT") + st("a") + section("S") + st("b"), {"LONGTEXT:a", "S:b"}},
+      {section("S1") + st("a") + element(77, "") + st("b"), {"S1:a"}},
+      {st("a") + element(19, element(9999, "zz") + element(312, "kept")), {":a", ":kept"}},
+      {element(30, "") + element(321, "NINEBYTES") + element(322, "") + st("a"), {}},
+      {element(30, "") + element(321, "S") + element(322, std::string(265, 'd')) + st("a"), {}},
+      {element(19, element(554, "12345678") + element(540, "1")), {}},  // too short for its column
+      {element(19, element(229, element(300, "1234"))), {}},            // no child 301
+      {element(19, element(554, "1234").substr(0, 6)), {}},             // a header cut short
+      {element(19, element(312, std::string(1048576, 's'))), {}},       // no room for the NUL
+      {st("a").substr(0, st("a").size() - 1), {}},                      // the file ends early
+      {lying, {}},
+  };
+  for (const auto &c : cases) {
+    write(c.stream);
+    EXPECT_EQ(texts(), c.want);
+  }
+}
+
+// Elements lie packed at any byte offset: a pair element behind an unknown
+// one of odd length still gives its two children.
+TEST_F(Snapshot, ReadsPairsAtOddOffsets) {
+  std::string pair =
+      element(300, std::string("\x05\0\0\0", 4)) + element(301, std::string("\x06\0\0\0", 4));
+  write(element(19, element(9999, "odd") + element(229, pair) + element(312, "s")));
+  const std::vector<Row> got = rows();
+  ASSERT_EQ(got.size(), 1u);
+  EXPECT_EQ(got[0].columns[10], 5);
+  EXPECT_EQ(got[0].columns[11], 6);
+  EXPECT_EQ(got[0].statement, "s");
+}
+
+TEST_F(Snapshot, EndsTheTableWhenTheFileCannotBeFound) {
+  write(statement(numbered(1, "a")));
+  orv::test::setEnvironment("ORVENGINE_SNAPSHOT_NAME",
+                            std::string(300, 'n').c_str());  // the path would not fit
+  EXPECT_EQ(texts().size(), 0u);
+  orv::test::setEnvironment("ORVENGINE_SNAPSHOT_NAME", "missing");
+  EXPECT_EQ(texts().size(), 0u);
+}
+
+// The stand-in's file service opens a regular file and nothing else, at
+// once: a FIFO that nobody writes to, a device and a folder are refused, so
+// that the table ends as it does for a missing file.
+TEST_F(Snapshot, OpensOnlyARegularFileAndNeverWaits) {
+  void *services = orv::test::openLibrary(ORV_STANDIN_SYS_PATH);
+  ASSERT_NE(services, nullptr) << orv::test::loaderError();
+  const auto open =
+      reinterpret_cast<decltype(&sqloopenp)>(orv::test::findExport(services, "sqloopenp"));
+  const auto close =
+      reinterpret_cast<decltype(&sqloclose)>(orv::test::findExport(services, "sqloclose"));
+  ASSERT_TRUE(open != nullptr && close != nullptr);
+  const std::string file = (dir / "tmp" / "cache.sql").string();
+  write(statement(numbered(1, "a")));
+  CLI_fileHandle handle{};
+  ASSERT_EQ(open(file.c_str(), 20, 1024, &handle, 0), 0);
+  close(handle);
+
+  std::vector<std::pair<const char *, std::string>> refused = {
+      {"a folder", (dir / "tmp").string()},
+      {"a device", orv::test::aDevice()},
+      {"nothing", (dir / "missing").string()}};
+  fs::remove(file);
+  const bool fifo = orv::test::makeFifo(file);
+  if (fifo) refused.emplace_back("a FIFO with no writer", file);
+  auto opens = std::async(std::launch::async, [&] {
+    for (const auto &[what, path] : refused) {
+      EXPECT_NE(open(path.c_str(), 20, 1024, &handle, 0), 0) << what;
+    }
+    EXPECT_TRUE(!fifo || texts().empty()) << "the table over a FIFO";
+  });
+  // Should an open wait for a writer, writers are let in after a minute, and
+  // again for every open behind it, so that the test fails instead of hanging.
+  bool waited = false;
+  while (opens.wait_for(std::chrono::milliseconds(waited ? 100 : 60000)) !=
+         std::future_status::ready) {
+    waited = true;
+    orv::test::letAWriterIn(file);
+  }
+  EXPECT_FALSE(waited) << "an open waited for a writer";
+  orv::test::closeLibrary(services);
+}
+
+// ---- Against the fake services -------------------------------------------
+
+// The same over a copy of the library linked to fake services (tests/fakes),
+// which fail where a test says and count what they are asked.
+class FakeSnapshot : public Snapshot {
+ protected:
+  void SetUp() override {
+    resetFakes();
+    ASSERT_NE(fakes, nullptr) << orv::test::loaderError();
+    Snapshot::SetUp();
+  }
+  // Services that succeed, with the instance path of the test's folder.
+  void resetFakes() {
+    fakes = orvFreshFakes();
+    if (fakes == nullptr) return;
+    static_cast<void>(
+        std::snprintf(fakes->instancePath, sizeof fakes->instancePath, "%s", dir.string().c_str()));
+  }
+  // Rows until the table ends.
+  int rowCount() { return static_cast<int>(rows(200000).size()); }
+  orv::test::LibraryInUse use{ORV_FAKES_LIBRARY_PATH};
+  OrvFakes *fakes = nullptr;
+};
+
+TEST_F(FakeSnapshot, EndsTheTableOnAFailedReadInEachStepOfTheSectionScan) {
+  // Statement first, so that the scan skips it and goes back to it.
+  const Statement st{{}, "s"};
+  write(element(30, "") + statement(st) + element(321, "T") + element(322, "dd"));
+  ASSERT_EQ(rowCount(), 1);
+  // Reads in order: 30, the statement's header, 321 and its text, 322 and its
+  // data, the statement's header again, the last byte of its data (to see
+  // that the file holds it), then its data.
+  for (int failing = 1; failing <= 9; ++failing) {
+    fakes->reads = 0;
+    fakes->failReadAt = failing;
+    EXPECT_EQ(rowCount(), 0) << "read " << failing;
+  }
+  fakes->failReadAt = 0;
+  fakes->seekFails = 1;
+  EXPECT_EQ(rowCount(), 0);
+}
+
+// A block that can't be had is logged and ends the table: one that the
+// service fails to give, or one for a statement that claims more than the
+// rest of the file, refused before it is asked for.  The block of the
+// statements before goes back as it does before any new block.
+TEST_F(FakeSnapshot, LogsABlockThatCannotBeHadAndKeepsNone) {
+  std::string huge = element(19, "12345678");
+  huge.replace(0, 4, "\xF0\xFF\xFF\xDD", 4);  // 3.7 GB in a file of a few bytes
+  const struct {
+    std::string stream;
+    std::int32_t failure, logged;
+    int blocks;  // and rows before the end
+  } cases[] = {{statement({{}, "s"}), 7, 7, 0}, {statement({{}, "s"}) + huge, 0, -1, 1}};
+  for (const auto &c : cases) {
+    resetFakes();
+    fakes->allocationStatus = c.failure;
+    write(c.stream);
+    openTable();
+    for (int i = 0; i < c.blocks; ++i) EXPECT_EQ(call(CLI_CALL_FETCH).second, "");
+    EXPECT_EQ(call(CLI_CALL_FETCH).second, "02000");
+    EXPECT_EQ(fakes->logCalls, 1);
+    EXPECT_STREQ(fakes->logMessage,
+                 "SQLCACHE_SNAPSHOT: unable to allocate temporary sqlcache stmt");
+    EXPECT_EQ(fakes->logStatus, c.logged);
+    EXPECT_EQ(fakes->allocations, c.blocks);
+    EXPECT_EQ(fakes->frees, c.blocks);
+    call(CLI_CALL_CLOSE);
+    EXPECT_EQ(fakes->frees, c.blocks);
+    EXPECT_EQ(fakes->closes, 1);
+  }
+}
+
+// The static data is asked for once on every entry, open included.
+TEST_F(FakeSnapshot, AsksForTheStaticDataOncePerCall) {
+  write(statement({{}, "s"}));
+  std::memset(table->scratchpad(), 0, cli::call::TableCall::kScratchpadSize);
+  for (const std::int32_t type : {CLI_CALL_OPEN, CLI_CALL_FETCH, CLI_CALL_FETCH, CLI_CALL_CLOSE}) {
+    fakes->staticDataCalls = 0;
+    call(type);
+    EXPECT_EQ(fakes->staticDataCalls, 1) << "call type " << type;
+  }
+}
+
+TEST_F(FakeSnapshot, NeedsNoInstancePathOrFileToCloseCleanly) {
+  fakes->instanceStatus = 3;
+  EXPECT_EQ(openTable(), "02000");
+  EXPECT_EQ(call(CLI_CALL_FETCH).second, "02000");
+  call(CLI_CALL_CLOSE);
+  EXPECT_EQ(fakes->opens + fakes->closes, 0);
+}
+
+// One block serves a whole scan: it is replaced only by a larger one.
+TEST_F(FakeSnapshot, AllocatesOnlyForNewLargestStatements) {
+  std::string stream;
+  int largest = 0, expected = 0;
+  for (int i = 0; i < 100000; ++i) {
+    const int size = (i * 7919) % 97;
+    if (size > largest || i == 0) {
+      largest = size;
+      ++expected;
+    }
+    stream += statement({{}, std::string(static_cast<std::size_t>(size), 'q')});
+  }
+  write(stream);
+  EXPECT_EQ(rowCount(), 100000);
+  EXPECT_EQ(fakes->allocations, expected);
+  EXPECT_EQ(fakes->frees, expected);
 }
 
 }  // namespace

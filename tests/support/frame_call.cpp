@@ -158,16 +158,15 @@ Outcome callFrame(const char *name, const std::vector<Value> &inputs, const Valu
   }
 
   std::vector<Bytes> in;
+  in.reserve(inputs.size());
   std::vector<std::int16_t> indicators(inputs.size() + 1, kIndicator);
   std::array<void *, cat::kMaxInputs> inputAt{};
   std::array<std::int16_t *, cat::kMaxInputs> inputIndicatorAt{};
   for (std::size_t i = 0; i < inputs.size(); ++i) {
     in.push_back(bytesOf(inputs[i]));
+    inputAt[i] = inputs[i].placed != nullptr ? const_cast<void *>(inputs[i].placed) : in[i].data();
     if (nullable) indicators[i] = inputs[i].null ? -1 : 0;
     inputIndicatorAt[i] = &indicators[i];
-  }
-  for (std::size_t i = 0; i < inputs.size(); ++i) {
-    inputAt[i] = inputs[i].placed != nullptr ? const_cast<void *>(inputs[i].placed) : in[i].data();
   }
   const std::vector<std::int16_t> indicatorsBefore = indicators;
 
@@ -183,15 +182,14 @@ Outcome callFrame(const char *name, const std::vector<Value> &inputs, const Valu
 
   void *const resultAt[] = {out.data()};
   std::int16_t *const resultIndicatorAt[] = {&indicators.back()};
-  frame::Frame f;
-  f.inputs = inputAt.data();
-  f.results = resultAt;
-  f.inputIndicators = inputIndicatorAt.data();
-  f.resultIndicators = resultIndicatorAt;
-  f.sqlstate = sqlstate;
-  f.functionName = "FUNCTION";
-  f.specificName = "SPECIFIC";
-  f.message = message;
+  frame::Frame f{.inputs = inputAt.data(),
+                 .results = resultAt,
+                 .inputIndicators = inputIndicatorAt.data(),
+                 .resultIndicators = resultIndicatorAt,
+                 .sqlstate = sqlstate,
+                 .functionName = "FUNCTION",
+                 .specificName = "SPECIFIC",
+                 .message = message};
   placeExtras(*row, extras, f);
   frame::call(*row, fn, f);
 
@@ -206,12 +204,11 @@ Outcome callFrame(const char *name, const std::vector<Value> &inputs, const Valu
     EXPECT_TRUE(sqlstate[5] == 'S' && allAre(message + 8, message + kMessageBytes, 'M')) << name;
     got = fails(std::string(sqlstate, 5) + "/" + std::string(message, 8));
   } else if (sqlstate[0] != 'S') {
+    const std::string code(message, 10);
     EXPECT_EQ(std::string(sqlstate, 6), std::string("38552\0", 6)) << name;
-    EXPECT_EQ(std::string(message, 7), "SYSFUN:") << name;
-    EXPECT_TRUE(std::isdigit(static_cast<unsigned char>(message[7])) &&
-                std::isdigit(static_cast<unsigned char>(message[8])))
-        << name << ": the code is not two digits";
-    EXPECT_EQ(message[9], '\0') << name;
+    EXPECT_TRUE(code.starts_with("SYSFUN:") && std::isdigit(static_cast<unsigned char>(code[7])) &&
+                std::isdigit(static_cast<unsigned char>(code[8])) && code[9] == '\0')
+        << name << ": message " << ::testing::PrintToString(code);
     EXPECT_TRUE(allAre(message + 10, message + kMessageBytes, 'M'))
         << name << " wrote past the message";
     // A failure may leave what the routine stored before its test.

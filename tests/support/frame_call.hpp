@@ -93,12 +93,7 @@ inline Outcome failsLeaving(std::string code, std::string bytes) {
 
 // A success that left the string result area as it was, with this result
 // indicator (callNullable's; 0 for call).
-inline Outcome leftAlone(int indicator = 0) {
-  Outcome o;
-  o.indicator = indicator;
-  o.leftAlone = true;
-  return o;
-}
+inline Outcome leftAlone(int indicator = 0) { return {"", "", 0, false, false, indicator, true}; }
 
 void PrintTo(const Outcome &o, std::ostream *os);
 
