@@ -1,6 +1,6 @@
 // LOCATE, REPLACE and INSERT: every form against naive left-to-right
-// models on small alphabets, where matches and near-matches are frequent,
-// and the limits that random inputs don't reach.
+// models (tests/models/search.hpp) on small alphabets, where matches and
+// near-matches are frequent, and the limits that random inputs don't reach.
 #include <gtest/gtest.h>
 
 #include <cstdint>
@@ -9,6 +9,7 @@
 #include <tuple>
 #include <vector>
 
+#include "models/search.hpp"
 #include "string/search.hpp"
 #include "support/frame_call.hpp"
 #include "support/platform.hpp"
@@ -19,19 +20,17 @@ using namespace orv::test;
 
 Outcome n(std::int64_t v) { return ok(v); }
 
-struct Case {
-  const char *routine;
-  std::vector<Value> in;
-  Value result;
-  Outcome want;
-};
-
 // What the random inputs below don't reach: starts, lengths and results at
 // the limits of each layout, and a search string longer than 4000 bytes.
 TEST(LocateReplaceInsert, KeepTheirLimits) {
   const std::string a3999b = std::string(3999, 'a') + "b";
   // clang-format off
-  const Case cases[] = {
+  const struct {
+    const char *routine;
+    std::vector<Value> in;
+    Value result;
+    Outcome want;
+  } cases[] = {
       {"CLI_udfLOCATE1", {text("b"), text("abcb"), i32(4001)}, intArea(), fails("01")},
       {"CLI_udfLOCATE1", {text("b"), text("abcb"), i32(4000)}, intArea(), n(0)},
       {"CLI_udfLOCATE2", {lob("b"), lob("abcb"), i32(1048577)}, intArea(), fails("01")},
@@ -48,50 +47,18 @@ TEST(LocateReplaceInsert, KeepTheirLimits) {
       {"CLI_udfINSERT2", {lob("abcdef"), i32(0), i32(8), lob("0123456789abcd")}, lobArea(12), fails("10")},
   };
   // clang-format on
-  for (const Case &c : cases) {
-    EXPECT_EQ(call(c.routine, c.in, c.result), c.want) << c.routine;
-  }
+  for (const auto &c : cases) EXPECT_EQ(call(c.routine, c.in, c.result), c.want) << c.routine;
   // Past the limit with nothing written: the length word holds the source's.
-  const Outcome tooLong =
-      call("CLI_udfREPLACE2", {lob(std::string(1048577, 'x')), lob(""), lob("y")}, lobArea());
-  EXPECT_EQ(tooLong.error, "10");
+  EXPECT_EQ(
+      call("CLI_udfREPLACE2", {lob(std::string(1048577, 'x')), lob(""), lob("y")}, lobArea()).error,
+      "10");
 }
 
-// ---- Naive models, as the routines are defined --------------------------
-
-std::int64_t locateModel(const std::string &search, const std::string &in, std::size_t start) {
-  for (std::size_t p = start - 1; p + search.size() <= in.size(); ++p) {
-    if (in.compare(p, search.size(), search) == 0) return static_cast<std::int64_t>(p + 1);
-  }
-  return 0;
-}
-
-std::string replaceModel(const std::string &in, const std::string &search, const std::string &by) {
-  if (search.empty()) return in;
-  std::string out;
-  for (std::size_t p = 0; p < in.size();) {
-    if (in.compare(p, search.size(), search) == 0) {
-      out += by;
-      p += search.size();
-    } else {
-      out += in[p++];
-    }
-  }
-  return out;
-}
-
-// The checks in their order, with s - l + i in the form's 32-bit type.
-Outcome insertModel(bool lobForm, const std::string &in, std::int64_t p, std::int64_t l,
-                    const std::string &add, std::int64_t limit) {
-  const auto s = static_cast<std::int64_t>(in.size()), i = static_cast<std::int64_t>(add.size());
-  const auto wrapped = static_cast<std::uint32_t>(s - l + i);
-  const std::int64_t size = lobForm ? std::int64_t{wrapped} : static_cast<std::int32_t>(wrapped);
-  const std::int64_t trueSize = p - 1 + l > s ? p - 1 + i : s - l + i;
-  if (size > limit || p > s || (l >= 0 && trueSize > limit)) return fails("10");
-  if (p < 1 || (!lobForm && p > limit) || l < 0 || p + l > limit) return fails("01");
-  const auto head = static_cast<std::size_t>(p - 1);
-  const auto tail = static_cast<std::size_t>(std::min(p - 1 + l, s));
-  return ok(in.substr(0, head) + add + in.substr(tail));
+// The models of tests/models/search.hpp, as outcomes.
+Outcome inserted(bool lobForm, const std::string &in, std::int64_t p, std::int64_t l,
+                 const std::string &add, std::int64_t limit) {
+  const orv::model::Inserted r = orv::model::insert(lobForm, in, p, l, add, limit);
+  return r.code.empty() ? ok(r.bytes) : fails(r.code);
 }
 
 std::string randomText(std::mt19937 &rng, const char *alphabet, std::size_t maxLength) {
@@ -132,23 +99,24 @@ TEST(LocateReplaceInsert, AgreeWithNaiveModelsOnSmallAlphabets) {
     const auto capacity = static_cast<std::uint32_t>(rng() % 40);
     const std::string what = testing::PrintToString(std::tuple{needle, hay, start, p, l, capacity});
     check(call("CLI_udfLOCATE3", {text(needle), text(hay)}, intArea()),
-          n(locateModel(needle, hay, 1)), what);
+          n(orv::model::locate(needle, hay, 1)), what);
     check(call("CLI_udfLOCATE4", {lob(lobNeedle), lob(lobHay)}, intArea()),
-          n(locateModel(lobNeedle, lobHay, 1)), what);
+          n(orv::model::locate(lobNeedle, lobHay, 1)), what);
     const Outcome fromStart =
-        start < 1 ? fails("01") : n(locateModel(needle, hay, static_cast<std::size_t>(start)));
+        start < 1 ? fails("01")
+                  : n(orv::model::locate(needle, hay, static_cast<std::size_t>(start)));
     check(call("CLI_udfLOCATE1", {text(needle), text(hay), i32(start)}, intArea()), fromStart,
           what);
     check(call("CLI_udfLOCATE2", {lob(needle), lob(hay), i32(start)}, intArea()), fromStart, what);
     check(call("CLI_udfREPLACE1", {text(hay), text(needle), text(by)}, textArea()),
-          ok(replaceModel(hay, needle, by)), what);
+          ok(orv::model::replace(hay, needle, by)), what);
     // REPLACE2 goes by a fixed limit, not its area's capacity.
     check(call("CLI_udfREPLACE2", {lob(lobHay), lob(lobNeedle), lob(by)}, lobArea(512)),
-          ok(replaceModel(lobHay, lobNeedle, by)), what);
+          ok(orv::model::replace(lobHay, lobNeedle, by)), what);
     check(call("CLI_udfINSERT1", {text(hay), i32(p), i32(l), text(by)}, textArea()),
-          insertModel(false, hay, p, l, by, 4000), what);
+          inserted(false, hay, p, l, by, 4000), what);
     check(call("CLI_udfINSERT2", {lob(lobHay), i32(p), i32(l), lob(by)}, lobArea(capacity)),
-          insertModel(true, lobHay, p, l, by, capacity), what);
+          inserted(true, lobHay, p, l, by, capacity), what);
   }
   EXPECT_EQ(failures, 0);
 }
@@ -250,11 +218,11 @@ TEST(LocateReplaceInsert, ReplaceAgreesWithTheModelAtScale) {
     auto [hay, needle] = searchCase(rng, round * 5);  // the long ones
     if (round % 3 == 0) needle = needle.substr(0, 1);
     const std::string by = randomText(rng, "xyz", round % 4 == 0 ? 20 : 3);
-    const std::string want = replaceModel(hay, needle, by);
+    const std::string want = orv::model::replace(hay, needle, by);
     EXPECT_EQ(call("CLI_udfREPLACE2", {lob(hay), lob(needle), lob(by)}, lobArea()), ok(want))
         << "round " << round;
     const std::string head = hay.substr(0, 4000);
-    const std::string headWant = replaceModel(head, needle, by);
+    const std::string headWant = orv::model::replace(head, needle, by);
     if (headWant.size() <= 4000) {
       EXPECT_EQ(call("CLI_udfREPLACE1", {text(head), text(needle), text(by)}, textArea()),
                 ok(headWant));
@@ -264,7 +232,7 @@ TEST(LocateReplaceInsert, ReplaceAgreesWithTheModelAtScale) {
   const std::string as(1 << 19, 'a');
   for (const std::string by : {"", "b", "bc"}) {
     EXPECT_EQ(call("CLI_udfREPLACE2", {lob(as), lob("a"), lob(by)}, lobArea()),
-              ok(replaceModel(as, "a", by)));
+              ok(orv::model::replace(as, "a", by)));
   }
   // One byte whose result passes the limit: built piece by piece up to the
   // failure, as for any search string.
