@@ -3,7 +3,6 @@
 // grouping, and the edges that random inputs don't reach as a table.
 #include <gtest/gtest.h>
 
-#include <array>
 #include <bit>
 #include <cmath>
 #include <cstdint>
@@ -11,9 +10,6 @@
 #include <random>
 #include <vector>
 
-#include "catalogue/catalogue.hpp"
-#include "frame/call.hpp"
-#include "frame/cliudf.h"
 #include "frame/platform.hpp"
 #include "support/frame_call.hpp"
 

@@ -12,7 +12,6 @@
 #include "models/search.hpp"
 #include "string/search.hpp"
 #include "support/frame_call.hpp"
-#include "support/platform.hpp"
 
 namespace {
 

@@ -5,7 +5,6 @@
 #include <cstdint>
 #include <random>
 #include <string>
-#include <vector>
 
 #include "models/soundex.hpp"
 #include "support/frame_call.hpp"
