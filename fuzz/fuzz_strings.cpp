@@ -24,6 +24,7 @@
 #include <string_view>
 
 #include "harness.hpp"
+#include "models/search.hpp"
 
 namespace {
 
@@ -118,27 +119,8 @@ Want replaced(std::string_view source, std::string_view search, std::string_view
   return {"", out};
 }
 
-Want inserted(std::string_view s, std::int32_t p, std::int32_t l, std::string_view i, bool lob,
-              std::uint32_t capacity) {
-  const auto sn = static_cast<std::int64_t>(s.size()), in = static_cast<std::int64_t>(i.size());
-  const std::int64_t limit = lob ? capacity : static_cast<std::int64_t>(kText);
-  if (lob) {
-    const auto len = static_cast<std::uint32_t>(sn - l + in);
-    if (len > capacity) return {"10", {}};
-  } else if (static_cast<std::int32_t>(sn - l + in) > limit) {
-    return {"10", {}};
-  }
-  if (p > sn) return {"10", {}};
-  // A range past the end counts with the true result length.
-  if (std::int64_t{p} + l - 1 > sn && p - 1 + in > limit) return {"10", {}};
-  if (p < 1 || (!lob && p > limit)) return {"01", {}};
-  if (l < 0) return {"01", {}};
-  if (std::int64_t{p} + l > limit) return {"01", {}};
-  std::string out(s.substr(0, static_cast<std::size_t>(p - 1)));
-  out.append(i);
-  if (std::int64_t{p} - 1 + l < sn) out.append(s.substr(static_cast<std::size_t>(p - 1 + l)));
-  return {"", out};
-}
+// INSERT as the unit tests' model gives it.
+Want inserted(const orv::model::Inserted &model) { return {model.code, model.bytes}; }
 
 // FNV-1a: a hash the fuzzer's mutations scatter.
 std::uint32_t fnv1a(const std::uint8_t *data, std::size_t size) {
@@ -275,7 +257,7 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t *data, std::size_t size
           .num(n1)
           .num(n2)
           .str(b)
-          .expect(cap, inserted(s, n1, n2, b, lob, cap));
+          .expect(cap, inserted(orv::model::insert(lob, s, n1, n2, b, cap)));
     }
     // LOCATE: search string b in s.
     if (family == Family::locate) {
