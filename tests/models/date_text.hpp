@@ -33,40 +33,36 @@ inline Text trimmed(Text t) {
   return t;
 }
 
-struct Clock {
-  std::int64_t h = 0, m = 0, s = 0;
-};
-
 // hh.mm[.ss] or hh:mm[:ss] (the hour may be long or empty), and in a
-// timestamp a fraction of up to 12 digits; 24 only as midnight.
-inline std::optional<Clock> time(Text t, bool inStamp, char dateSeparator) {
+// timestamp a fraction of up to 12 digits; 24 only as midnight.  The
+// seconds since midnight.
+inline std::optional<std::int64_t> time(Text t, bool inStamp, char dateSeparator) {
   if (t.size() < 4 || t.size() > 21 || (inStamp ? t.size() < 7 : t.size() > 8)) return {};
   const std::size_t k = t.find_first_of(".:");
   if (k == Text::npos || !digits(t.substr(0, k))) return {};
   const char sep = t[k];
   if (inStamp && dateSeparator != (sep == '.' ? '-' : ' ')) return {};
-  Clock c{value(t.substr(0, k)), 0, 0};
+  const std::int64_t h = value(t.substr(0, k));
   const Text rest = t.substr(k + 1);
   if (rest.size() < 2 || !digits(rest.substr(0, 2))) return {};
-  c.m = value(rest.substr(0, 2));
+  const std::int64_t m = value(rest.substr(0, 2));
+  std::int64_t s = 0;
   Text fraction;
   if (rest.size() > 2) {
     if (rest.size() < 5 || rest[2] != sep || !digits(rest.substr(3, 2))) return {};
-    c.s = value(rest.substr(3, 2));
+    s = value(rest.substr(3, 2));
     if (rest.size() > 5) {
       fraction = rest.substr(6);
       if (!inStamp || rest[5] != '.' || fraction.size() > 12 || !digits(fraction)) return {};
     }
   }
-  if (c.h > 24 || c.m > 59 || c.s > 59) return {};
-  if (c.h == 24 && (c.m != 0 || c.s != 0 || fraction.find_first_not_of('0') != Text::npos)) {
-    return {};
-  }
-  return c;
+  if (h > 24 || m > 59 || s > 59) return {};
+  if (h == 24 && (m != 0 || s != 0 || fraction.find_first_not_of('0') != Text::npos)) return {};
+  return h * 3600 + m * 60 + s;
 }
 
 struct Date {
-  chr::sys_days day;
+  std::int64_t julian;
   std::size_t end;  // where the date's digits stop
 };
 
@@ -88,32 +84,31 @@ inline std::optional<Date> date(Text t) {
                                 chr::month{static_cast<unsigned>(m)},
                                 chr::day{static_cast<unsigned>(d)}};
   if (!ymd.ok()) return {};
-  return Date{chr::sys_days{ymd}, end};
+  return Date{chr::sys_days{ymd}.time_since_epoch().count() + 2440588, end};
 }
 
-inline Answer julian(const Date &d) { return {"", d.day.time_since_epoch().count() + 2440588}; }
-inline Answer seconds(const Clock &c) { return {"", c.h * 3600 + c.m * 60 + c.s}; }
-inline std::optional<Clock> stampTime(Text t, const Date &d) {
-  if (d.end == t.size()) return Clock{};
+// The time behind a date, midnight if there is none.
+inline std::optional<std::int64_t> stampTime(Text t, const Date &d) {
+  if (d.end == t.size()) return 0;
   return time(t.substr(d.end + 1), true, t[d.end]);
 }
 
 // JULIAN_DAY1, which reads only the date at the head of the text.
 inline Answer julianDayOfHead(Text raw) {
   const auto d = date(trimmed(raw));
-  return d ? julian(*d) : Answer{"04"};
+  return d ? Answer{"", d->julian} : Answer{"04"};
 }
 // JULIAN_DAY2, which also validates a time behind the date.
 inline Answer julianDayOfText(Text raw) {
   const Text t = trimmed(raw);
   const auto d = date(t);
   if (!d) return {"04"};
-  return stampTime(t, *d) ? julian(*d) : Answer{"06"};
+  return stampTime(t, *d) ? Answer{"", d->julian} : Answer{"06"};
 }
 // MIDNIGHT_SECONDS1: a time only.
 inline Answer secondsOfTime(Text raw) {
-  const auto c = time(trimmed(raw), false, 0);
-  return c ? seconds(*c) : Answer{"05"};
+  const auto s = time(trimmed(raw), false, 0);
+  return s ? Answer{"", *s} : Answer{"05"};
 }
 // MIDNIGHT_SECONDS2: nine bytes or more are a date or timestamp.
 inline Answer secondsOfAny(Text raw) {
@@ -121,8 +116,8 @@ inline Answer secondsOfAny(Text raw) {
   if (t.size() < 9) return secondsOfTime(t);
   const auto d = date(t);
   if (!d) return {"04"};
-  const auto c = stampTime(t, *d);
-  return c ? seconds(*c) : Answer{"06"};
+  const auto s = stampTime(t, *d);
+  return s ? Answer{"", *s} : Answer{"06"};
 }
 
 }  // namespace orv::model::date_text
