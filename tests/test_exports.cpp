@@ -1,8 +1,8 @@
-// The export surface as an engine's loader sees it, read from the library
-// file itself (an ELF file's dynamic symbols, or a PE file's export
-// directory), so that the test needs nothing of the platform: exactly the
-// routines that the catalogue lists, each in code under its undecorated
-// name, and the data export as data.
+// The export surface as an engine's loader sees it: exactly the routines
+// that the catalogue lists, each in code under its undecorated name, and
+// the data export as data.  It is read from the library itself, an ELF
+// file's dynamic symbols or a loaded DLL's export directory, so that the
+// test needs nothing of the platform's tools.
 #include <gtest/gtest.h>
 
 #include <algorithm>
@@ -28,29 +28,76 @@ namespace {
 
 using cli::catalogue::kRoutines;
 
-template <typename T>
-T readAt(const std::vector<char> &file, std::uint64_t offset) {
-  T value{};
-  if (offset + sizeof(T) <= file.size()) std::memcpy(&value, file.data() + offset, sizeof(T));
-  return value;
-}
-
 // The library's own name, and each export with what it is: "code", "data",
-// or what else the file says of it.
+// or what else the library says of it.
 struct Surface {
   std::string name;
   std::map<std::string, std::string> exports;
 };
 
-#if !defined(_WIN32)
+#if defined(_WIN32)
 
-// The defined, global, default-visibility symbols of .dynsym, and
-// DT_SONAME; data is a 4-byte object.  False when the file is no ELF64.
-bool readElf(const std::vector<char> &file, Surface &out) {
-  const auto header = readAt<Elf64_Ehdr>(file, 0);
-  if (std::memcmp(header.e_ident, ELFMAG, SELFMAG) != 0 || header.e_ident[EI_CLASS] != ELFCLASS64) {
-    return false;
+template <typename T>
+T at(const unsigned char *p) {
+  T value{};
+  std::memcpy(&value, p, sizeof(T));
+  return value;
+}
+
+// The export directory of the DLL loaded at `base`, where every address is
+// an offset from the base: an export lies in code when its section may be
+// executed (IMAGE_SCN_MEM_EXECUTE).
+Surface exportsOf(const unsigned char *base) {
+  const unsigned char *pe = base + at<std::uint32_t>(base + 0x3C);
+  const unsigned char *optional = pe + 24;
+  EXPECT_EQ(at<std::uint16_t>(optional), 0x20B) << "no PE32+ image";
+  const unsigned char *sections = optional + at<std::uint16_t>(pe + 20);
+  const auto directory = at<std::uint32_t>(optional + 112);
+  const auto directoryEnd = directory + at<std::uint32_t>(optional + 116);
+  const auto kind = [&](std::uint32_t rva) -> std::string {
+    if (rva >= directory && rva < directoryEnd) return "forwarded";
+    for (unsigned i = 0; i < at<std::uint16_t>(pe + 6); ++i) {
+      const unsigned char *s = sections + 40 * i;
+      const auto address = at<std::uint32_t>(s + 12);
+      const auto size = std::max(at<std::uint32_t>(s + 8), at<std::uint32_t>(s + 16));
+      const bool code = (at<std::uint32_t>(s + 36) & 0x20000000) != 0;
+      if (rva >= address && rva < address + size) return code ? "code" : "data";
+    }
+    return "nowhere";
+  };
+  const unsigned char *dir = base + directory;
+  const auto text = [&](const unsigned char *rvaAt) {
+    return std::string(reinterpret_cast<const char *>(base + at<std::uint32_t>(rvaAt)));
+  };
+  Surface out{text(dir + 12), {}};
+  const auto nameCount = at<std::uint32_t>(dir + 24);
+  EXPECT_EQ(at<std::uint32_t>(dir + 20), nameCount) << "exports by ordinal only";
+  for (std::uint32_t i = 0; i < nameCount; ++i) {
+    const auto ordinal = at<std::uint16_t>(base + at<std::uint32_t>(dir + 36) + 2 * i);
+    out.exports[text(base + at<std::uint32_t>(dir + 32) + 4 * i)] =
+        kind(at<std::uint32_t>(base + at<std::uint32_t>(dir + 28) + 4 * ordinal));
   }
+  return out;
+}
+
+#else
+
+// A value at `offset` of `bytes`, or zero beyond their end.
+template <typename T>
+T readAt(const std::vector<char> &bytes, std::uint64_t offset) {
+  T value{};
+  if (offset + sizeof(T) <= bytes.size()) std::memcpy(&value, bytes.data() + offset, sizeof(T));
+  return value;
+}
+
+// The defined, global, default-visibility symbols of an ELF64 file's
+// .dynsym, and its DT_SONAME; data is a 4-byte object.
+Surface exportsOf(const std::vector<char> &file) {
+  Surface out;
+  const auto header = readAt<Elf64_Ehdr>(file, 0);
+  EXPECT_TRUE(std::memcmp(header.e_ident, ELFMAG, SELFMAG) == 0 &&
+              header.e_ident[EI_CLASS] == ELFCLASS64)
+      << "no ELF64 file";
   const auto section = [&](unsigned i) {
     return readAt<Elf64_Shdr>(file, header.e_shoff + std::uint64_t{i} * header.e_shentsize);
   };
@@ -68,11 +115,9 @@ bool readElf(const std::vector<char> &file, Surface &out) {
           continue;
         }
         const unsigned type = ELF64_ST_TYPE(sym.st_info);
-        out.exports[name(sym.st_name)] =
-            type == STT_FUNC ? "code"
-            : type == STT_OBJECT && sym.st_size == 4
-                ? "data"
-                : "type " + std::to_string(type) + " of " + std::to_string(sym.st_size) + " bytes";
+        out.exports[name(sym.st_name)] = type == STT_FUNC                         ? "code"
+                                         : type == STT_OBJECT && sym.st_size == 4 ? "data"
+                                                                                  : "other";
       }
     } else if (s.sh_type == SHT_DYNAMIC) {
       for (std::uint64_t at = s.sh_offset; at < s.sh_offset + s.sh_size; at += sizeof(Elf64_Dyn)) {
@@ -81,107 +126,41 @@ bool readElf(const std::vector<char> &file, Surface &out) {
       }
     }
   }
-  return true;
+  return out;
 }
 
 #endif
-
-// The export directory of a PE32+ file: an export lies in code when its
-// section may be executed.  False when the file is no PE32+.
-bool readPe(const std::vector<char> &file, Surface &out) {
-  if (file.size() < 0x40 || file[0] != 'M' || file[1] != 'Z') return false;
-  const auto pe = readAt<std::uint32_t>(file, 0x3C);
-  if (readAt<std::uint32_t>(file, pe) != 0x00004550) return false;  // "PE\0\0"
-  const std::uint64_t coff = pe + 4, optional = coff + 20;
-  if (readAt<std::uint16_t>(file, optional) != 0x20B) return false;  // PE32+
-  struct Section {
-    std::uint32_t address, size, rawOffset, flags;
-  };
-  std::vector<Section> sections;
-  const auto sectionCount = readAt<std::uint16_t>(file, coff + 2);
-  for (std::uint64_t i = 0, at = optional + readAt<std::uint16_t>(file, coff + 16);
-       i < sectionCount; ++i, at += 40) {
-    sections.push_back(
-        {readAt<std::uint32_t>(file, at + 12),
-         std::max(readAt<std::uint32_t>(file, at + 8), readAt<std::uint32_t>(file, at + 16)),
-         readAt<std::uint32_t>(file, at + 20), readAt<std::uint32_t>(file, at + 36)});
-  }
-  const auto sectionOf = [&](std::uint32_t rva) -> const Section * {
-    for (const Section &s : sections) {
-      if (rva >= s.address && rva < s.address + s.size) return &s;
-    }
-    return nullptr;
-  };
-  const auto offsetOf = [&](std::uint32_t rva) -> std::uint64_t {
-    const Section *s = sectionOf(rva);
-    return s == nullptr ? file.size() : std::uint64_t{s->rawOffset} + (rva - s->address);
-  };
-  const auto textAt = [&](std::uint32_t rva) {
-    const std::uint64_t at = offsetOf(rva);
-    return at < file.size()
-               ? std::string(file.data() + at, ::strnlen(file.data() + at, file.size() - at))
-               : std::string();
-  };
-  const auto directory = readAt<std::uint32_t>(file, optional + 112);
-  const auto directorySize = readAt<std::uint32_t>(file, optional + 116);
-  if (directory == 0) return true;
-  const std::uint64_t dir = offsetOf(directory);
-  out.name = textAt(readAt<std::uint32_t>(file, dir + 12));
-  const auto nameCount = readAt<std::uint32_t>(file, dir + 24);
-  EXPECT_EQ(readAt<std::uint32_t>(file, dir + 20), nameCount) << "exports by ordinal only";
-  const std::uint64_t functions = offsetOf(readAt<std::uint32_t>(file, dir + 28));
-  const std::uint64_t names = offsetOf(readAt<std::uint32_t>(file, dir + 32));
-  const std::uint64_t ordinals = offsetOf(readAt<std::uint32_t>(file, dir + 36));
-  for (std::uint32_t i = 0; i < nameCount; ++i) {
-    const auto ordinal = readAt<std::uint16_t>(file, ordinals + 2ULL * i);
-    const auto rva = readAt<std::uint32_t>(file, functions + 4ULL * ordinal);
-    const Section *s = sectionOf(rva);
-    out.exports[textAt(readAt<std::uint32_t>(file, names + 4ULL * i))] =
-        rva >= directory && rva < directory + directorySize ? "forwarded"
-        : s == nullptr                                      ? "nowhere"
-        : (s->flags & 0x20000000) != 0                      ? "code"  // IMAGE_SCN_MEM_EXECUTE
-                                                            : "data";
-  }
-  return true;
-}
 
 TEST(Exports, AreExactlyTheCataloguedRoutinesAndTheDataExportAsData) {
   void *library = orv::test::openLibrary(ORV_LIBRARY_PATH);
   ASSERT_NE(library, nullptr) << orv::test::loaderError();
-  const std::string path = orv::test::libraryFile(library);
-  orv::test::closeLibrary(library);
-  std::ifstream in(path, std::ios::binary);
-  const std::vector<char> file((std::istreambuf_iterator<char>(in)), {});
-  Surface surface;
-  const bool pe = readPe(file, surface);
-#if !defined(_WIN32)
-  ASSERT_TRUE(pe || readElf(file, surface)) << path << " is no PE32+ or ELF64 file";
+#if defined(_WIN32)
+  const Surface surface = exportsOf(static_cast<const unsigned char *>(library));
+  EXPECT_EQ(surface.name, "ORVCLIFN.dll");
 #else
-  ASSERT_TRUE(pe) << path << " is no PE32+ file";
+  std::ifstream in(orv::test::libraryFile(library), std::ios::binary);
+  const Surface surface = exportsOf({std::istreambuf_iterator<char>(in), {}});
+  EXPECT_EQ(surface.name, "liborvclifn.so.1");
 #endif
-  EXPECT_EQ(surface.name, pe ? "ORVCLIFN.dll" : "liborvclifn.so.1");
+  orv::test::closeLibrary(library);
+  // Each routine once, named after its SQL function (with a digit when it
+  // has several exports), but the table functions of mixed case.
+  const std::set<std::string> mixedCase = {"CLI_udfFmpThreads", "CLI_udfFmpRows",
+                                           "SQLCACHE_SNAPSHOT"};
   std::map<std::string, std::string> expected = {{"sqlzThisIsAORVLibrary", "data"}};
-  for (const auto &r : kRoutines) expected[r.symbol] = "code";
+  for (const auto &r : kRoutines) {
+    EXPECT_TRUE(expected.emplace(r.symbol, "code").second) << r.symbol << " is listed twice";
+    const std::string base = "CLI_udf" + std::string(r.sqlName), symbol = r.symbol;
+    EXPECT_TRUE(mixedCase.contains(symbol) || symbol == base ||
+                (symbol.size() == base.size() + 1 && symbol.starts_with(base) &&
+                 std::isdigit(static_cast<unsigned char>(symbol.back()))))
+        << symbol << " for " << r.sqlName;
+  }
   EXPECT_EQ(surface.exports, expected);
   const auto *mark =
       static_cast<const std::int32_t *>(orv::test::exportAddress("sqlzThisIsAORVLibrary"));
   ASSERT_NE(mark, nullptr);
   EXPECT_EQ(*mark, 0);
-}
-
-TEST(Catalogue, NamesEachExportOnceAfterItsSqlFunction) {
-  const std::set<std::string> mixedCase = {"CLI_udfFmpThreads", "CLI_udfFmpRows",
-                                           "SQLCACHE_SNAPSHOT"};
-  std::set<std::string> seen;
-  for (const auto &r : kRoutines) {
-    EXPECT_TRUE(seen.insert(r.symbol).second) << r.symbol << " is listed twice";
-    if (mixedCase.contains(r.symbol)) continue;
-    const std::string base = "CLI_udf" + std::string(r.sqlName);
-    const std::string symbol = r.symbol;
-    EXPECT_TRUE(symbol == base || (symbol.size() == base.size() + 1 && symbol.starts_with(base) &&
-                                   std::isdigit(static_cast<unsigned char>(symbol.back()))))
-        << r.symbol << " for " << r.sqlName;
-  }
 }
 
 }  // namespace

@@ -12,7 +12,6 @@
 #include <filesystem>
 #include <fstream>
 #include <future>
-#include <optional>
 #include <string>
 #include <utility>
 #include <vector>
@@ -184,15 +183,14 @@ struct Row {
   std::array<std::int16_t, 18> indicators{};
 };
 
+// SQLCACHE_SNAPSHOT of the library at `library`, over a folder of its own.
 class Snapshot : public ::testing::Test {
  protected:
+  explicit Snapshot(const char *library = ORV_LIBRARY_PATH) : use(library) {}
   void SetUp() override {
     fs::create_directories(dir / "tmp");
     orv::test::setEnvironment("ORVENGINE_INSTANCE_PATH", dir.string().c_str());
     orv::test::setEnvironment("ORVENGINE_SNAPSHOT_NAME", "cache");
-    const cli::catalogue::Routine *routine = cli::catalogue::find("SQLCACHE_SNAPSHOT");
-    ASSERT_NE(routine, nullptr);
-    table.emplace(*routine, orv::test::exportAddress("SQLCACHE_SNAPSHOT"), nullptr, kUnset);
   }
   void TearDown() override {
     fs::remove_all(dir);
@@ -207,7 +205,7 @@ class Snapshot : public ::testing::Test {
   // number columns hold -7 and column 17 "unset" before it, so that a
   // column the routine leaves alone shows.
   std::pair<Row, std::string> call(std::int32_t callType) {
-    cli::call::TableCall &t = *table;
+    cli::call::TableCall &t = table;
     for (std::size_t i = 0; i < 16; ++i) {
       const std::int32_t unset = -7;
       std::memcpy(t.area(i), &unset, sizeof unset);
@@ -246,13 +244,15 @@ class Snapshot : public ::testing::Test {
 
   // An open on a fresh scratchpad, as the engine gives; its SQLSTATE.
   std::string openTable() {
-    std::memset(table->scratchpad(), 0, cli::call::TableCall::kScratchpadSize);
+    std::memset(table.scratchpad(), 0, cli::call::TableCall::kScratchpadSize);
     return call(CLI_CALL_OPEN).second;
   }
 
+  orv::test::LibraryInUse use;
   fs::path dir =
       fs::temp_directory_path() / ("orv_snapshot_" + std::to_string(orv::test::processId()));
-  std::optional<cli::call::TableCall> table;
+  cli::call::TableCall table{*cli::catalogue::find("SQLCACHE_SNAPSHOT"),
+                             orv::test::exportAddress("SQLCACHE_SNAPSHOT"), nullptr, kUnset};
 };
 
 Statement numbered(std::int32_t base, std::string text) {
@@ -381,6 +381,7 @@ TEST_F(Snapshot, OpensOnlyARegularFileAndNeverWaits) {
 // which fail where a test says and count what they are asked.
 class FakeSnapshot : public Snapshot {
  protected:
+  FakeSnapshot() : Snapshot(ORV_FAKES_LIBRARY_PATH) {}
   void SetUp() override {
     resetFakes();
     ASSERT_NE(fakes, nullptr) << orv::test::loaderError();
@@ -395,7 +396,6 @@ class FakeSnapshot : public Snapshot {
   }
   // Rows until the table ends.
   int rowCount() { return static_cast<int>(rows(200000).size()); }
-  orv::test::LibraryInUse use{ORV_FAKES_LIBRARY_PATH};
   OrvFakes *fakes = nullptr;
 };
 
@@ -451,7 +451,7 @@ TEST_F(FakeSnapshot, LogsABlockThatCannotBeHadAndKeepsNone) {
 // The static data is asked for once on every entry, open included.
 TEST_F(FakeSnapshot, AsksForTheStaticDataOncePerCall) {
   write(statement({{}, "s"}));
-  std::memset(table->scratchpad(), 0, cli::call::TableCall::kScratchpadSize);
+  std::memset(table.scratchpad(), 0, cli::call::TableCall::kScratchpadSize);
   for (const std::int32_t type : {CLI_CALL_OPEN, CLI_CALL_FETCH, CLI_CALL_FETCH, CLI_CALL_CLOSE}) {
     fakes->staticDataCalls = 0;
     call(type);

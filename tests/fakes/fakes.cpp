@@ -32,7 +32,7 @@ uint8_t name(const CLI_nlsTimeRecord *time, uint32_t size, unsigned char *out, u
   fakes.lastTime = *time;
   fakes.lastNameSize = size;
   std::memcpy(out, fakes.name, std::min<std::size_t>(fakes.nameLength, size));
-  *codePage = fakes.nameCodePage;
+  *codePage = 1208;
   return fakes.nameLength;
 }
 
@@ -46,11 +46,9 @@ void orv_fakes_reset(void) {
   fakes = OrvFakes{};
   fakes.nameLength = 6;
   std::memcpy(fakes.name, "Sunday", 6);
-  fakes.nameCodePage = 1208;
   fakes.convertBytes = -1;
   fakes.encodingClass = 1;
   fakes.collationLength = 4;
-  std::memcpy(fakes.collationName, "NAME", 4);
   std::memcpy(fakes.rawText, "+1.50000000000000E+000", 23);
 }
 
@@ -90,7 +88,8 @@ int32_t sqlrxf2a(const double *, int32_t, char *text, uint32_t) {
 int32_t sqlnlsCollIDMapIDToName(char *out, uint32_t size, const unsigned char *, int32_t) {
   ++fakes.collationCalls;
   fakes.lastCollationSize = size;
-  std::memcpy(out, fakes.collationName, std::min<std::size_t>(sizeof fakes.collationName, size));
+  std::memset(out, 0, size);  // all that it was told it may write
+  std::memcpy(out, "NAME", std::min<std::size_t>(4, size));
   return fakes.collationLength;
 }
 

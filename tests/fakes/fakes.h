@@ -17,10 +17,9 @@ extern "C" {
 #endif
 
 typedef struct OrvFakes {
-  /* Name services: the length they return (0 fails), the bytes and code page. */
+  /* Name services: the length they return (0 fails) and the bytes, in UTF-8. */
   uint8_t nameLength;
   unsigned char name[256];
-  uint16_t nameCodePage;
   CLI_nlsTimeRecord lastTime;
   uint32_t lastNameSize;
 
@@ -34,9 +33,8 @@ typedef struct OrvFakes {
 
   int32_t encodingClass; /* sqlnls_Encoding2 */
 
-  /* sqlnlsCollIDMapIDToName: returns collationLength after copying the name. */
+  /* sqlnlsCollIDMapIDToName: returns collationLength after copying "NAME". */
   int32_t collationLength;
-  char collationName[256];
   int collationCalls;
   uint32_t lastCollationSize;
 

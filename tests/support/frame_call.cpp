@@ -171,10 +171,13 @@ Outcome callFrame(const char *name, const std::vector<Value> &inputs, const Valu
   const std::vector<std::int16_t> indicatorsBefore = indicators;
 
   const std::size_t area = areaOf(result);
-  Bytes out(area + kCanaryBytes, kCanary);
+  // Each thread keeps its areas from call to call: a CLI_udfLob area is a
+  // megabyte, and allocating it anew on each call is slow on some systems.
+  thread_local Bytes out, before;
+  out.assign(area + kCanaryBytes, kCanary);
   std::fill_n(out.begin(), area, kUnwritten);
   if (result.layout == Value::Layout::lob) frame::prepareLobResult(out.data(), result.size);
-  const Bytes before = out;
+  before = out;
   char sqlstate[CLI_SQLSTATE_SIZE];
   char message[kMessageBytes];
   std::memset(sqlstate, 'S', sizeof sqlstate);

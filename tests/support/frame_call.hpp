@@ -44,11 +44,7 @@ inline Value fixed(std::string s) { return {Value::Layout::fixed, 0, std::move(s
 inline Value fixedArea(std::uint32_t size) { return {Value::Layout::fixed, 0, {}, size}; }
 // Terminated text (or any input) that the caller has laid out at `at`, in a
 // place of its choosing: against a page that can't be read, say.
-inline Value placedAt(const void *at) {
-  Value v{Value::Layout::text, 0, {}, 0};
-  v.placed = at;
-  return v;
-}
+inline Value placedAt(const void *at) { return {Value::Layout::text, 0, {}, 0, false, at}; }
 inline Value nullOf(Value v) {
   v.null = true;
   return v;
