@@ -57,26 +57,17 @@ TEST(DateNumbers, AgreeWithChronoOnEveryDateOfTheCalendar) {
   // Each export is laid out once over the same buffers, and the loop only
   // changes what they hold: every one of these takes a text and gives a
   // 32-bit number, so all have the same count of arguments.
-  constexpr std::size_t kArguments =
-      cli::catalogue::argumentCount(*cli::catalogue::find("CLI_udfJULIAN_DAY2"));
+  constexpr const cli::catalogue::Routine &kJulian = *cli::catalogue::find("CLI_udfJULIAN_DAY2");
+  constexpr std::size_t kArguments = cli::catalogue::argumentCount(kJulian);
   char text[40];
   std::int32_t got = -1;
   std::int16_t ind[2] = {};
-  char sqlstate[6] = {};
-  char message[16] = {};
+  cli::call::StatusBuffers status;
   void *const inputs[] = {text};
   void *const results[] = {&got};
-  std::int16_t *const inputIndicators[] = {&ind[0]};
-  std::int16_t *const resultIndicators[] = {&ind[1]};
-  cli::call::Frame frame;
-  frame.inputs = inputs;
-  frame.results = results;
-  frame.inputIndicators = inputIndicators;
-  frame.resultIndicators = resultIndicators;
-  frame.sqlstate = sqlstate;
-  frame.functionName = "";
-  frame.specificName = "";
-  frame.message = message;
+  std::int16_t *const indicators[] = {&ind[0], &ind[1]};
+  const cli::call::Frame frame =
+      cli::call::frameOf(kJulian, inputs, results, &indicators[0], &indicators[1], status);
   struct Laid {
     void *fn = nullptr;
     void *args[cli::call::kMaxArguments] = {};
@@ -104,15 +95,15 @@ TEST(DateNumbers, AgreeWithChronoOnEveryDateOfTheCalendar) {
     const auto n = static_cast<unsigned>(day.time_since_epoch().count());
     for (std::size_t r = 0; r < std::size(routines); ++r) {
       for (int form = 0; form < 2; ++form) {
-        std::memset(sqlstate, 0, sizeof sqlstate);
-        std::memset(message, 0, sizeof message);
+        status = {};
         spell(text, ymd, ((n + r) & 1) != 0, times[(n + r + static_cast<unsigned>(form)) % 4]);
         got = -1;
         const Laid &e = fns[r][static_cast<std::size_t>(form)];
         cli::call::invokeWith<kArguments>(e.fn, e.args);
-        if ((got != want.*routines[r].expected || sqlstate[0] != 0) && ++failures <= 10) {
+        if ((got != want.*routines[r].expected || status.stored()) && ++failures <= 10) {
           ADD_FAILURE() << routines[r].part << "/" << form << " on " << text << ": " << got
-                        << ", want " << want.*routines[r].expected << " " << sqlstate;
+                        << ", want " << want.*routines[r].expected << " "
+                        << std::string(status.message, 9);
         }
       }
     }
