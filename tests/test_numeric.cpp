@@ -55,7 +55,6 @@ TEST(NumericRoutines, KeepTheirEdges) {
       {"CLI_udfABS3", {i16(-32768)}, fails("01")},
       {"CLI_udfABS3", {i16(-32767)}, okInt(32767)},
       {"CLI_udfABS1", {f64(-0.0)}, okReal(0.0)},
-      {"CLI_udfABS1", {f64(-kInf)}, okReal(kInf)},
       {"CLI_udfSIGN1", {f64(-0.0)}, okReal(0.0)},
       {"CLI_udfSIGN1", {f64(kNaN)}, okReal(1.0)},
       {"CLI_udfSIGN1", {f64(-kInf)}, okReal(-1.0)},
