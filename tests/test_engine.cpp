@@ -21,15 +21,14 @@ namespace {
 
 using namespace orv::test;
 
-Outcome number(double d) { return okReal(d); }
 std::string padded(const std::string &s) { return s + std::string(24 - s.size(), ' '); }
 
 TEST(CharToDouble, ReadsDecimalTextAfterCuttingTrailingSpace) {
   const std::pair<const char *, Outcome> cases[] = {
-      {"1.5", number(1.5)},        {"1.5 \t\n\r\v\f", number(1.5)},
-      {"-2.25e2", number(-225.0)}, {"+7", number(7.0)},
-      {"-0", number(-0.0)},        {".5", number(0.5)},
-      {"5.", number(5.0)},         {"1e-400", number(0.0)},
+      {"1.5", okReal(1.5)},        {"1.5 \t\n\r\v\f", okReal(1.5)},
+      {"-2.25e2", okReal(-225.0)}, {"+7", okReal(7.0)},
+      {"-0", okReal(-0.0)},        {".5", okReal(0.5)},
+      {"5.", okReal(5.0)},         {"1e-400", okReal(0.0)},
       {"", fails("11")},           {" \t ", fails("11")},
       {" 1", fails("11")},         {"1e400", fails("11")},
       {"1.5x", fails("11")},       {"e5", fails("11")},
@@ -75,7 +74,7 @@ TEST(DoubleToChar, WritesTheShortNotationIn24BytesWhichReadsBack) {
     const std::string want = shortNotation(x);
     EXPECT_EQ(call("CLI_udfDOUBLETOCHAR", {f64(x)}, fixedArea(24)), ok(padded(want))) << x;
     EXPECT_EQ(call("CLI_udfCHARTODOUBLE", {text(want)}, numberArea(Value::Layout::real)),
-              number(std::strtod(want.c_str(), nullptr)))
+              okReal(std::strtod(want.c_str(), nullptr)))
         << want;
   }
 }
@@ -170,15 +169,9 @@ Outcome copy(const Value &object, std::int32_t from, std::int32_t to, std::int32
 
 // A copy, which sets the result indicator to 1, and a refusal, which
 // leaves it alone.
-Outcome copied(std::string data) {
-  Outcome o = ok(std::move(data));
-  o.indicator = 1;
-  return o;
-}
+Outcome copied(std::string data) { return {"", std::move(data), 0, false, false, 1}; }
 Outcome refused(const std::string &status) {
-  Outcome o = fails(status + "/sqlocpcv");
-  o.indicator = 0x5A5A;
-  return o;
+  return {status + "/sqlocpcv", "", 0, false, false, 0x5A5A};
 }
 
 TEST(VeblobCopy, ConvertsEachStringAndRewritesItsLengthOrRefuses) {
@@ -254,25 +247,23 @@ class Fakes : public ::testing::Test {
   }
   LibraryInUse use{ORV_FAKES_LIBRARY_PATH};
   OrvFakes *fakes = nullptr;
+  DatabaseInfo utf8{1208};
 };
 
 TEST_F(Fakes, NamesFillOneFieldOfTheTimeRecord) {
-  DatabaseInfo utf8(1208);
-  const CLI_nlsTimeRecord zero{};
+  CLI_nlsTimeRecord december{}, saturday{};
+  december.month = 11;
+  saturday.dayOfWeek = 6;
   EXPECT_EQ(name("CLI_udfMONTHNAME1", "2001-12-01", utf8.block), ok("Sunday"));
-  CLI_nlsTimeRecord want = zero;
-  want.month = 11;
-  EXPECT_EQ(std::memcmp(&fakes->lastTime, &want, sizeof want), 0);
+  EXPECT_EQ(std::memcmp(&fakes->lastTime, &december, sizeof december), 0);
   EXPECT_EQ(fakes->lastNameSize, 101u);
   name("CLI_udfDAYNAME2", "2001-01-06", utf8.block);
-  want = zero;
-  want.dayOfWeek = 6;
-  EXPECT_EQ(std::memcmp(&fakes->lastTime, &want, sizeof want), 0);
+  EXPECT_EQ(std::memcmp(&fakes->lastTime, &saturday, sizeof saturday), 0);
   EXPECT_EQ(fakes->convertCalls, 0);  // the name was in the database's code page
 }
 
 TEST_F(Fakes, NamesFailWithTheNameServiceAndTheConversion) {
-  DatabaseInfo utf8(1208), wide(70000);
+  DatabaseInfo wide(70000);
   fakes->nameLength = 0;
   EXPECT_EQ(name("CLI_udfDAYNAME1", "2001-01-07", utf8.block), fails("03"));
   fakes->nameLength = 102;  // more than the buffer holds

@@ -206,10 +206,8 @@ class Snapshot : public ::testing::Test {
   // column the routine leaves alone shows.
   std::pair<Row, std::string> call(std::int32_t callType) {
     cli::call::TableCall &t = table;
-    for (std::size_t i = 0; i < 16; ++i) {
-      const std::int32_t unset = -7;
-      std::memcpy(t.area(i), &unset, sizeof unset);
-    }
+    const std::int32_t unset = -7;
+    for (std::size_t i = 0; i < 16; ++i) std::memcpy(t.area(i), &unset, sizeof unset);
     std::memset(t.area(16), 0, cli::call::areaSize(t.row().results[16]));
     std::memcpy(t.area(16), "unset", 5);
     t.step(callType);

@@ -25,8 +25,7 @@ typedef struct OrvFakes {
 
   /* sqlocpcv: copies up to `convertBytes` source bytes (all when -1) and
    * returns `convertStatus`; what it was given is kept. */
-  int32_t convertStatus;
-  int32_t convertBytes;
+  int32_t convertStatus, convertBytes;
   int convertCalls;
   CLI_conversionRecord lastRecord; /* as it was handed in */
   uint32_t lastSourceCodePage, lastTargetCodePage;
@@ -47,14 +46,10 @@ typedef struct OrvFakes {
   /* Snapshot services: real file reads on `instancePath`, with failures. */
   int32_t instanceStatus;
   char instancePath[264];
-  int staticDataCalls;
   int failReadAt; /* the n-th sqloread fails (1-based); 0 never */
-  int reads;
-  int seekFails; /* sqlochgfileptr fails when set */
-  int opens, closes;
+  int seekFails;  /* sqlochgfileptr fails when set */
   int32_t allocationStatus;
-  int allocations, frees;
-  int logCalls;
+  int staticDataCalls, reads, opens, closes, allocations, frees, logCalls;
   char logMessage[128];
   int32_t logStatus;
 } OrvFakes;

@@ -50,23 +50,6 @@ void placeExtras(const cat::Routine &row, const std::vector<void *> &extras, fra
   if ((has & cat::kCallback) != 0) f.callback = reinterpret_cast<CLI_tableCallback>(extras[next]);
 }
 
-bool isNumber(Value::Layout layout) {
-  return layout != Value::Layout::text && layout != Value::Layout::lob &&
-         layout != Value::Layout::fixed;
-}
-
-std::size_t widthOf(Value::Layout layout) {
-  return layout == Value::Layout::int16 ? 2 : layout == Value::Layout::int32 ? 4 : 8;
-}
-
-// The bytes of a result's area: a number's width, a CLI_udfLob's length
-// word and capacity, or the size asked for.
-std::size_t areaOf(const Value &result) {
-  if (isNumber(result.layout)) return widthOf(result.layout);
-  if (result.layout == Value::Layout::lob) return CLI_LOB_AREA_SIZE(std::size_t{result.size});
-  return result.size;
-}
-
 template <typename T>
 Bytes bytesOfNumber(T x) {
   Bytes out(sizeof x);
@@ -106,11 +89,14 @@ Bytes bytesOf(const Value &v) {
   }
 }
 
-// A number read back from its area, sign-extended; a double as its bits.
-std::int64_t numberIn(const unsigned char *area, Value::Layout layout) {
-  if (layout == Value::Layout::int16) return numberAt<std::int16_t>(area);
-  if (layout == Value::Layout::int32) return numberAt<std::int32_t>(area);
-  return numberAt<std::int64_t>(area);
+// The bytes of a result's area: a CLI_udfLob's length word and capacity,
+// the size asked for, or a number's width.
+std::size_t areaOf(const Value &result) {
+  if (result.layout == Value::Layout::lob) return CLI_LOB_AREA_SIZE(std::size_t{result.size});
+  if (result.layout == Value::Layout::text || result.layout == Value::Layout::fixed) {
+    return result.size;
+  }
+  return bytesOf(result).size();
 }
 
 // The result area read back in the result's layout.  After a failure a
@@ -133,12 +119,17 @@ Outcome resultIn(const char *name, const Bytes &out, std::size_t area, const Val
       n = std::min(n, result.size);
       return ok(std::string(out.begin() + 4, out.begin() + 4 + n));
     }
-    default: {
-      Outcome o = ok(numberIn(out.data(), result.layout));
-      o.real = result.layout == Value::Layout::real;
-      return o;
-    }
+    // A number, sign-extended; a double as its bits.
+    case Value::Layout::int16:
+      return ok(numberAt<std::int16_t>(out.data()));
+    case Value::Layout::int32:
+      return ok(numberAt<std::int32_t>(out.data()));
+    case Value::Layout::int64:
+      return ok(numberAt<std::int64_t>(out.data()));
+    case Value::Layout::real:
+      return okReal(std::bit_cast<double>(numberAt<std::int64_t>(out.data())));
   }
+  return {};
 }
 
 Outcome callFrame(const char *name, const std::vector<Value> &inputs, const Value &result,
@@ -241,21 +232,17 @@ LibraryInUse::~LibraryInUse() { currentLibrary = previous_; }
 
 // Each library is opened once, and each of its exports found once.
 void *exportAddress(const char *name) {
-  struct Loaded {
-    void *handle = nullptr;
-    std::map<std::string, void *> exports;
-  };
   static std::mutex mutex;
-  static std::map<std::string, Loaded> libraries;
+  static std::map<std::string, void *> libraries, exports;
   const std::lock_guard<std::mutex> lock(mutex);
   auto [library, fresh] = libraries.try_emplace(currentLibrary);
-  if (fresh) {
-    library->second.handle = openLibrary(currentLibrary);
-    if (library->second.handle == nullptr) ADD_FAILURE() << currentLibrary << ": " << loaderError();
+  if (fresh) library->second = openLibrary(currentLibrary);
+  if (library->second == nullptr) {
+    if (fresh) ADD_FAILURE() << currentLibrary << ": " << loaderError();
+    return nullptr;
   }
-  if (library->second.handle == nullptr) return nullptr;
-  auto [at, first] = library->second.exports.try_emplace(name);
-  if (first) at->second = findExport(library->second.handle, name);
+  auto [at, first] = exports.try_emplace(std::string(currentLibrary) + ':' + name);
+  if (first) at->second = findExport(library->second, name);
   return at->second;
 }
 

@@ -3,20 +3,15 @@
 #if defined(_WIN32)
 #include <process.h>
 #include <windows.h>
-
-#include <cstdlib>
 #else
 #include <dlfcn.h>
-#include <fcntl.h>
 #include <link.h>
 #include <sys/mman.h>
 #include <sys/stat.h>
-#include <unistd.h>
-
-#include <cstdlib>
 #endif
 
 #include <algorithm>
+#include <cstdlib>
 
 namespace orv::test {
 
