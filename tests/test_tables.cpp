@@ -1,7 +1,5 @@
-// The table functions, driven through open, fetch and close as an engine
-// drives them: the Fmp tables with a callback that plays the engine's part,
-// and SQLCACHE_SNAPSHOT over snapshot files written with the snapshot
-// writer, against the stand-in services and against fake ones.
+// The table functions driven through open, fetch and close: the Fmp tables
+// with a callback in the engine's part, SQLCACHE_SNAPSHOT over written files.
 #include <gtest/gtest.h>
 
 #include <array>
@@ -31,8 +29,6 @@ using orv::test::exportAddress;
 namespace fs = std::filesystem;
 using namespace orv::snapshot;
 
-// ---- FmpThreads and FmpRows -------------------------------------------------
-
 // The engine's side: its answers to open and close, and what it was asked.
 struct Engine {
   std::int32_t openStatus = 0, closeStatus = 0, count = 0;
@@ -43,7 +39,6 @@ struct Engine {
 };
 Engine *engine = nullptr;
 
-// The number that a request slot points at.
 std::int32_t *numberAt(std::uint64_t slot) {
   std::int32_t *p = nullptr;
   std::memcpy(&p, &slot, sizeof p);
@@ -70,7 +65,6 @@ std::int32_t callback(std::int32_t slots, void *request) {
   return engine->openStatus;
 }
 
-// One call of either routine; rows come back as six numbers.
 struct Call {
   std::string sqlstate, message;
   std::array<std::int64_t, 6> row{};
@@ -134,32 +128,28 @@ TEST_F(Tables, ThreadsDeliverEachRowThenEndAndGiveTheTableBack) {
   EXPECT_EQ(fake.codes.size(), 2u);
 }
 
-TEST_F(Tables, ThreadsTakeStatusMinus3AsAnEmptyTable) {
+// Status -3 on open is an empty table to FmpThreads and a failure to FmpRows.
+TEST_F(Tables, ReportFailedCallbacksWithTheirStatus) {
   fake.openStatus = -3;
   fake.count = 5;
-  fake.table = words({0});  // a table pointer left in the record
+  fake.table = words({0, 0, 0, 0});  // a table pointer left in the record
   EXPECT_EQ(run(true, CLI_CALL_OPEN).sqlstate, "");
   EXPECT_EQ(run(true, CLI_CALL_FETCH).sqlstate, "02000");
   run(true, CLI_CALL_CLOSE);
   EXPECT_EQ(fake.codes, (std::vector<std::int32_t>{3, 1}));
-}
-
-TEST_F(Tables, ReportFailedCallbacksWithTheirStatus) {
-  fake.table = words({0, 0, 0, 0});
-  fake.openStatus = 5;
-  const Call threads = run(true, CLI_CALL_OPEN);
-  EXPECT_EQ(threads.sqlstate + "|" + threads.message, "38620|API call failed 5");
-  fake.openStatus = -3;
   const Call rows = run(false, CLI_CALL_OPEN);
   EXPECT_EQ(rows.sqlstate + "|" + rows.message, "38620|API call failed -3");
   EXPECT_EQ(run(false, CLI_CALL_FETCH).sqlstate, "02000");  // no table: nothing is read
+  fake.openStatus = 5;
+  const Call threads = run(true, CLI_CALL_OPEN);
+  EXPECT_EQ(threads.sqlstate + "|" + threads.message, "38620|API call failed 5");
   fake.openStatus = 0;
   fake.closeStatus = -2147483647 - 1;
   run(false, CLI_CALL_OPEN);
   const Call close = run(false, CLI_CALL_CLOSE);
   EXPECT_EQ(close.sqlstate + "|" + close.message, "38660|API call failed -2147483648");
-  run(false, CLI_CALL_CLOSE);  // the pointer was cleared all the same
-  EXPECT_EQ(fake.closed.size(), 1u);
+  run(false, CLI_CALL_CLOSE);         // the pointer was cleared all the same
+  EXPECT_EQ(fake.closed.size(), 2u);  // FmpThreads' and the first
 }
 
 TEST_F(Tables, RowsWidenTheirUnsignedBytes) {
@@ -169,8 +159,6 @@ TEST_F(Tables, RowsWidenTheirUnsignedBytes) {
   EXPECT_EQ(run(false, CLI_CALL_FETCH).row, (std::array<std::int64_t, 6>{1, 2, -1, 4, 255, 128}));
   EXPECT_EQ(run(false, CLI_CALL_FETCH).sqlstate, "02000");
 }
-
-// ---- SQLCACHE_SNAPSHOT ------------------------------------------------------
 
 // What each result indicator holds before a call, to see which of them
 // the routine writes.
@@ -220,11 +208,11 @@ class Snapshot : public ::testing::Test {
     return {row, std::string(sqlstate, ::strnlen(sqlstate, sizeof t.status().sqlstate))};
   }
 
-  // Opens, fetches until the table ends (at most `limit` rows), closes.
-  std::vector<Row> rows(std::size_t limit = 100) {
+  // Opens, fetches until the table ends (or a limit, should it never), closes.
+  std::vector<Row> rows() {
     std::vector<Row> out;
     EXPECT_EQ(openTable(), "");
-    for (std::size_t i = 0; i < limit; ++i) {
+    for (std::size_t i = 0; i < 200000; ++i) {
       auto [row, state] = call(CLI_CALL_FETCH);
       if (state == "02000") break;
       EXPECT_EQ(state, "");
@@ -234,9 +222,9 @@ class Snapshot : public ::testing::Test {
     return out;
   }
 
-  std::vector<std::string> texts(std::size_t limit = 100) {
+  std::vector<std::string> texts() {
     std::vector<std::string> out;
-    for (const Row &r : rows(limit)) out.push_back(r.text + ":" + r.statement);
+    for (const Row &r : rows()) out.push_back(r.text + ":" + r.statement);
     return out;
   }
 
@@ -324,35 +312,25 @@ TEST_F(Snapshot, ReadsPairsAtOddOffsets) {
 
 TEST_F(Snapshot, EndsTheTableWhenTheFileCannotBeFound) {
   write(statement(numbered(1, "a")));
-  orv::test::setEnvironment("ORVENGINE_SNAPSHOT_NAME",
-                            std::string(300, 'n').c_str());  // the path would not fit
-  EXPECT_EQ(texts().size(), 0u);
-  orv::test::setEnvironment("ORVENGINE_SNAPSHOT_NAME", "missing");
-  EXPECT_EQ(texts().size(), 0u);
+  for (const std::string &name : {std::string(300, 'n'), std::string("missing")}) {
+    orv::test::setEnvironment("ORVENGINE_SNAPSHOT_NAME", name.c_str());  // 300: no room in the path
+    EXPECT_TRUE(texts().empty()) << name;
+  }
 }
 
-// The stand-in's file service opens a regular file and nothing else, at
-// once: a FIFO that nobody writes to, a device and a folder are refused, so
-// that the table ends as it does for a missing file.
+// The stand-in's file service, which opens the regular files of the tests
+// above, refuses at once a FIFO that nobody writes to, a device and a folder,
+// so that the table ends as it does for a missing file.
 TEST_F(Snapshot, OpensOnlyARegularFileAndNeverWaits) {
   void *services = orv::test::openLibrary(ORV_STANDIN_SYS_PATH);
   ASSERT_NE(services, nullptr) << orv::test::loaderError();
   const auto open =
       reinterpret_cast<decltype(&sqloopenp)>(orv::test::findExport(services, "sqloopenp"));
-  const auto close =
-      reinterpret_cast<decltype(&sqloclose)>(orv::test::findExport(services, "sqloclose"));
-  ASSERT_TRUE(open != nullptr && close != nullptr);
+  ASSERT_NE(open, nullptr);
   const std::string file = (dir / "tmp" / "cache.sql").string();
-  write(statement(numbered(1, "a")));
   CLI_fileHandle handle{};
-  ASSERT_EQ(open(file.c_str(), 20, 1024, &handle, 0), 0);
-  close(handle);
-
-  std::vector<std::pair<const char *, std::string>> refused = {
-      {"a folder", (dir / "tmp").string()},
-      {"a device", orv::test::aDevice()},
-      {"nothing", (dir / "missing").string()}};
-  fs::remove(file);
+  std::vector<std::pair<const char *, std::string>> refused = {{"a folder", (dir / "tmp").string()},
+                                                               {"a device", orv::test::aDevice()}};
   const bool fifo = orv::test::makeFifo(file);
   if (fifo) refused.emplace_back("a FIFO with no writer", file);
   auto opens = std::async(std::launch::async, [&] {
@@ -373,8 +351,6 @@ TEST_F(Snapshot, OpensOnlyARegularFileAndNeverWaits) {
   orv::test::closeLibrary(services);
 }
 
-// ---- Against the fake services -------------------------------------------
-
 // The same over a copy of the library linked to fake services (tests/fakes),
 // which fail where a test says and count what they are asked.
 class FakeSnapshot : public Snapshot {
@@ -392,8 +368,6 @@ class FakeSnapshot : public Snapshot {
     static_cast<void>(
         std::snprintf(fakes->instancePath, sizeof fakes->instancePath, "%s", dir.string().c_str()));
   }
-  // Rows until the table ends.
-  int rowCount() { return static_cast<int>(rows(200000).size()); }
   OrvFakes *fakes = nullptr;
 };
 
@@ -401,18 +375,18 @@ TEST_F(FakeSnapshot, EndsTheTableOnAFailedReadInEachStepOfTheSectionScan) {
   // Statement first, so that the scan skips it and goes back to it.
   const Statement st{{}, "s"};
   write(element(30, "") + statement(st) + element(321, "T") + element(322, "dd"));
-  ASSERT_EQ(rowCount(), 1);
+  ASSERT_EQ(rows().size(), 1u);
   // Reads in order: 30, the statement's header, 321 and its text, 322 and its
   // data, the statement's header again, the last byte of its data (to see
   // that the file holds it), then its data.
   for (int failing = 1; failing <= 9; ++failing) {
     fakes->reads = 0;
     fakes->failReadAt = failing;
-    EXPECT_EQ(rowCount(), 0) << "read " << failing;
+    EXPECT_TRUE(rows().empty()) << "read " << failing;
   }
   fakes->failReadAt = 0;
   fakes->seekFails = 1;
-  EXPECT_EQ(rowCount(), 0);
+  EXPECT_TRUE(rows().empty());
 }
 
 // A block that can't be had is logged and ends the table: one that the
@@ -478,7 +452,7 @@ TEST_F(FakeSnapshot, AllocatesOnlyForNewLargestStatements) {
     stream += statement({{}, std::string(static_cast<std::size_t>(size), 'q')});
   }
   write(stream);
-  EXPECT_EQ(rowCount(), 100000);
+  EXPECT_EQ(rows().size(), 100000u);
   EXPECT_EQ(fakes->allocations, expected);
   EXPECT_EQ(fakes->frees, expected);
 }
