@@ -128,11 +128,12 @@ TEST_F(Tables, ThreadsDeliverEachRowThenEndAndGiveTheTableBack) {
   EXPECT_EQ(fake.codes.size(), 2u);
 }
 
-// Status -3 on open is an empty table to FmpThreads and a failure to FmpRows.
-TEST_F(Tables, ReportFailedCallbacksWithTheirStatus) {
+// Status -3 on open is an empty table to FmpThreads and a failure to FmpRows,
+// whose 16-bit columns widen as unsigned.
+TEST_F(Tables, ReportFailedCallbacksWithTheirStatusAndRowsWidenTheirBytes) {
   fake.openStatus = -3;
-  fake.count = 5;
-  fake.table = words({0, 0, 0, 0});  // a table pointer left in the record
+  fake.count = 5;  // and a table pointer left in the record
+  fake.table = {1, 0, 0, 0, 2, 0, 0, 0, 0xFF, 0xFF, 4, 0, 0xFF, 0x80, 9, 9};
   EXPECT_EQ(run(true, CLI_CALL_OPEN).sqlstate, "");
   EXPECT_EQ(run(true, CLI_CALL_FETCH).sqlstate, "02000");
   run(true, CLI_CALL_CLOSE);
@@ -144,20 +145,15 @@ TEST_F(Tables, ReportFailedCallbacksWithTheirStatus) {
   const Call threads = run(true, CLI_CALL_OPEN);
   EXPECT_EQ(threads.sqlstate + "|" + threads.message, "38620|API call failed 5");
   fake.openStatus = 0;
+  fake.count = 1;
   fake.closeStatus = -2147483647 - 1;
   run(false, CLI_CALL_OPEN);
+  EXPECT_EQ(run(false, CLI_CALL_FETCH).row, (std::array<std::int64_t, 6>{1, 2, -1, 4, 255, 128}));
+  EXPECT_EQ(run(false, CLI_CALL_FETCH).sqlstate, "02000");
   const Call close = run(false, CLI_CALL_CLOSE);
   EXPECT_EQ(close.sqlstate + "|" + close.message, "38660|API call failed -2147483648");
   run(false, CLI_CALL_CLOSE);         // the pointer was cleared all the same
   EXPECT_EQ(fake.closed.size(), 2u);  // FmpThreads' and the first
-}
-
-TEST_F(Tables, RowsWidenTheirUnsignedBytes) {
-  fake.count = 1;
-  fake.table = {1, 0, 0, 0, 2, 0, 0, 0, 0xFF, 0xFF, 4, 0, 0xFF, 0x80, 9, 9};
-  run(false, CLI_CALL_OPEN);
-  EXPECT_EQ(run(false, CLI_CALL_FETCH).row, (std::array<std::int64_t, 6>{1, 2, -1, 4, 255, 128}));
-  EXPECT_EQ(run(false, CLI_CALL_FETCH).sqlstate, "02000");
 }
 
 // What each result indicator holds before a call, to see which of them
@@ -248,7 +244,7 @@ Statement numbered(std::int32_t base, std::string text) {
   return s;
 }
 
-TEST_F(Snapshot, DeliversEveryColumnOfEachStatement) {
+TEST_F(Snapshot, DeliversEveryColumnOfEachStatementAndPairsAtOddOffsets) {
   write(section("PKG1") + statement(numbered(100, "SELECT 1")) +
         statement(numbered(-200, std::string("x\0y", 3))));
   const std::vector<Row> got = rows();
@@ -260,6 +256,16 @@ TEST_F(Snapshot, DeliversEveryColumnOfEachStatement) {
   for (std::size_t i = 0; i < 18; ++i) {
     EXPECT_EQ(got[0].indicators[i], i == 16 ? 0x5A5A : 0) << "column " << i + 1;
   }
+  // Elements lie packed at any byte offset: a pair element behind an unknown
+  // one of odd length still gives its two children.
+  std::string pair =
+      element(300, std::string("\x05\0\0\0", 4)) + element(301, std::string("\x06\0\0\0", 4));
+  write(element(19, element(9999, "odd") + element(229, pair) + element(312, "s")));
+  const std::vector<Row> odd = rows();
+  ASSERT_EQ(odd.size(), 1u);
+  EXPECT_EQ(odd[0].columns[10], 5);
+  EXPECT_EQ(odd[0].columns[11], 6);
+  EXPECT_EQ(odd[0].statement, "s");
 }
 
 // Streams that break their limits end the table; nothing outside the
@@ -295,19 +301,6 @@ TEST_F(Snapshot, ReadsSectionsInEveryOrderAndEndsOnHostileStreams) {
     write(c.stream);
     EXPECT_EQ(texts(), c.want);
   }
-}
-
-// Elements lie packed at any byte offset: a pair element behind an unknown
-// one of odd length still gives its two children.
-TEST_F(Snapshot, ReadsPairsAtOddOffsets) {
-  std::string pair =
-      element(300, std::string("\x05\0\0\0", 4)) + element(301, std::string("\x06\0\0\0", 4));
-  write(element(19, element(9999, "odd") + element(229, pair) + element(312, "s")));
-  const std::vector<Row> got = rows();
-  ASSERT_EQ(got.size(), 1u);
-  EXPECT_EQ(got[0].columns[10], 5);
-  EXPECT_EQ(got[0].columns[11], 6);
-  EXPECT_EQ(got[0].statement, "s");
 }
 
 TEST_F(Snapshot, EndsTheTableWhenTheFileCannotBeFound) {
