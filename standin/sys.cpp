@@ -12,6 +12,7 @@
 #include <string>
 
 #include "engine/services.h"
+#include "files.hpp"
 #include "platform.hpp"
 #include "services_data.hpp"
 
@@ -115,14 +116,6 @@ void putPointer(unsigned char *at, const void *pointer) {
 }
 
 // ---- Files ---------------------------------------------------------------
-
-// The handle holds a buffered C stream, so that the many small reads of a
-// snapshot cost no system call each.
-std::FILE *streamOf(const CLI_fileHandle &handle) {
-  std::FILE *f = nullptr;
-  std::memcpy(&f, handle.bytes, sizeof(std::FILE *));
-  return f;
-}
 
 }  // namespace
 
@@ -234,25 +227,18 @@ int32_t sqleinstancepath(int32_t, char *path) {
 }
 
 int32_t sqloopenp(const char *path, int32_t, int32_t, CLI_fileHandle *handle, int32_t) {
-  std::FILE *f = orv::standin::openRegularFile(path);
-  if (f == nullptr) return 1;
-  std::memset(handle->bytes, 0, sizeof handle->bytes);
-  std::memcpy(handle->bytes, &f, sizeof(std::FILE *));
-  return 0;
+  return orv::standin::openFile(path, handle);
 }
 
 int32_t sqloread(CLI_fileHandle handle, void *destination, uint32_t count, uint32_t *read) {
-  const std::size_t done = count == 0 ? 0 : std::fread(destination, 1, count, streamOf(handle));
-  if (read != nullptr) *read = static_cast<uint32_t>(done);
-  return done == count ? 0 : 1;
+  return orv::standin::readFile(handle, destination, count, read);
 }
 
 int32_t sqlochgfileptr(CLI_fileHandle handle, int64_t offset, int32_t origin, int32_t) {
-  const int whence = origin == 0 ? SEEK_SET : origin == 2 ? SEEK_END : SEEK_CUR;
-  return orv::standin::seek(streamOf(handle), offset, whence) != 0 ? 1 : 0;
+  return orv::standin::moveIn(handle, offset, origin);
 }
 
-int32_t sqloclose(CLI_fileHandle handle) { return std::fclose(streamOf(handle)) == 0 ? 0 : 1; }
+int32_t sqloclose(CLI_fileHandle handle) { return orv::standin::closeFile(handle); }
 
 int32_t sqlogmblkEx(void *, uint64_t size, int32_t, void **block, const char *, int32_t, int32_t) {
   void *p = std::malloc(size == 0 ? 1 : size);

@@ -7,17 +7,11 @@
 #include <cstdlib>
 #include <cstring>
 
-#include "support/platform.hpp"
+#include "files.hpp"
 
 namespace {
 
 OrvFakes fakes;
-
-int descriptorOf(const CLI_fileHandle &handle) {
-  int fd = -1;
-  std::memcpy(&fd, handle.bytes, sizeof fd);
-  return fd;
-}
 
 // The chain from the static data to the snapshot name "cache".
 struct StaticData {
@@ -108,12 +102,11 @@ int32_t sqleinstancepath(int32_t, char *path) {
   return fakes.instanceStatus;
 }
 
+// The files are the stand-in's; the fakes count and fail.
 int32_t sqloopenp(const char *path, int32_t, int32_t, CLI_fileHandle *handle, int32_t) {
-  const int fd = orv::test::openForReading(path);
-  if (fd < 0) return 1;
-  ++fakes.opens;
-  std::memcpy(handle->bytes, &fd, sizeof fd);
-  return 0;
+  const int32_t status = orv::standin::openFile(path, handle);
+  if (status == 0) ++fakes.opens;
+  return status;
 }
 
 // Stores the bytes read through its last argument, as the engine's service
@@ -121,19 +114,17 @@ int32_t sqloopenp(const char *path, int32_t, int32_t, CLI_fileHandle *handle, in
 int32_t sqloread(CLI_fileHandle handle, void *out, uint32_t count, uint32_t *read) {
   *read = 0;
   if (++fakes.reads == fakes.failReadAt) return 1;
-  const bool whole = orv::test::readExactly(descriptorOf(handle), out, count);
-  *read = whole ? count : 0;
-  return whole ? 0 : 1;
+  return orv::standin::readFile(handle, out, count, read);
 }
 
-int32_t sqlochgfileptr(CLI_fileHandle handle, int64_t offset, int32_t, int32_t) {
+int32_t sqlochgfileptr(CLI_fileHandle handle, int64_t offset, int32_t origin, int32_t) {
   if (fakes.seekFails != 0) return 1;
-  return orv::test::seekBy(descriptorOf(handle), offset) ? 0 : 1;
+  return orv::standin::moveIn(handle, offset, origin);
 }
 
 int32_t sqloclose(CLI_fileHandle handle) {
   ++fakes.closes;
-  return orv::test::closeFile(descriptorOf(handle));
+  return orv::standin::closeFile(handle);
 }
 
 int32_t sqlogmblkEx(void *, uint64_t size, int32_t, void **block, const char *, int32_t, int32_t) {

@@ -1,6 +1,9 @@
 #include "support/platform.hpp"
 
+#include <fcntl.h>
+
 #if defined(_WIN32)
+#include <io.h>
 #include <process.h>
 #include <windows.h>
 #else
@@ -8,6 +11,7 @@
 #include <link.h>
 #include <sys/mman.h>
 #include <sys/stat.h>
+#include <unistd.h>
 #endif
 
 #include <algorithm>

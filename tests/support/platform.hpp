@@ -1,18 +1,11 @@
 // What the tests do differently by platform, in one place: loading the
 // library and finding its exports by name (dlopen and dlsym, or
 // LoadLibraryA and GetProcAddress on Windows), the environment, the
-// process id, and the raw file calls of the fake services.
+// process id, devices and FIFOs, and memory before a guard page.
 #pragma once
 
-#include <fcntl.h>
-
-#include <cstdint>
+#include <cstddef>
 #include <string>
-#if defined(_WIN32)
-#include <io.h>
-#else
-#include <unistd.h>
-#endif
 
 namespace orv::test {
 
@@ -64,27 +57,5 @@ class BytesBeforeAGuardPage {
   unsigned char *pages_;
   std::size_t page_;
 };
-
-// The raw file calls of the fake services, header-only since they link
-// nothing of the tests: open for binary reading (-1 on failure), read
-// exactly `count` bytes, move the position by `offset` from where it is,
-// close.
-#if defined(_WIN32)
-inline int openForReading(const char *path) { return ::_open(path, _O_RDONLY | _O_BINARY); }
-inline bool readExactly(int fd, void *out, std::uint32_t count) {
-  return ::_read(fd, out, count) == static_cast<int>(count);
-}
-inline bool seekBy(int fd, std::int64_t offset) { return ::_lseeki64(fd, offset, SEEK_CUR) >= 0; }
-inline int closeFile(int fd) { return ::_close(fd); }
-#else
-inline int openForReading(const char *path) { return ::open(path, O_RDONLY | O_CLOEXEC); }
-inline bool readExactly(int fd, void *out, std::uint32_t count) {
-  return ::read(fd, out, count) == static_cast<ssize_t>(count);
-}
-inline bool seekBy(int fd, std::int64_t offset) {
-  return ::lseek(fd, static_cast<off_t>(offset), SEEK_CUR) >= 0;
-}
-inline int closeFile(int fd) { return ::close(fd); }
-#endif
 
 }  // namespace orv::test
