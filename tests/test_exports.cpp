@@ -301,7 +301,6 @@ TEST(Concurrency, EightThreadsGiveWhatOneThreadGives) {
   ASSERT_GT(cases.size(), 500U);
 
   std::vector<Outcome> expected;
-  expected.reserve(cases.size());
   std::size_t failures = 0;
   for (const Case &c : cases) {
     expected.push_back(c.run());
@@ -321,8 +320,7 @@ TEST(Concurrency, EightThreadsGiveWhatOneThreadGives) {
       for (std::size_t pass = 0; pass < 2 || std::chrono::steady_clock::now() < until; ++pass) {
         for (std::size_t k = 0; k < cases.size(); ++k) {
           const std::size_t i = (k + t * cases.size() / kThreads) % cases.size();
-          const bool same = cases[i].run() == expected[i];
-          if (!same && firstMismatch[t].empty()) {
+          if (cases[i].run() != expected[i] && firstMismatch[t].empty()) {
             firstMismatch[t] = std::string(cases[i].routine->symbol) + " case " + std::to_string(i);
           }
         }

@@ -47,7 +47,6 @@ TEST(NumericRoutines, KeepTheirEdges) {
     std::vector<Value> in;
     Outcome want;
   } cases[] = {
-      // ABS, SIGN, MOD, FLOOR and CEILING.
       {"CLI_udfABS4", {i64(-kMax64)}, okInt(kMax64)},
       {"CLI_udfABS4", {i64(kMin64)}, fails("01")},
       {"CLI_udfABS2", {i32(kMin32)}, fails("01")},
@@ -76,7 +75,6 @@ TEST(NumericRoutines, KeepTheirEdges) {
       {"CLI_udfCEILING2", {i32(kMin32)}, okInt(kMin32)},
       {"CLI_udfFLOOR2", {i32(kMax32)}, okInt(kMax32)},
       {"CLI_udfCEILING3", {i16(-32768)}, okInt(-32768)},
-      // ROUND and TRUNCATE.
       {"CLI_udfROUND1", {f64(1250.0), i32(-2)}, okReal(1300.0)},
       {"CLI_udfROUND1", {f64(-0.5), i32(0)}, okReal(-1.0)},
       {"CLI_udfROUND1", {f64(0.125), i32(2)}, okReal(0.12)},
@@ -98,7 +96,6 @@ TEST(NumericRoutines, KeepTheirEdges) {
       {"CLI_udfTRUNCATE2", {i32(kMax32), i32(-10)}, okInt(0)},
       {"CLI_udfTRUNCATE2", {i32(5), i32(-309)}, fails("03")},
       {"CLI_udfROUND5", {i64(4999999999999999999), i32(-19)}, okInt(0)},
-      // POWER.
       {"CLI_udfPOWER1", {f64(0.0), f64(0.0)}, okReal(1.0)},
       {"CLI_udfPOWER1", {f64(kNaN), f64(0.0)}, okReal(1.0)},
       {"CLI_udfPOWER1", {f64(-0.0), f64(-1.0)}, fails("01")},
@@ -125,7 +122,6 @@ TEST(NumericRoutines, KeepTheirEdges) {
       {"CLI_udfPOWER4", {i64(0), i64(0)}, fails("01")},
       {"CLI_udfPOWER4", {i64(-1), i64(kMax64)}, okInt(-1)},
       {"CLI_udfPOWER4", {i64(-1), i64(kMax64 - 1)}, okInt(1)},
-      // The elementary functions.
       {"CLI_udfSQRT", {f64(-0.0)}, okReal(-0.0)},
       {"CLI_udfSQRT", {f64(-kTiny)}, fails("01")},
       {"CLI_udfSQRT", {f64(kNaN)}, okReal(kNaN)},
@@ -178,34 +174,20 @@ i128 tenTo(int k) {
 }
 bool fits64(i128 v) { return v >= kMin64 && v <= kMax64; }
 
-// ROUND and TRUNCATE of 64-bit integers as the contract tells them: strip
-// one digit at a time, then round on the digit stripped last.
+// ROUND and TRUNCATE of 64-bit integers in exact arithmetic: x cut toward
+// zero to a multiple of 10^-n, and for ROUND one multiple further from zero
+// when the highest digit cut off is 5 or more.
 Outcome roundModel(std::int64_t x, std::int32_t n) {
   if (n >= 0) return ok(x);
-  if (n < -19) return ok(std::int64_t{0});
-  i128 v = x, scale = 1, last = 0;
-  std::int32_t i = 0;
-  for (; v != 0 && i > n; --i) {
-    last = v % 10;
-    v /= 10;
-    scale *= 10;
-  }
-  if (i != n) return ok(std::int64_t{0});
-  if (last < 5 && last > -5) return ok(static_cast<std::int64_t>(n == -19 ? 0 : scale * v));
-  if (n == -19) return fails("03");
-  const i128 r = scale * (v + (x < 0 ? -1 : 1));
+  const i128 unit = tenTo(-n - 1), scale = unit * 10, below = x / unit % 10;
+  const i128 r = scale * (x / scale + (below >= 5 ? 1 : below <= -5 ? -1 : 0));
   return fits64(r) ? ok(static_cast<std::int64_t>(r)) : fails("03");
 }
 
 Outcome truncateModel(std::int64_t x, std::int32_t n) {
   if (n >= 0) return ok(x);
-  if (n <= -19) return ok(std::int64_t{0});
-  i128 v = x, scale = 1;
-  for (std::int32_t i = 0; i > n && v != 0; --i) {
-    v /= 10;
-    scale *= 10;
-  }
-  return ok(static_cast<std::int64_t>(v * scale));
+  const i128 scale = tenTo(-n);
+  return ok(static_cast<std::int64_t>(x / scale * scale));
 }
 
 Outcome powerModel(std::int64_t x, std::int64_t y) {

@@ -50,14 +50,11 @@ class SqliteHost : public ::testing::Test {
   sqlite3 *db_ = nullptr;
 };
 
-struct Case {
-  const char *sql;
-  const char *expected;
-};
-
 // Each query's first value, or its error as SQLite reports it.
 TEST_F(SqliteHost, AnswersQueries) {
-  const Case cases[] = {
+  const struct {
+    const char *sql, *expected;
+  } cases[] = {
       // Under sysfun_ names, plain names and each export's own name.
       {"SELECT sysfun_repeat('ab', 3) || SPACE(2) || 'x' || LCASE('ABC')", "ababab  xabc"},
       {R"(SELECT "LEFT"('abcdef', 3) || "RIGHT"('abc', 5) || '|')", "abcabc  |"},
@@ -189,7 +186,7 @@ TEST_F(SqliteHost, AnswersQueries) {
        "AND builtin = 0",
        "0"},
   };
-  for (const Case &c : cases) EXPECT_EQ(eval(c.sql), c.expected) << c.sql;
+  for (const auto &c : cases) EXPECT_EQ(eval(c.sql), c.expected) << c.sql;
 }
 
 // A constant seed seeds once per statement: each statement repeats the
