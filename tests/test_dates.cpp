@@ -112,7 +112,6 @@ TEST(DateNumbers, AgreeWithChronoOnEveryDateOfTheCalendar) {
 }
 
 TEST(DateText, IsTrimmedInTheCallersBuffer) {
-  ASSERT_NE(exportAddress("CLI_udfWEEK2"), nullptr);
   for (const char *input : {"2001-12-31  ", "2001-13-31  "}) {
     char buffer[16] = {};
     std::memcpy(buffer, input, std::strlen(input) + 1);
@@ -120,7 +119,6 @@ TEST(DateText, IsTrimmedInTheCallersBuffer) {
     EXPECT_EQ(std::string(buffer, 12), std::string(input, 10) + std::string("\0 ", 2)) << input;
   }
   // TIMESTAMPDIFF reads its duration as it stands and leaves it so.
-  ASSERT_NE(exportAddress("CLI_udfTIMESTAMPDIFF"), nullptr);
   char duration[] = "1.5  ";
   EXPECT_EQ(call("CLI_udfTIMESTAMPDIFF", {i32(2), placedAt(duration)}, intArea()).number, 1);
   EXPECT_EQ(std::string(duration, sizeof duration), std::string("1.5  ", sizeof duration));

@@ -97,7 +97,6 @@ Surface exportsOf(const unsigned char *base) {
 
 #else
 
-// A value at `offset` of `bytes`, or zero beyond their end.
 template <typename T>
 T readAt(const std::vector<char> &bytes, std::uint64_t offset) {
   T value{};
@@ -232,7 +231,6 @@ std::vector<Value> poolFor(const cat::Slot &slot) {
   return pool;
 }
 
-// The area of a result slot, as the catalogue sizes it.
 Value areaFor(const cat::Slot &slot) {
   const cat::Layout layout = slot.layout;
   if (layout == cat::Layout::text) return textArea(slot.size + 1);

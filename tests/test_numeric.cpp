@@ -30,7 +30,6 @@ bool isNaN(const Outcome &o) { return o.real && std::isnan(std::bit_cast<double>
 
 Outcome okInt(std::int64_t v) { return ok(v); }
 
-// A call whose result has its first input's layout, as every result here has.
 Outcome run(const char *routine, const std::vector<Value> &in) {
   return call(routine, in, numberArea(in[0].layout));
 }
@@ -119,7 +118,6 @@ TEST(NumericRoutines, KeepTheirEdges) {
       {"CLI_udfPOWER3", {i32(0), i32(-1)}, fails("01")},
       {"CLI_udfPOWER3", {i32(10), i32(-300)}, okInt(0)},
       {"CLI_udfPOWER3", {i32(10), i32(-400)}, fails("03")},
-      {"CLI_udfPOWER4", {i64(0), i64(0)}, fails("01")},
       {"CLI_udfPOWER4", {i64(-1), i64(kMax64)}, okInt(-1)},
       {"CLI_udfPOWER4", {i64(-1), i64(kMax64 - 1)}, okInt(1)},
       {"CLI_udfSQRT", {f64(-0.0)}, okReal(-0.0)},

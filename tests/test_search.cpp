@@ -53,7 +53,6 @@ TEST(LocateReplaceInsert, KeepTheirLimits) {
       "10");
 }
 
-// The models of tests/models/search.hpp, as outcomes.
 Outcome inserted(bool lobForm, const std::string &in, std::int64_t p, std::int64_t l,
                  const std::string &add, std::int64_t limit) {
   const orv::model::Inserted r = orv::model::insert(lobForm, in, p, l, add, limit);
@@ -122,7 +121,6 @@ TEST(LocateReplaceInsert, AgreeWithNaiveModelsOnSmallAlphabets) {
 
 // ---- The search on every filter kernel, and REPLACE at scale -------------
 
-// The filter kernels that run on this machine.
 std::vector<const cli::str::FilterKernel *> kernelsHere() {
   std::vector<const cli::str::FilterKernel *> out = {&cli::str::kPortableKernel};
 #if defined(__x86_64__) || defined(_M_X64)

@@ -15,15 +15,21 @@
 
 namespace {
 
+// A connection of its own with the extension loaded: "", or why not.
+std::string connect(sqlite3 *&db) {
+  char *error = nullptr;
+  const bool loaded =
+      sqlite3_open(":memory:", &db) == SQLITE_OK &&
+      sqlite3_enable_load_extension(db, 1) == SQLITE_OK &&
+      sqlite3_load_extension(db, ORV_SQLITE_HOST_PATH, nullptr, &error) == SQLITE_OK;
+  std::string why = loaded ? "" : error != nullptr ? error : "not loaded";
+  sqlite3_free(error);
+  return why;
+}
+
 class SqliteHost : public ::testing::Test {
  protected:
-  void SetUp() override {
-    ASSERT_EQ(sqlite3_open(":memory:", &db_), SQLITE_OK);
-    sqlite3_enable_load_extension(db_, 1);
-    char *error = nullptr;
-    ASSERT_EQ(sqlite3_load_extension(db_, ORV_SQLITE_HOST_PATH, nullptr, &error), SQLITE_OK)
-        << (error != nullptr ? error : "");
-  }
+  void SetUp() override { ASSERT_EQ(connect(db_), ""); }
   void TearDown() override { sqlite3_close(db_); }
 
   // The first column of the first row as text ("NULL" for NULL), or
@@ -50,7 +56,6 @@ class SqliteHost : public ::testing::Test {
   sqlite3 *db_ = nullptr;
 };
 
-// Each query's first value, or its error as SQLite reports it.
 TEST_F(SqliteHost, AnswersQueries) {
   const struct {
     const char *sql, *expected;
@@ -237,15 +242,10 @@ TEST(SqliteHostThreads, LoadOnNewConnectionsWhileOthersRunTableFunctions) {
   const auto work = [&](bool query) {
     for (int k = 0; k < 20; ++k) {
       sqlite3 *db = nullptr;
-      char *error = nullptr;
-      const bool loaded =
-          sqlite3_open(":memory:", &db) == SQLITE_OK &&
-          sqlite3_enable_load_extension(db, 1) == SQLITE_OK &&
-          sqlite3_load_extension(db, ORV_SQLITE_HOST_PATH, nullptr, &error) == SQLITE_OK;
-      if (!loaded || (query && sqlite3_exec(db, queries, nullptr, nullptr, nullptr) != SQLITE_OK)) {
+      if (!connect(db).empty() ||
+          (query && sqlite3_exec(db, queries, nullptr, nullptr, nullptr) != SQLITE_OK)) {
         ++failures;
       }
-      sqlite3_free(error);
       sqlite3_close(db);
     }
   };

@@ -86,7 +86,6 @@ TEST(BasicStrings, AgreeWithSmallModelsOnRandomInputs) {
   const auto pick = [&](int lo, int hi) {
     return std::uniform_int_distribution<int>(lo, hi)(random);
   };
-  // Each routine, and whether it takes and gives CLI_udfLob strings.
   const std::pair<std::string, bool> routines[] = {
       {"CLI_udfLCASE1", false}, {"CLI_udfLCASE2", true},   {"CLI_udfRTRIM1", false},
       {"CLI_udfRTRIM2", true},  {"CLI_udfLTRIM1", false},  {"CLI_udfLTRIM2", true},
