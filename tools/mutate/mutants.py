@@ -403,6 +403,25 @@ def _operator_sites(masked, line):
     return found
 
 
+def _bracket_edge(masked, at, step):
+    """Where the parentheses around `at` open (step -1) or close (step 1) on this line.
+
+    Returns the position just inside that bracket, and whether there is one.
+    """
+    deeper, edge = ("([", ")]") if step > 0 else (")]", "([")
+    depth, i = 0, at
+    while (i < len(masked)) if step > 0 else (i > 0):
+        c = masked[i] if step > 0 else masked[i - 1]
+        if c in deeper:
+            depth += 1
+        elif c in edge:
+            if depth == 0:
+                return i, True
+            depth -= 1
+        i += step
+    return i, False
+
+
 def _logical_group(masked, at):
     """The positions of the `&&` or `||` operators of the chain that holds the one at `at`.
 
@@ -412,28 +431,8 @@ def _logical_group(masked, at):
     is turned.  None for a chain that goes on over another line, or one
     that mixes both operators (they stand only parenthesised here).
     """
-    depth, start, opened = 0, at, False
-    while start > 0:
-        c = masked[start - 1]
-        if c in ")]":
-            depth += 1
-        elif c in "([":
-            if depth == 0:
-                opened = True
-                break
-            depth -= 1
-        start -= 1
-    depth, end, closed = 0, at, False
-    while end < len(masked):
-        c = masked[end]
-        if c in "([":
-            depth += 1
-        elif c in ")]":
-            if depth == 0:
-                closed = True
-                break
-            depth -= 1
-        end += 1
+    start, opened = _bracket_edge(masked, at, -1)
+    end, closed = _bracket_edge(masked, at, 1)
     if opened != closed or (not opened and not masked.rstrip().endswith((";", "{"))):
         return None  # the chain goes on over another line
     links, depth = [], 0
