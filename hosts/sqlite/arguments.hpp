@@ -11,6 +11,7 @@
 #include <cstdint>
 #include <cstring>
 #include <limits>
+#include <string>
 #include <type_traits>
 
 #include "catalogue/catalogue.hpp"
@@ -118,19 +119,21 @@ inline void failNotText(const Call &c, int i) {
   const Argument &a = c.arguments[static_cast<std::size_t>(i)];
   const char *label = c.function.label.c_str();
   const char *name = c.function.argumentNames[static_cast<std::size_t>(i)];
-  const char *hint = c.function.longerForm.c_str();
+  const std::string hint =
+      c.function.longerForm.empty() ? "" : "; " + c.function.longerForm + " takes such strings";
   if (a.type == SQLITE_BLOB) {
     fail(c.context, "%s: argument %d (%s) is a BLOB, and the function takes text only%s", label,
-         i + 1, name, hint);
+         i + 1, name, hint.c_str());
   } else if (a.size > kTextLimit) {
     fail(c.context,
          "%s: argument %d (%s) is %lld bytes long, and the function takes text of at most %d "
          "bytes%s",
-         label, i + 1, name, static_cast<long long>(a.size), static_cast<int>(kTextLimit), hint);
+         label, i + 1, name, static_cast<long long>(a.size), static_cast<int>(kTextLimit),
+         hint.c_str());
   } else {
     fail(c.context,
          "%s: argument %d (%s) holds a NUL byte, and the function takes text without NUL bytes%s",
-         label, i + 1, name, hint);
+         label, i + 1, name, hint.c_str());
   }
 }
 

@@ -48,8 +48,8 @@ struct Function {
   bool handlesNull;
   std::array<int, 16> formFor;  // row to call for each KindMask
   std::array<const char *, cli::catalogue::kMaxInputs> argumentNames{};
-  // For an export called by its own name: "; sysfun_lcase2 takes longer
-  // strings", naming the CLI_udfLob export of the same function, if any.
+  // For an export called by its own name: the SQL name of the CLI_udfLob
+  // export of the same function ("sysfun_lcase2"), if there is one.
   std::string longerForm;
 };
 

@@ -10,6 +10,7 @@ SQLITE_EXTENSION_INIT3
 #include <cstdint>
 #include <cstring>
 #include <new>
+#include <string>
 #include <tuple>
 #include <utility>
 
@@ -32,8 +33,13 @@ void reportStatus(const Call &c, const cli::call::StatusBuffers &status) {
   const char *label = c.function.label.c_str();
   if (const cli::Sysfun code = cli::call::sysfunIn(status.sqlstate, status.message);
       code != cli::Sysfun::none) {
-    fail(c.context, "%s: SQLSTATE 38552, SYSFUN:%s: %s", label, cli::textOf(code).digits,
-         cli::wordsOf(code));
+    // A result or operand too long for terminated text fits the CLI_udfLob
+    // export of the same function, if the caller named this one.
+    const std::string hint = code == cli::Sysfun::tooLong && !c.function.longerForm.empty()
+                                 ? "; " + c.function.longerForm + " takes longer strings"
+                                 : "";
+    fail(c.context, "%s: SQLSTATE 38552, SYSFUN:%s: %s%s", label, cli::textOf(code).digits,
+         cli::wordsOf(code), hint.c_str());
   } else {
     fail(c.context, "%s: SQLSTATE %.5s: %.*s", label, status.sqlstate,
          static_cast<int>(sizeof status.message - 1), status.message);

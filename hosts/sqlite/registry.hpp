@@ -136,15 +136,15 @@ inline std::vector<Group> groups() {
 }
 
 // For an export called by its own name that takes terminated text: where
-// the function has a CLI_udfLob export of the same arguments, the words
-// that point to it, "; sysfun_lcase2 takes such strings"; otherwise empty.
+// the function has a CLI_udfLob export of the same arguments, that
+// export's SQL name ("sysfun_lcase2"); otherwise empty.
 inline std::string longerForm(const Group &g) {
   if (!g.plainName.empty() || g.rows.size() != 1) return "";
   const Routine &own = kRoutines[g.rows[0]];
   for (const Routine &r : kRoutines) {
     if (std::string_view(r.sqlName) != own.sqlName || inputCount(r) != inputCount(own)) continue;
     for (std::size_t i = 0; i < inputCount(r); ++i) {
-      if (r.inputs[i].layout == Layout::lob) return "; " + exportName(r) + " takes such strings";
+      if (r.inputs[i].layout == Layout::lob) return exportName(r);
     }
   }
   return "";
