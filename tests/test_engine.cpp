@@ -214,16 +214,6 @@ TEST(VeblobCopy, RoundTripsThroughManyCodePagesInTurn) {
   }
 }
 
-TEST(VeblobCopy, GivesASeveralByteCodePageTwiceTheRoom) {
-#if defined(_WIN32)
-  GTEST_SKIP() << "EUC-JP (954) needs ICU, which the Windows stand-ins do without";
-#endif
-  // Factor 2 (EUC-JP to UTF-8) on a string of 400000 bytes fits only LARGE.
-  const std::string big = record(0xCB, std::string(400000, 'a'));
-  EXPECT_EQ(copy(lob(big), 954, 1208), copied(big));
-  EXPECT_EQ(copy(lob(big), 954, 1208, 0, kSmall), refused("38601"));
-}
-
 // A copy of the library linked to fake services (tests/fakes), for what
 // the routines hand each service and what they do when it fails.
 class Fakes : public ::testing::Test {
@@ -305,20 +295,40 @@ TEST_F(Fakes, NumberTextHandsOverTheTrimmedLengthAndShortensTheRawText) {
   }
 }
 
-TEST_F(Fakes, VeblobTakesPositiveStatusesAsSuccessAndAsksTheEncodingClass) {
+TEST_F(Fakes, VeblobTakesPositiveStatusesAsSuccess) {
   fakes->convertStatus = 4;
   EXPECT_EQ(copy(lob(record(0xCB, "sss")), 819, 1208), copied(record(0xCB, "sss")));
   EXPECT_EQ(fakes->lastRecord.space, 30u);  // the object's size
-  // UTF-16 to a class-2 code page may not grow (factor 1); to another class
-  // it may double (factor 2): 300000 bytes then pass SMALL's room test or not.
-  const std::string big = record(0xCB, std::string(300000, 's'));
-  fakes->convertStatus = 0;
-  fakes->encodingClass = 2;
-  EXPECT_EQ(copy(lob(big), 1200, 37, 0, kSmall), copied(big));
-  fakes->encodingClass = 1;
-  const int calls = fakes->convertCalls;
-  EXPECT_EQ(copy(lob(big), 1200, 37, 0, kSmall), refused("38601"));
-  EXPECT_EQ(fakes->convertCalls, calls);  // refused before converting
+}
+
+// The room a copy asks for is the string's length times the factor of its
+// pair of code pages (for a UTF-16 or 1232/1234 source, by the target's
+// encoding class).  SMALL holds 500000 bytes and a one-record object's data
+// starts at byte 27, so with the fake conversion, which copies, n bytes fit
+// while 27 + n * factor < 500000; one more is refused before converting.
+TEST_F(Fakes, VeblobAsksForTheRoomOfEachPairOfCodePages) {
+  const struct {
+    std::int32_t from, to, encodingClass, factor;
+  } pairs[] = {
+      {1208, 1208, 1, 1}, {37, 0, 1, 1},       {0, 1208, 1, 1},     {1208, 819, 1, 2},
+      {1208, 1200, 1, 2}, {1208, 1234, 1, 1},  {1208, 37, 1, 3},    {819, 1208, 1, 1},
+      {1252, 1200, 1, 1}, {954, 1208, 1, 2},   {964, 37, 1, 2},     {1200, 13488, 1, 1},
+      {1202, 1204, 1, 1}, {1200, 37, 2, 1},    {17586, 37, 9, 1},   {1200, 37, 1, 2},
+      {1232, 1202, 1, 2}, {1234, 1204, 1, 2},  {1232, 1236, 1, 1},  {1232, 37, 2, 2},
+      {1234, 37, 1, 4},   {1392, 1208, 1, 4},  {5488, 17584, 1, 2}, {1392, 1204, 1, 2},
+      {5488, 37, 1, 1},   {932, 1208, 1, 2},   {5039, 37, 1, 1},    {437, 1208, 1, 1},
+  };
+  for (const auto &p : pairs) {
+    fakes->encodingClass = p.encodingClass;
+    const std::size_t longest = 499972 / static_cast<std::size_t>(p.factor);
+    const std::string fits = record(0xCB, std::string(longest, 's'));
+    EXPECT_EQ(copy(lob(fits), p.from, p.to, 0, kSmall), copied(fits)) << p.from << " to " << p.to;
+    const int calls = fakes->convertCalls;
+    EXPECT_EQ(copy(lob(record(0xCB, std::string(longest + 1, 's'))), p.from, p.to, 0, kSmall),
+              refused("38601"))
+        << p.from << " to " << p.to;
+    EXPECT_EQ(fakes->convertCalls, calls);
+  }
 }
 
 }  // namespace

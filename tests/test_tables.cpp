@@ -303,11 +303,17 @@ TEST_F(Snapshot, ReadsSectionsInEveryOrderAndEndsOnHostileStreams) {
   }
 }
 
+// The file's path is composed in 256 bytes: a path of 255 characters is
+// read, and a longer one is no file at all, never the file that its first
+// 255 characters would name.
 TEST_F(Snapshot, EndsTheTableWhenTheFileCannotBeFound) {
-  write(statement(numbered(1, "a")));
-  for (const std::string &name : {std::string(300, 'n'), std::string("missing")}) {
-    orv::test::setEnvironment("ORVENGINE_SNAPSHOT_NAME", name.c_str());  // 300: no room in the path
-    EXPECT_TRUE(texts().empty()) << name;
+  const std::size_t room = 255 - (dir / "tmp" / ".sql").string().size();
+  const std::string fits(room, 'n'), over(room + 1, 'n'), stream = statement(numbered(1, "a"));
+  std::ofstream(dir / "tmp" / (fits + ".sql"), std::ios::binary) << stream;
+  std::ofstream(dir / "tmp" / (over + ".sq"), std::ios::binary) << stream;  // the cut path
+  for (const auto &[name, rows] : {std::pair{fits, 1u}, {over, 0u}, {std::string("missing"), 0u}}) {
+    orv::test::setEnvironment("ORVENGINE_SNAPSHOT_NAME", name.c_str());
+    EXPECT_EQ(texts().size(), rows) << name.size();
   }
 }
 
