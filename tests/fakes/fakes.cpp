@@ -7,6 +7,7 @@
 #include <cstdlib>
 #include <cstring>
 
+#include "elements.hpp"
 #include "files.hpp"
 
 namespace {
@@ -149,17 +150,7 @@ void sqlt_logerr_data(const char *message, const void *data, int32_t size, int32
 void sqlm_filter_file_name(char *) {}
 
 const sqlm_header_info *sqlm_find_element(uint32_t element, const sqlm_header_info *parent) {
-  const auto *data = reinterpret_cast<const unsigned char *>(parent) + 8;
-  uint64_t left = parent->size;
-  while (left >= 8) {
-    sqlm_header_info child;
-    std::memcpy(&child, data, sizeof child);
-    if (8 + uint64_t{child.size} > left) return nullptr;
-    if (child.element == element) return reinterpret_cast<const sqlm_header_info *>(data);
-    data += 8 + child.size;
-    left -= 8 + child.size;
-  }
-  return nullptr;
+  return orv::standin::findElement(element, parent);
 }
 
 int32_t sqlnls_Encoding2(uint32_t, int32_t) { return fakes.encodingClass; }
