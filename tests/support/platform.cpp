@@ -1,7 +1,5 @@
 #include "support/platform.hpp"
 
-#include <fcntl.h>
-
 #if defined(_WIN32)
 #include <io.h>
 #include <process.h>
@@ -50,8 +48,6 @@ const char *aDevice() { return "NUL"; }
 
 bool makeFifo(const std::string &) { return false; }
 
-void letAWriterIn(const std::string &) {}
-
 BytesBeforeAGuardPage::BytesBeforeAGuardPage() {
   SYSTEM_INFO info;
   ::GetSystemInfo(&info);
@@ -94,11 +90,6 @@ int processId() { return static_cast<int>(::getpid()); }
 const char *aDevice() { return "/dev/null"; }
 
 bool makeFifo(const std::string &path) { return ::mkfifo(path.c_str(), 0600) == 0; }
-
-void letAWriterIn(const std::string &path) {
-  const int fd = ::open(path.c_str(), O_WRONLY | O_NONBLOCK | O_CLOEXEC);
-  if (fd >= 0) ::close(fd);
-}
 
 BytesBeforeAGuardPage::BytesBeforeAGuardPage()
     : page_(static_cast<std::size_t>(::sysconf(_SC_PAGESIZE))) {
