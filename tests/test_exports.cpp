@@ -1,17 +1,10 @@
-// The library against its catalogue.
-//
-// Its exports are exactly the routines that the catalogue lists, each in
-// code under its undecorated name, and the data export as data: read from
-// the library itself, an ELF file's dynamic symbols or a loaded DLL's
-// export directory, so that the test needs nothing of the platform's tools.
-//
-// And every scalar routine, called from 8 threads at once, gives what it
-// gives when called alone.  The routines keep no state of their own, so any
-// difference is a shared buffer, a static or a service that is not safe to
-// call from several threads.  The cases come from the catalogue: each input
-// slot takes values from a pool chosen by its layout and name, so a routine
-// added to the catalogue is covered without a new line here.  RAND is left
-// out: its generator is the C library's, shared by the process by design.
+// The library's exports are exactly the catalogue's routines, in code
+// under their undecorated names, and the data export as data, read from the
+// library itself (an ELF file's dynamic symbols or a loaded DLL's export
+// directory).  And every scalar routine but RAND (whose generator the
+// process shares by design), called from 8 threads at once, gives what it
+// gives alone; its cases come from pools chosen by each slot's layout and
+// name, so a routine added to the catalogue is covered without a new line.
 #include <gtest/gtest.h>
 
 #include <algorithm>
@@ -176,8 +169,6 @@ TEST(Exports, AreExactlyTheCataloguedRoutinesAndTheDataExportAsData) {
   EXPECT_EQ(*mark, 0);
 }
 
-// ---- Many threads at once ---------------------------------------------------
-
 constexpr std::size_t kThreads = 8;
 
 // The values an input slot takes, by its layout and the name it has in
@@ -242,7 +233,6 @@ Value areaFor(const cat::Slot &slot) {
   return fixedArea(slot.size);
 }
 
-// The block of a UTF-8 database, which the routines only read.
 DatabaseInfo utf8(1208);
 
 struct Case {

@@ -1,8 +1,11 @@
 // Numeric routines: the 64-bit forms against exact 128-bit arithmetic, the
 // double forms against their formulas written out here in the same
-// grouping, and the edges that random inputs don't reach as a table.
+// grouping, the edges that random inputs don't reach as a table, and RAND:
+// its sequence repeats per seed and is seeded once per statement, and its
+// values are multiples of 1/32767 in [0, 1].
 #include <gtest/gtest.h>
 
+#include <array>
 #include <bit>
 #include <cmath>
 #include <cstdint>
@@ -10,6 +13,7 @@
 #include <random>
 #include <vector>
 
+#include "frame/cliudf.h"
 #include "frame/platform.hpp"
 #include "support/frame_call.hpp"
 
@@ -163,8 +167,6 @@ TEST(NumericRoutines, AbsClearsTheSignBitOfANaN) {
   EXPECT_TRUE(isNaN(got) && !std::signbit(std::bit_cast<double>(got.number)));
 }
 
-// ---- Random differential tests -------------------------------------------
-
 i128 tenTo(int k) {
   i128 p = 1;
   while (k-- > 0) p *= 10;
@@ -287,6 +289,44 @@ TEST(FloatingPoint, IsNotContracted) {
   const double separate = a * b + c;
   EXPECT_EQ(separate, 0.0) << "a multiply and an add were fused";
   EXPECT_EQ(std::fma(a, b, c), -std::ldexp(1.0, -60));
+}
+
+// A draw of RAND1, or of RAND2 with its seed and the statement's
+// scratchpad; NaN if the call fails.
+double draw(const std::vector<Value> &seed = {}, void *scratchpad = nullptr) {
+  const Outcome o = seed.empty()
+                        ? call("CLI_udfRAND1", {}, numberArea(Value::Layout::real))
+                        : call("CLI_udfRAND2", seed, numberArea(Value::Layout::real), {scratchpad});
+  return o.error.empty() ? std::bit_cast<double>(o.number)
+                         : std::numeric_limits<double>::quiet_NaN();
+}
+
+TEST(Rand, RepeatsPerSeedAndSeedsOncePerStatement) {
+  // A statement's draws: later seeds are ignored, and RAND1 goes on with
+  // the same sequence.
+  const auto sequence = [](std::int32_t seed, std::int32_t later) {
+    std::array<unsigned char, 16> scratchpad{};
+    std::vector<double> out{draw({i32(seed)}, scratchpad.data())};
+    for (int i = 0; i < 5; ++i) out.push_back(draw({i32(later)}, scratchpad.data()));
+    out.push_back(draw());
+    EXPECT_EQ(scratchpad[CLI_SCRATCHPAD_DATA_OFFSET], 1);
+    return out;
+  };
+  EXPECT_EQ(sequence(12345, 12345), sequence(12345, 999));
+  EXPECT_NE(sequence(0, 0), sequence(-1, -1));
+  EXPECT_EQ(sequence(0, 0), sequence(0, 7));
+}
+
+TEST(Rand, GivesMultiplesOfOneOver32767InTheClosedRange) {
+  bool sawZero = false, sawOne = false;
+  for (int i = 0; i < 400000; ++i) {
+    const double r = draw();
+    const double steps = r * 32767.0;
+    ASSERT_TRUE(r >= 0.0 && r <= 1.0 && steps == std::round(steps)) << r;
+    sawZero = sawZero || r == 0.0;
+    sawOne = sawOne || r == 1.0;
+  }
+  EXPECT_TRUE(sawZero && sawOne);
 }
 
 }  // namespace

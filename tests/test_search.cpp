@@ -121,8 +121,6 @@ TEST(LocateReplaceInsert, AgreeWithNaiveModelsOnSmallAlphabets) {
   EXPECT_EQ(failures, 0);
 }
 
-// ---- The search on every filter kernel, and REPLACE at scale -------------
-
 std::vector<const cli::str::FilterKernel *> kernelsHere() {
   std::vector<const cli::str::FilterKernel *> out = {&cli::str::kPortableKernel};
 #if defined(__x86_64__) || defined(_M_X64)

@@ -37,7 +37,6 @@ const char *aDevice();
 // Makes a FIFO at `path`; false where the system has none (Windows).
 bool makeFifo(const std::string &path);
 
-
 // Bytes placed so that their last one is the last readable byte before a
 // page that can't be read: a routine that reads one byte too many dies.
 class BytesBeforeAGuardPage {
