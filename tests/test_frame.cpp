@@ -1,4 +1,5 @@
-// The status channel and the frame's worked member, SPACE.
+// The frame's worked member, SPACE, and what the frame caller and the hosts
+// read back from a status.
 #include <gtest/gtest.h>
 
 #include <climits>
@@ -12,16 +13,6 @@
 namespace {
 
 using namespace orv::test;
-
-TEST(RaiseSysfun, StoresStateAndCodeAndNothingElse) {
-  char sqlstate[8];
-  char message[16];
-  std::memset(sqlstate, '#', sizeof sqlstate);
-  std::memset(message, '#', sizeof message);
-  CLI_raiseSysfun(sqlstate, message, "10");
-  EXPECT_EQ(std::string(sqlstate, 8), std::string("38552\0##", 8));
-  EXPECT_EQ(std::string(message, 16), std::string("SYSFUN:10\0######", 16));
-}
 
 // What the hosts read back from a status: one of the ten codes behind
 // "38552" and "SYSFUN:", or none for anything else.
