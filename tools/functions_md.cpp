@@ -141,6 +141,7 @@ int main(int argc, char **argv) {
   std::ostringstream out;
   out << introduction() << sqlite3_libversion() << kPicking;
   const auto groups = orv::host::groups();
+  const orv::host::KnownFunctions known(db);
   for (const auto &g : groups) {
     if (g.plainName.empty()) continue;
     // The summary of the export that plain arguments reach.
@@ -150,7 +151,7 @@ int main(int argc, char **argv) {
     out << "\n### " << g.label << " (" << g.argumentCount
         << (g.argumentCount == 1 ? " argument" : " arguments") << ")\n\n"
         << first.summary << "\n\nIn SQLite: `" << g.sysfunName << "`";
-    if (!orv::host::sqliteHasFunction(db, g.plainName.c_str(), g.argumentCount)) {
+    if (!known.has(g.plainName.c_str(), g.argumentCount)) {
       out << ", `" << g.label << "`";
     }
     out << "\n\n| Export | Reached | Own name | Arguments | Result | SYSFUN errors | What it "

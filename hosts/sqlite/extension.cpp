@@ -106,11 +106,11 @@ int initialise(sqlite3 *db, char **error) {
   // Decide on the plain names before registering anything, so that our own
   // functions don't hide a name from the check.
   static const std::vector<orv::host::Group> groups = orv::host::groups();
+  const orv::host::KnownFunctions known(db);
   std::vector<bool> plain(groups.size());
   for (std::size_t g = 0; g < groups.size(); ++g) {
-    plain[g] =
-        !groups[g].plainName.empty() &&
-        !orv::host::sqliteHasFunction(db, groups[g].plainName.c_str(), groups[g].argumentCount);
+    plain[g] = !groups[g].plainName.empty() &&
+               !known.has(groups[g].plainName.c_str(), groups[g].argumentCount);
   }
 
   // The connection is freed with its last function from here on.
