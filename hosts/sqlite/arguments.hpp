@@ -11,7 +11,6 @@
 #include <cstdint>
 #include <cstring>
 #include <limits>
-#include <string>
 #include <type_traits>
 
 #include "catalogue/catalogue.hpp"
@@ -119,21 +118,26 @@ inline void failNotText(const Call &c, int i) {
   const Argument &a = c.arguments[static_cast<std::size_t>(i)];
   const char *label = c.function.label.c_str();
   const char *name = c.function.argumentNames[static_cast<std::size_t>(i)];
-  const std::string hint =
-      c.function.longerForm.empty() ? "" : "; " + c.function.longerForm + " takes such strings";
+  // "; sysfun_lcase2 takes such strings", or nothing; made without an
+  // allocation, as this runs outside the call's handler of bad_alloc.
+  const bool longer = !c.function.longerForm.empty();
+  const char *hintHead = longer ? "; " : "";
+  const char *hintName = c.function.longerForm.c_str();
+  const char *hintTail = longer ? " takes such strings" : "";
   if (a.type == SQLITE_BLOB) {
-    fail(c.context, "%s: argument %d (%s) is a BLOB, and the function takes text only%s", label,
-         i + 1, name, hint.c_str());
+    fail(c.context, "%s: argument %d (%s) is a BLOB, and the function takes text only%s%s%s", label,
+         i + 1, name, hintHead, hintName, hintTail);
   } else if (a.size > kTextLimit) {
     fail(c.context,
          "%s: argument %d (%s) is %lld bytes long, and the function takes text of at most %d "
-         "bytes%s",
-         label, i + 1, name, static_cast<long long>(a.size), static_cast<int>(kTextLimit),
-         hint.c_str());
+         "bytes%s%s%s",
+         label, i + 1, name, static_cast<long long>(a.size), static_cast<int>(kTextLimit), hintHead,
+         hintName, hintTail);
   } else {
     fail(c.context,
-         "%s: argument %d (%s) holds a NUL byte, and the function takes text without NUL bytes%s",
-         label, i + 1, name, hint.c_str());
+         "%s: argument %d (%s) holds a NUL byte, and the function takes text without NUL "
+         "bytes%s%s%s",
+         label, i + 1, name, hintHead, hintName, hintTail);
   }
 }
 

@@ -10,7 +10,6 @@ SQLITE_EXTENSION_INIT3
 #include <cstdint>
 #include <cstring>
 #include <new>
-#include <string>
 #include <tuple>
 #include <utility>
 
@@ -35,11 +34,10 @@ void reportStatus(const Call &c, const cli::call::StatusBuffers &status) {
       code != cli::Sysfun::none) {
     // A result or operand too long for terminated text fits the CLI_udfLob
     // export of the same function, if the caller named this one.
-    const std::string hint = code == cli::Sysfun::tooLong && !c.function.longerForm.empty()
-                                 ? "; " + c.function.longerForm + " takes longer strings"
-                                 : "";
-    fail(c.context, "%s: SQLSTATE 38552, SYSFUN:%s: %s%s", label, cli::textOf(code).digits,
-         cli::wordsOf(code), hint.c_str());
+    const bool longer = code == cli::Sysfun::tooLong && !c.function.longerForm.empty();
+    fail(c.context, "%s: SQLSTATE 38552, SYSFUN:%s: %s%s%s%s", label, cli::textOf(code).digits,
+         cli::wordsOf(code), longer ? "; " : "", longer ? c.function.longerForm.c_str() : "",
+         longer ? " takes longer strings" : "");
   } else {
     fail(c.context, "%s: SQLSTATE %.5s: %.*s", label, status.sqlstate,
          static_cast<int>(sizeof status.message - 1), status.message);
