@@ -17,6 +17,7 @@
 #include "fakes/fakes.h"
 #include "frame/cliudf.h"
 #include "frame/table_call.hpp"
+#include "models/snapshot.hpp"
 #include "snapshot.hpp"
 #include "support/frame_call.hpp"
 #include "support/platform.hpp"
@@ -192,7 +193,12 @@ class Snapshot : public ::testing::Test {
     for (std::size_t i = 0; i < 16; ++i) std::memcpy(t.area(i), &unset, sizeof unset);
     std::memset(t.area(16), 0, cli::call::areaSize(t.row().results[16]));
     std::memcpy(t.area(16), "unset", 5);
-    t.step(callType);
+    // An open is on a zero-filled scratchpad, as the engine gives it.
+    if (callType == CLI_CALL_OPEN) {
+      static_cast<void>(t.open());
+    } else {
+      t.step(callType);
+    }
     Row row;
     for (std::size_t i = 0; i < 16; ++i) row.columns[i] = static_cast<std::int32_t>(t.number(i));
     row.text = t.text(16);
@@ -222,11 +228,7 @@ class Snapshot : public ::testing::Test {
     return out;
   }
 
-  // An open on a fresh scratchpad, as the engine gives; its SQLSTATE.
-  std::string openTable() {
-    std::memset(table.scratchpad(), 0, cli::call::TableCall::kScratchpadSize);
-    return call(CLI_CALL_OPEN).second;
-  }
+  std::string openTable() { return call(CLI_CALL_OPEN).second; }
 
   orv::test::LibraryInUse use;
   fs::path dir =
@@ -353,59 +355,93 @@ class FakeSnapshot : public Snapshot {
   OrvFakes *fakes = nullptr;
 };
 
-TEST_F(FakeSnapshot, EndsTheTableOnAFailedReadInEachStepOfTheSectionScan) {
-  // Statement first, so that the scan skips it and goes back to it.
-  const Statement st{{}, "s"};
-  write(element(30, "") + statement(st) + element(321, "T") + element(322, "dd"));
-  ASSERT_EQ(rows().size(), 1u);
-  // Reads in order: 30, the statement's header, 321 and its text, 322 and its
-  // data, the statement's header again, the last byte of its data (to see
-  // that the file holds it), then its data.
-  for (int failing = 1; failing <= 9; ++failing) {
-    fakes->reads = 0;
-    fakes->failReadAt = failing;
-    EXPECT_TRUE(rows().empty()) << "read " << failing;
+// A snapshot cut at every byte: the services asked, the rows, the SQLSTATEs
+// and the scratchpad after every call are those of the table's definition
+// (tests/models/snapshot.hpp).  A statement cut short gets its block, the
+// read falls short and the table ends with nothing logged.
+TEST_F(FakeSnapshot, FollowsItsDefinitionOnAFileCutAtAnyByte) {
+  const auto st = [](const std::string &text) {
+    return element(19, element(554, "1234") + element(312, text));
+  };
+  const std::string whole = st("first") + section("S1") + st("b") + st("a longer one") +
+                            element(30, "") + st("c") + st("dd") + element(321, "S2") +
+                            element(322, "data") + st("e");
+  for (std::size_t cut = 0; cut <= whole.size(); ++cut) {
+    resetFakes();
+    write(whole.substr(0, cut));
+    orv::model::SnapshotTable model(whole.substr(0, cut));
+    std::string got, want;
+    // After each call: the row or the end, and the scratchpad's fields.
+    const auto state = [](std::uint32_t capacity, const char *text, std::uint8_t closed,
+                          bool block) {
+      return std::to_string(capacity) + "/" + std::string(text, ::strnlen(text, 9)) + "/" +
+             std::to_string(closed) + (block ? "/block " : "/none ");
+    };
+    const auto scratchpad = [&] {
+      const unsigned char *data = table.scratchpad() + CLI_SCRATCHPAD_DATA_OFFSET;
+      std::uint32_t capacity = 0;
+      void *block = nullptr;
+      std::memcpy(&capacity, data + 16, 4);
+      std::memcpy(&block, data + 32, sizeof block);
+      return state(capacity, reinterpret_cast<const char *>(data + 20), data[29], block != nullptr);
+    };
+    openTable();
+    model.open();
+    got += scratchpad();
+    want += state(model.capacity, model.text.data(), model.closed, model.block);
+    for (int i = 0; i < 10; ++i) {
+      const auto [row, sqlstate] = call(CLI_CALL_FETCH);
+      got += (sqlstate.empty() ? row.text + ":" + row.statement : sqlstate) + " " + scratchpad();
+      const auto expected = model.fetch();
+      want += expected.value_or("02000") + " " +
+              state(model.capacity, model.text.data(), model.closed, model.block);
+      if (!expected) break;
+    }
+    call(CLI_CALL_CLOSE);
+    model.close();
+    EXPECT_EQ(got, want) << "cut at " << cut;
+    EXPECT_EQ(fakes->trace, model.trace) << "cut at " << cut;
   }
-  fakes->failReadAt = 0;
-  fakes->seekFails = 1;
-  EXPECT_TRUE(rows().empty());
 }
 
 // A block that can't be had is logged and ends the table: one that the
-// service fails to give, or one for a statement that claims more than the
-// rest of the file, refused before it is asked for.  The block of the
-// statements before goes back as it does before any new block.
+// service fails to give, or one for a statement that claims more than 64
+// MiB and more than the rest of the file, refused before it is asked for.
+// The block of the statements before goes back as it does before any new
+// block.  Up to 64 MiB a claim gets its block whatever the file holds.
 TEST_F(FakeSnapshot, LogsABlockThatCannotBeHadAndKeepsNone) {
-  std::string huge = element(19, "12345678");
-  huge.replace(0, 4, "\xF0\xFF\xFF\xDD", 4);  // 3.7 GB in a file of a few bytes
+  const std::string one = element(19, element(312, "s"));  // 9 bytes of data
+  const auto claiming = [](std::uint32_t size) {
+    std::string e = element(19, "12345678");
+    std::memcpy(e.data(), &size, 4);
+    return e;
+  };
   const struct {
     std::string stream;
-    std::int32_t failure, logged;
-    int blocks;  // and rows before the end
-  } cases[] = {{statement({{}, "s"}), 7, 7, 0}, {statement({{}, "s"}) + huge, 0, -1, 1}};
+    std::int32_t failure;
+    const char *trace;
+  } cases[] = {
+      {one, 7, "o r8 a9 l7 c"},
+      {one + claiming(0xDDFFFFF0), 0, "o r8 a9 r9 r8 f m3724541935 r1 m-3724541935 l-1 c"},
+      {claiming(64 << 20), 0, "o r8 a67108864 r67108864 c f"},
+      {claiming((64 << 20) + 1), 0, "o r8 m67108864 r1 m-67108864 l-1 c"},
+  };
   for (const auto &c : cases) {
     resetFakes();
     fakes->allocationStatus = c.failure;
     write(c.stream);
-    openTable();
-    for (int i = 0; i < c.blocks; ++i) EXPECT_EQ(call(CLI_CALL_FETCH).second, "");
-    EXPECT_EQ(call(CLI_CALL_FETCH).second, "02000");
-    EXPECT_EQ(fakes->logCalls, 1);
-    EXPECT_STREQ(fakes->logMessage,
-                 "SQLCACHE_SNAPSHOT: unable to allocate temporary sqlcache stmt");
-    EXPECT_EQ(fakes->logStatus, c.logged);
-    EXPECT_EQ(fakes->allocations, c.blocks);
-    EXPECT_EQ(fakes->frees, c.blocks);
-    call(CLI_CALL_CLOSE);
-    EXPECT_EQ(fakes->frees, c.blocks);
-    EXPECT_EQ(fakes->closes, 1);
+    rows();
+    EXPECT_STREQ(fakes->trace, c.trace);
+    if (fakes->logCalls != 0) {
+      EXPECT_STREQ(fakes->logMessage,
+                   "SQLCACHE_SNAPSHOT: unable to allocate temporary sqlcache stmt");
+    }
   }
 }
 
 // The static data is asked for once on every entry, open included.
 TEST_F(FakeSnapshot, AsksForTheStaticDataOncePerCall) {
   write(statement({{}, "s"}));
-  std::memset(table.scratchpad(), 0, cli::call::TableCall::kScratchpadSize);
   for (const std::int32_t type : {CLI_CALL_OPEN, CLI_CALL_FETCH, CLI_CALL_FETCH, CLI_CALL_CLOSE}) {
     fakes->staticDataCalls = 0;
     call(type);

@@ -8,7 +8,7 @@
 // failure looks like the end of the table to the engine.  The file comes
 // from outside, so every size in it is checked against the room it claims
 // before anything is read or written; a stream that breaks a limit ends
-// the table.
+// the table.  A file cut short ends the table where a read falls short.
 #include <cstdint>
 #include <cstdio>
 #include <cstring>
@@ -26,8 +26,10 @@ using cli::platform::kPathSeparator;
 
 constexpr std::uint16_t kStatement = 19, kSection = 30, kSectionText = 321, kSectionData = 322;
 constexpr std::uint32_t kTextRoom = 8, kDataRoom = 264;
-// What the log line carries as the status when a statement is refused
-// because the file ends before it would: no block was asked for.
+// Statements up to this size get their block without a look at the file.
+constexpr std::uint32_t kTrustedClaim = std::uint32_t{64} << 20;
+// What the log line carries as the status when a larger statement is
+// refused because the file ends before it would: no block was asked for.
 constexpr std::int32_t kRefusedStatus = -1;
 constexpr const char *kModule = "cliudf";
 
@@ -236,21 +238,18 @@ Report fetch(Scratch &s, const Row &row) {
     if (s.capacity > 0) sqlofmblkEx(kModule, __LINE__, s.block);
     s.block = nullptr;
     s.capacity = 0;
-    // A size word that claims more than the rest of the file is refused
-    // before a block of that size is asked for, and logged as a block that
-    // can't be had, so that a damaged file never costs gigabytes and the
-    // administrator sees why the table ended.
     void *block = nullptr;
     std::int32_t status = kRefusedStatus;
-    switch (fileHolds(s, h.size)) {
-      case Room::enough:
-        status = sqlogmblkEx(nullptr, h.size, 0, &block, kModule, __LINE__, 0);
-        break;
-      case Room::tooLittle:
-        break;
-      case Room::lost:  // the file position could not be put back
-        return kEndOfTable;
-    }
+    // A claim beyond what any statement needs is first held against the
+    // file: when the rest of the file is shorter, the size word is damaged
+    // and no block of that size is asked for, so that a bad file never
+    // costs gigabytes; it is logged as a block that can't be had.  Smaller
+    // claims get their block at once, and a file cut short ends the table
+    // on the read below.
+    const Room room = h.size > kTrustedClaim ? fileHolds(s, h.size) : Room::enough;
+    if (room == Room::lost) return kEndOfTable;  // the file position could not be put back
+    if (room == Room::enough)
+      status = sqlogmblkEx(nullptr, h.size, 0, &block, kModule, __LINE__, 0);
     if (status != 0) {
       sqlt_logerr_data("SQLCACHE_SNAPSHOT: unable to allocate temporary sqlcache stmt", &status, 4,
                        3);

@@ -31,6 +31,21 @@ uint8_t name(const CLI_nlsTimeRecord *time, uint32_t size, unsigned char *out, u
   return fakes.nameLength;
 }
 
+// Adds one entry to the trace of file and block services; an entry that
+// does not fit is dropped whole and the trace ends in "...".
+void trace(char kind, const long long *value = nullptr) {
+  char entry[32];
+  const int n = value == nullptr ? std::snprintf(entry, sizeof entry, "%c", kind)
+                                 : std::snprintf(entry, sizeof entry, "%c%lld", kind, *value);
+  const std::size_t used = std::strlen(fakes.trace);
+  if (used + static_cast<std::size_t>(n) + 5 < sizeof fakes.trace) {
+    std::snprintf(fakes.trace + used, sizeof fakes.trace - used, "%s%s", used == 0 ? "" : " ",
+                  entry);
+  } else if (used + 4 < sizeof fakes.trace) {
+    std::strcat(fakes.trace, " ...");
+  }
+}
+
 }  // namespace
 
 extern "C" {
@@ -107,6 +122,7 @@ int32_t sqleinstancepath(int32_t, char *path) {
 int32_t sqloopenp(const char *path, int32_t, int32_t, CLI_fileHandle *handle, int32_t) {
   const int32_t status = orv::standin::openFile(path, handle);
   if (status == 0) ++fakes.opens;
+  if (status == 0) trace('o');
   return status;
 }
 
@@ -114,21 +130,28 @@ int32_t sqloopenp(const char *path, int32_t, int32_t, CLI_fileHandle *handle, in
 // does, so a caller that hands it no word is caught.
 int32_t sqloread(CLI_fileHandle handle, void *out, uint32_t count, uint32_t *read) {
   *read = 0;
+  const long long n = count;
+  trace('r', &n);
   if (++fakes.reads == fakes.failReadAt) return 1;
   return orv::standin::readFile(handle, out, count, read);
 }
 
 int32_t sqlochgfileptr(CLI_fileHandle handle, int64_t offset, int32_t origin, int32_t) {
+  const long long n = offset;
+  trace('m', &n);
   if (fakes.seekFails != 0) return 1;
   return orv::standin::moveIn(handle, offset, origin);
 }
 
 int32_t sqloclose(CLI_fileHandle handle) {
   ++fakes.closes;
+  trace('c');
   return orv::standin::closeFile(handle);
 }
 
 int32_t sqlogmblkEx(void *, uint64_t size, int32_t, void **block, const char *, int32_t, int32_t) {
+  const auto n = static_cast<long long>(size);
+  trace('a', &n);
   if (fakes.allocationStatus != 0) return fakes.allocationStatus;
   ++fakes.allocations;
   *block = std::malloc(size == 0 ? 1 : size);
@@ -137,6 +160,7 @@ int32_t sqlogmblkEx(void *, uint64_t size, int32_t, void **block, const char *, 
 
 int32_t sqlofmblkEx(const char *, int32_t, void *block) {
   ++fakes.frees;
+  trace('f');
   std::free(block);
   return 0;
 }
@@ -145,6 +169,8 @@ void sqlt_logerr_data(const char *message, const void *data, int32_t size, int32
   ++fakes.logCalls;
   static_cast<void>(std::snprintf(fakes.logMessage, sizeof fakes.logMessage, "%s", message));
   if (size == 4) std::memcpy(&fakes.logStatus, data, 4);
+  const long long n = fakes.logStatus;
+  trace('l', &n);
 }
 
 void sqlm_filter_file_name(char *) {}

@@ -52,6 +52,10 @@ typedef struct OrvFakes {
   int staticDataCalls, reads, opens, closes, allocations, frees, logCalls;
   char logMessage[128];
   int32_t logStatus;
+  /* The file and block services asked, in order: "o" open, "rN" a read of
+   * N bytes, "mN" a move by N, "aN" a block of N bytes, "f" a free,
+   * "lS" a log line with status S, "c" a close; blank-separated. */
+  char trace[4096];
 } OrvFakes;
 
 CLI_SERVICE_API OrvFakes *orv_fakes(void);
