@@ -15,8 +15,10 @@
 #include <cstdlib>
 #include <cstring>
 #include <limits>
+#include <numbers>
 #include <string>
 #include <string_view>
+#include <tuple>
 
 #include "harness.hpp"
 #include "models/integers.hpp"
@@ -89,6 +91,18 @@ void cutDigits(const char *round, const char *truncate, T x, std::int32_t n) {
   }
 }
 
+// a to the power b in exact arithmetic, only as far as it passes 2^32 in
+// magnitude; a negative power rounded half away from zero.
+I128 power32(std::int32_t a, std::int32_t b) {
+  const I128 sign = a < 0 && b % 2 != 0 ? -1 : 1;
+  if (a == 1 || a == -1) return sign;
+  if (b < 0) return b == -1 && (a == 2 || a == -2) ? sign : 0;
+  if (a == 0) return b == 0 ? 1 : 0;
+  I128 p = 1;
+  for (std::int32_t k = 0; k < b && p > -(I128{1} << 32) && p < I128{1} << 32; ++k) p *= a;
+  return p;
+}
+
 using Fn1 = double (*)(double);
 
 void elementary(const char *name, Fn1 fn, double x) {
@@ -129,9 +143,23 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t *data, std::size_t size
   mod("CLI_udfMOD3", "03", e, f);
 
   cutDigits("CLI_udfROUND2", "CLI_udfTRUNCATE2", a, n);
-  // The double forms may overflow to an infinity without a status.
-  call("CLI_udfROUND1", r, false, x, n);
-  call("CLI_udfTRUNCATE1", r, false, x, n);
+  // The double forms fail only where their power of ten is out of range.
+  // Else ROUND1 moves a finite x by at most that power, and TRUNCATE1
+  // keeps its sign and gives no more than its magnitude; either may
+  // overflow to an infinity without a status.
+  const double unit = std::pow(10.0, -static_cast<double>(n));
+  const std::string roundCode = call("CLI_udfROUND1", r, false, x, n);
+  ORV_CHECK("CLI_udfROUND1", roundCode == (n > 323 || n < -308 ? "03" : ""));
+  if (roundCode.empty() && std::isfinite(x) && !std::isinf(r)) {
+    ORV_CHECK("CLI_udfROUND1", std::fabs(r - x) <= unit * (1 + 1e-15) + std::fabs(x) * 1e-15);
+  }
+  const std::string truncateCode = call("CLI_udfTRUNCATE1", r, false, x, n);
+  ORV_CHECK("CLI_udfTRUNCATE1", truncateCode == (n > 308 || n < -308 ? "03" : ""));
+  if (truncateCode.empty() && std::isfinite(x) && x != 0) {
+    ORV_CHECK("CLI_udfTRUNCATE1",
+              std::signbit(r) == std::signbit(x) &&
+                  (std::isinf(r) || std::fabs(r) <= std::fabs(x) * (1 + 1e-15) + 5e-324));
+  }
 
   // Powers.
   if (call("CLI_udfPOWER1", r, true, x, y).empty()) {
@@ -141,8 +169,19 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t *data, std::size_t size
   if (call("CLI_udfPOWER2", r, true, x, a).empty() && std::isfinite(x)) {
     ORV_CHECK("CLI_udfPOWER2", !std::isinf(r));
   }
+  // POWER3 exactly: the power when it lies in [-2147483647, 2147483646]
+  // (the half added before the range test rules out the two ends), a
+  // fraction rounded half away from zero for a negative exponent, 03 where
+  // pow underflows to zero.
   std::int32_t r32 = 0;
-  call("CLI_udfPOWER3", r32, false, a, b);
+  const I128 power = power32(a, b);
+  const std::string wantCode =
+      a == 0 && b < 0                                                             ? "01"
+      : std::pow(static_cast<double>(a), static_cast<double>(b)) == 0.0 && a != 0 ? "03"
+      : power < -2147483647 || power > 2147483646                                 ? "03"
+                                                                                  : "";
+  ORV_CHECK("CLI_udfPOWER3", call("CLI_udfPOWER3", r32, false, a, b) == wantCode &&
+                                 (!wantCode.empty() || r32 == power));
   // The 64-bit forms, exactly.
   std::int64_t r64 = 0;
   const auto exactly = [&](const char *name, const orv::model::Exact &want, auto... in) {
@@ -174,12 +213,28 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t *data, std::size_t size
       "CLI_udfEXP", [](double v) { return std::exp(v); }, x);
   elementary(
       "CLI_udfSQRT", [](double v) { return std::sqrt(v); }, x);
-  call("CLI_udfCOT", r, true, x);  // 1e-310 gives an infinity
+  // COT is 1 / tan, 02 where tan gives a zero; 1e-310 gives an infinity.
+  const std::string cotCode = call("CLI_udfCOT", r, true, x);
+  ORV_CHECK("CLI_udfCOT", std::tan(x) == 0 ? cotCode == "02"
+                                           : cotCode.empty() && sameDouble(r, 1.0 / std::tan(x)));
   // ATAN2(a, b) is the standard atan2(b, a).
   if (call("CLI_udfATAN2", r, true, x, y).empty())
     ORV_CHECK("CLI_udfATAN2", sameDouble(r, std::atan2(y, x)));
-  call("CLI_udfDEGREES1", r, false, x);
-  call("CLI_udfRADIANS1", r, false, x);
+  // DEGREES and RADIANS within two roundings of the exact ratio, or an
+  // infinity where the product with 180 or pi overflows.
+  const long double pi = 3.141592653589793238462643383279502884L;
+  for (const auto &[name, ratio, factor] :
+       {std::tuple{"CLI_udfDEGREES1", 180.0L / pi, 180.0},
+        std::tuple{"CLI_udfRADIANS1", pi / 180.0L, std::numbers::pi}}) {
+    ORV_CHECK(name, call(name, r, false, x).empty());
+    const long double want = static_cast<long double>(x) * ratio;
+    if (std::isfinite(x) && std::isfinite(factor * x)) {
+      ORV_CHECK(name, std::fabs(static_cast<long double>(r) - want) <=
+                          std::fabs(want) * 0x1p-50L + 0x1p-1070L);
+    } else if (std::isinf(x) || std::isinf(factor * x)) {
+      ORV_CHECK(name, std::isinf(r) && std::signbit(r) == std::signbit(x));
+    }
+  }
 
   // DOUBLETOCHAR: 24 bytes, the short text then blanks, no NUL.
   Call toText("CLI_udfDOUBLETOCHAR");
