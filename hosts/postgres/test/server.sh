@@ -12,11 +12,70 @@
 #                           the extension's package has been installed
 #   pg_start NAME [PORT]    initdb and start a server; PORT: listen on
 #                           127.0.0.1 too (sets PG_PORT_<NAME>)
+#   pg_launch NAME          start the server of an initialised folder
 #   as_server CMD...        run CMD as the servers' user
 #   pg_sql NAME SQL         run SQL in the server's database postgres
 #   pg_cleanup              stop every server and remove the folder
 
 PG_SERVERS=()
+
+# The build of the asan preset has the module, the library and the service
+# libraries built with the address and undefined-behaviour sanitizers; the
+# server is not.  The address sanitizer's runtime must be the first object
+# of a process that loads an instrumented one, so every server gets it by
+# LD_PRELOAD: the postmaster, and every backend that forks from it; with
+# it test/sanitizer_hooks.cpp, without which the runtimes hang the server
+# or lose their options.  Leak checking is off, as the processes'
+# allocations are the server's, let go when they exit.  An address report
+# goes to a file of its process, an undefined-behaviour one to the
+# server's log, and pg_cleanup fails the script on any: see pg_reports.
+PG_CHECK_ENV=()
+PG_SOURCES=$(cd "$(dirname "${BASH_SOURCE[0]}")/../../.." && pwd)
+
+pg_checker() {
+  local build=$1 asan log=$PG_WORK/sanitizer/report hooks=$PG_WORK/orv_pg_sanitizer_hooks.so
+  grep -q '^ORV_SANITIZE:STRING=.*address' "$build/CMakeCache.txt" || return 0
+  # The runtime that the module was linked with.
+  asan=$(ldd "$build/lib/postgresql/orvclifn.so" | awk '$1 ~ /^libasan\.so/ { print $3 }')
+  [[ -n $asan ]] || { echo "the sanitized module names no ASan runtime" >&2; return 1; }
+  cp "$build/lib/orv_pg_sanitizer_hooks.so" "$hooks"
+  chmod a+r "$hooks"
+  as_server mkdir -p "$PG_WORK/sanitizer"
+  # The same log_path for both: the undefined-behaviour runtime hands its
+  # own to the address runtime, whose functions come first.
+  PG_CHECK_ENV=("LD_PRELOAD=$asan:$hooks" "ASAN_OPTIONS=detect_leaks=0:log_path=$log"
+    "UBSAN_OPTIONS=print_stacktrace=1:log_path=$log")
+}
+
+# Prints every sanitizer report of the servers; false when there is one.
+# Each fails the run.  PostgreSQL's code is not instrumented, so a report
+# comes from our objects, or from the address runtime's checks of the C
+# library's and the allocator's functions as the server calls them.  None
+# is suppressed, so none of the server's can hide one of ours; the label
+# tells them apart by the frames: one in the module, the library or the
+# service libraries (by file name, or by a source of this tree) makes it
+# ours.
+pg_reports() {
+  local report text who status=0
+  for report in "$PG_WORK"/sanitizer/report.* "$PG_WORK"/*.log; do
+    [[ -e $report ]] || continue
+    # From a server log, the lines of the runtimes: from one that names a
+    # sanitizer or a runtime error to the server's next line of its own.
+    text=$(awk '/runtime error:|Sanitizer/ { on = 1 } /^[0-9]{4}-[0-9]{2}-[0-9]{2} / { on = 0 } on' \
+      "$report")
+    [[ $report == */sanitizer/* ]] && text=$(cat "$report")
+    [[ -n $text ]] || continue
+    status=1
+    who="PostgreSQL's own code: no frame of ours"
+    if grep -qE "orvclifn\.so|liborvclifn\.so|libORV(SYS|APP|G11N)64\.so" <<<"$text" ||
+      grep -qF "$PG_SOURCES/" <<<"$text"; then
+      who="the module or the library"
+    fi
+    echo "sanitizer report in $(basename "$report"), from $who:" >&2
+    echo "$text" >&2
+  done
+  return "$status"
+}
 
 as_server() {
   if (($(id -u) == 0)); then
@@ -27,11 +86,12 @@ as_server() {
 }
 
 pg_cleanup() {
-  local name
+  local status=0 name
   for name in "${PG_SERVERS[@]}"; do
     as_server "$PG_BIN/pg_ctl" -D "$PG_WORK/$name" -m immediate stop >/dev/null 2>&1 || true
   done
-  [[ -n ${PG_WORK:-} ]] && rm -rf "$PG_WORK"
+  [[ -n ${PG_WORK:-} ]] && { pg_reports || status=1; rm -rf "$PG_WORK"; }
+  ((status == 0)) || exit 1
 }
 
 pg_setup() {
@@ -71,7 +131,7 @@ pg_setup() {
     [[ -e $into/$(basename "$entry") ]] || ln -s "$entry" "$into/"
   done
   as_server mkdir -p "$PG_WORK/socket"
-  return 0
+  pg_checker "$build"
 }
 
 pg_start() {
@@ -91,9 +151,13 @@ fsync = off
 max_parallel_workers_per_gather = 2
 EOF
   PG_SERVERS+=("$name")
-  as_server "$PG_BIN/pg_ctl" -D "$data" -l "$PG_WORK/$name.log" -w start >/dev/null ||
-    { cat "$PG_WORK/$name.log" >&2; return 1; }
+  pg_launch "$name" || { cat "$PG_WORK/$name.log" >&2; return 1; }
   printf -v "PG_PORT_$name" '%s' "$port"
+}
+
+pg_launch() {
+  as_server env "${PG_CHECK_ENV[@]}" "$PG_BIN/pg_ctl" -D "$PG_WORK/$1" -l "$PG_WORK/$1.log" \
+    -w start >/dev/null
 }
 
 pg_port() { local v="PG_PORT_$1"; echo "${!v}"; }
