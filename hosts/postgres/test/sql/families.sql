@@ -71,3 +71,23 @@ SELECT sysfun.collationname('\x0000000000000000'::bytea) AS collation,
        sysfun.collationname(NULL) AS of_null;
 SELECT pg_temp.outcome($$SELECT sysfun.collationname('\x00'::bytea)$$);
 SELECT sysfun.veblob_cp_large(NULL, 1208, 1208, 0) AS null_object;
+-- A record converted from UTF-8 to Latin-1: the head as it was, the
+-- length field rewritten.  A tag that is not known, and a string that may
+-- not fit the 500000 bytes of VEBLOB_CP_SMALL when it doubles, are statuses
+-- of their own.
+SELECT sysfun.veblob_cp_large(decode(repeat('ab', 22) || '4b02c3a9', 'hex'), 1208, 819, 0) AS converted;
+SELECT pg_temp.outcome($$SELECT sysfun.veblob_cp_large(decode(repeat('ab', 22) || '00', 'hex'), 1208, 819, 0)::text$$);
+CREATE TEMP TABLE big_object AS
+  SELECT decode(repeat('ab', 22) || 'cb801a0600', 'hex') || convert_to(repeat('a', 400000), 'UTF8') AS o;
+SELECT sysfun.veblob_cp_large(o, 1208, 819, 0) = o AS large_unchanged FROM big_object;
+SELECT pg_temp.outcome($$SELECT sysfun.veblob_cp_small(o, 1208, 819, 0)::text FROM big_object$$);
+
+-- DAYNAME and MONTHNAME tell the library the code page of the database's
+-- encoding, and refuse an encoding that has none.
+\set regression :DBNAME
+CREATE DATABASE orvclifn_latin2 ENCODING 'LATIN2' LOCALE 'C' TEMPLATE template0;
+\c orvclifn_latin2
+CREATE EXTENSION orvclifn;
+SELECT sysfun.dayname('2026-11-24');
+\c :regression
+DROP DATABASE orvclifn_latin2;

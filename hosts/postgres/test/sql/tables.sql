@@ -17,6 +17,13 @@ SELECT element_554, element_540, element_585_301, section, statement
   FROM sysfun.sqlcache_snapshot() ORDER BY element_554;
 SET orvclifn.instance_path = '/nonexistent';
 SELECT count(*) AS statements FROM sysfun.sqlcache_snapshot();
+-- A statement that is no UTF-8 text (test/run wrote it under broken/)
+-- fails the query; the routine is closed, and the next query reads again.
+\getenv instance ORVENGINE_INSTANCE_PATH
+\set broken :instance '/broken'
+SET orvclifn.instance_path = :'broken';
+SELECT section, statement FROM sysfun.sqlcache_snapshot();
 RESET orvclifn.instance_path;
+SELECT count(*) AS statements FROM sysfun.sqlcache_snapshot();
 SELECT pg_get_function_result('sysfun.sqlcache_snapshot()'::regprocedure) AS snapshot_columns;
 SELECT pg_get_function_result('sysfun.fmpthreads(int4)'::regprocedure) AS thread_columns;
