@@ -4,8 +4,9 @@
 // the data at all), and `x memmem`, to the C library's memmem on the same
 // search string and text.  The shapes are those that make searches slow:
 // needles of 'a' with one 'b' (quadratic when searched naively), periodic
-// text with a needle that breaks the period at one end, and small
-// alphabets.
+// text with a needle that breaks the period at one end or in the middle,
+// small alphabets, and needles of 64 and 128 KiB, where what the needle
+// costs to prepare counts.
 #include <chrono>
 #include <cstdint>
 #include <cstring>
@@ -55,6 +56,38 @@ void memmoveMiB(benchmark::State &state) {
   state.SetBytesProcessed(state.iterations() * static_cast<std::int64_t>(kMiB));
 }
 
+std::string randomBytes(std::size_t size, unsigned seed) {  // every byte, NUL too
+  std::uint64_t state = seed;
+  std::string out(size, ' ');
+  for (char &c : out) {
+    state = state * 6364136223846793005ULL + 1442695040888963407ULL;
+    c = static_cast<char>(state >> 56);
+  }
+  return out;
+}
+// `unit` repeated to `size` bytes with one byte just past the middle
+// changed to '!', a place that no fixed sample of offsets needs to hit.
+std::string brokenInTheMiddle(const std::string &unit, std::size_t size) {
+  std::string out = repeated(unit, size);
+  out[size / 2 + 1] = '!';
+  return out;
+}
+// A needle whose first half stands in the text every 70 bytes and whose
+// second half is other words of the same letters.
+std::string commonPrefix(std::size_t size) {
+  return words(size / 2) +
+         repeated("a lazy dog naps by the quick brown fox, then jumps. ", size / 2);
+}
+// The needle with its last byte changed, and one byte more: the text is only
+// one byte longer than the needle, and the first place fails at its end.
+std::string oneLonger(const std::string &needle) {
+  std::string out = needle + "x";
+  out[needle.size() - 1] = static_cast<char>(out[needle.size() - 1] ^ 1);
+  return out;
+}
+
+constexpr std::size_t k64 = std::size_t{1} << 16, k128 = std::size_t{1} << 17;
+
 struct SearchShape {
   const char *name;
   std::string needle, text;
@@ -72,7 +105,24 @@ const SearchShape kShapes[] = {
      repeated("abc", kMiB)},
     {"random ab, 32 bytes", randomOver("ab", 32, 7), randomOver("ab", kMiB, 8)},
     {"random acgt, 20 bytes", randomOver("acgt", 20, 9), randomOver("acgt", kMiB, 10)},
+    // Long needles, where preparing the needle could cost more than the scan.
+    {"a, 65535 a and a b", std::string(k64 - 1, 'a') + "b", std::string(kMiB, 'a')},
+    {"a, a b and 65535 a", "b" + std::string(k64 - 1, 'a'), std::string(kMiB, 'a')},
+    {"a, 131072 a and a b", std::string(k128, 'a') + "b", std::string(kMiB, 'a')},
+    {"abab, 65536 ab and a b", repeated("ab", 2 * k64) + "b", repeated("ab", kMiB)},
+    {"random bytes, 64 KiB", randomBytes(k64, 11), randomBytes(kMiB, 12)},
+    {"random bytes, 128 KiB", randomBytes(k128, 13), randomBytes(kMiB, 12)},
+    {"random ab, 64 KiB", randomOver("ab", k64, 14), randomOver("ab", kMiB, 8)},
+    {"random ab, 128 KiB", randomOver("ab", k128, 15), randomOver("ab", kMiB, 8)},
+    {"abcabc, 64 KiB abc..!..abc", brokenInTheMiddle("abc", k64), repeated("abc", kMiB)},
+    {"abcabc, 128 KiB abc..!..abc", brokenInTheMiddle("abc", k128), repeated("abc", kMiB)},
+    {"text, 64 KiB, its first half common", commonPrefix(k64), words(kMiB)},
+    {"text, 128 KiB, its first half common", commonPrefix(k128), words(kMiB)},
 };
+// The text one byte longer than a 128 KiB needle of random bytes: nearly
+// all the time goes into what the needle costs to prepare.
+const SearchShape kShortText = {"128 KiB and a byte, random bytes", randomBytes(k128, 16),
+                                oneLonger(randomBytes(k128, 16))};
 
 void memmemRow(benchmark::State &state, const SearchShape *shape) {
   const auto start = std::chrono::steady_clock::now();
@@ -89,25 +139,32 @@ void memmemRow(benchmark::State &state, const SearchShape *shape) {
 
 // A 1 MiB row with its ratios; `shape` names the memmem row beside it.
 void ratioRow(benchmark::State &state, const char *routine, const std::vector<Value> &inputs,
-              const Value &result, const char *shape) {
-  const double ns = run(state, routine, inputs, result, kMiB);
+              const Value &result, const char *shape, std::size_t bytes = kMiB) {
+  const double ns = run(state, routine, inputs, result, static_cast<std::int64_t>(bytes));
   setRatio(state, "x memmove", ns, "memmove");
   if (shape != nullptr) setRatio(state, "x memmem", ns, std::string("memmem ") + shape);
 }
 
 void registerShapeRows() {
   benchmark::RegisterBenchmark("memmove/1 MiB (reference)", memmoveMiB);
-  for (const SearchShape &shape : kShapes) {
-    const std::string name = std::string("1 MiB of ") + shape.name;
+  const auto shapeRows = [](const SearchShape &shape, const std::string &name) {
+    const std::size_t size = shape.text.size();
     benchmark::RegisterBenchmark(("memmem/" + name).c_str(), memmemRow, &shape);
-    benchmark::RegisterBenchmark(("LOCATE4/" + name).c_str(), [&shape](benchmark::State &s) {
-      ratioRow(s, "CLI_udfLOCATE4", {lob(shape.needle), lob(shape.text)}, number(0), shape.name);
+    benchmark::RegisterBenchmark(("LOCATE4/" + name).c_str(), [&shape, size](benchmark::State &s) {
+      ratioRow(s, "CLI_udfLOCATE4", {lob(shape.needle), lob(shape.text)}, number(0), shape.name,
+               size);
     });
-    benchmark::RegisterBenchmark(("REPLACE2/" + name).c_str(), [&shape](benchmark::State &s) {
+    benchmark::RegisterBenchmark(("LOCATE2/" + name).c_str(), [&shape, size](benchmark::State &s) {
+      ratioRow(s, "CLI_udfLOCATE2", {lob(shape.needle), lob(shape.text), int32(1)}, number(0),
+               shape.name, size);
+    });
+    benchmark::RegisterBenchmark(("REPLACE2/" + name).c_str(), [&shape, size](benchmark::State &s) {
       ratioRow(s, "CLI_udfREPLACE2", {lob(shape.text), lob(shape.needle), lob("yz")}, lobArea(),
-               shape.name);
+               shape.name, size);
     });
-  }
+  };
+  for (const SearchShape &shape : kShapes) shapeRows(shape, std::string("1 MiB of ") + shape.name);
+  shapeRows(kShortText, kShortText.name);
   // Many matches: one every 100 bytes, and one at every byte, replaced by
   // one byte and by none.
   const std::string as(kMiB, 'a');
