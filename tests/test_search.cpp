@@ -2,6 +2,7 @@
 // models (tests/models/search.hpp) on small alphabets, where matches and
 // near-matches are frequent, and the limits that random inputs don't reach.
 #include <gtest/gtest.h>
+#include <pthread.h>
 
 #include <algorithm>
 #include <cstdint>
@@ -239,6 +240,43 @@ TEST(LocateReplaceInsert, ReplaceAgreesWithTheModelAtScale) {
     EXPECT_EQ(call("CLI_udfREPLACE2", {lob(as), lob("a"), lob(by)}, lobArea()),
               ok(orv::model::replace(as, "a", by)));
   }
+}
+
+// A megabyte made to defeat every filter, searched on a thread of 64 KiB of
+// stack, where a search whose depth of calls grew with the text would die.
+// The text is copies of a random 53-byte period over a and b, every 64th
+// with one byte at a random place changed to c; the needle is 1300 copies,
+// so that its probes pass at every copy and full comparisons fail far in at
+// places that differ from copy to copy.  Its first match starts just behind
+// the last changed copy.
+TEST(LocateReplaceInsert, TextMadeToDefeatTheFilterNeedsNoDeepStack) {
+  static std::string hay, needle;
+  static std::size_t at = 0;  // where the match starts, counted from 0
+  std::mt19937 rng(6502);
+  std::string unit = randomText(rng, "ab", 0);
+  while (unit.size() < 53) unit += "ab"[rng() % 2];
+  const std::size_t copies = 19784, k = 1300, lastChanged = (copies - k - 1) / 64 * 64;
+  for (std::size_t c = 0; c < copies; ++c) {
+    hay += unit;
+    if (c % 64 == 0 && c <= lastChanged) hay[hay.size() - 1 - rng() % 53] = 'c';
+  }
+  for (std::size_t c = 0; c < k; ++c) needle += unit;
+  at = (lastChanged + 1) * 53;
+  static Outcome located, replaced;
+  const auto work = [](void *) -> void * {
+    located = call("CLI_udfLOCATE4", {lob(needle), lob(hay)}, intArea());
+    replaced = call("CLI_udfREPLACE2", {lob(hay), lob(needle), lob("X")}, lobArea());
+    return nullptr;
+  };
+  pthread_attr_t attr;
+  pthread_t thread;
+  ASSERT_EQ(pthread_attr_init(&attr), 0);
+  ASSERT_EQ(pthread_attr_setstacksize(&attr, std::size_t{64} << 10), 0);
+  ASSERT_EQ(pthread_create(&thread, &attr, work, nullptr), 0);
+  ASSERT_EQ(pthread_join(thread, nullptr), 0);
+  pthread_attr_destroy(&attr);
+  EXPECT_EQ(located, n(static_cast<std::int64_t>(at + 1)));
+  EXPECT_EQ(replaced, ok(hay.substr(0, at) + "X" + hay.substr(at + needle.size())));
 }
 
 }  // namespace

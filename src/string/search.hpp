@@ -8,7 +8,9 @@
 // few bytes per attempt.  The search here finds the same first match in
 // stages; each stage counts what its failed attempts cost and hands over
 // to the next once that passes what the scan itself costs, so the whole
-// stays linear:
+// stays linear.  A stage that hands over returns, and a loop runs the next,
+// so that no stage calls another and the depth of calls is the same for
+// every text:
 //
 //  1. The needle's rarest byte, by a rough table of how often bytes occur
 //     in text, is looked for with the C library's memchr, the fastest scan
@@ -87,18 +89,35 @@ class Searcher {
         return hit == nullptr ? kNotFound
                               : static_cast<std::size_t>(static_cast<const Byte *>(hit) - h_);
       }
-      switch (stage_) {
-        case Stage::rareByte:
-          return rareByte(from);
-        case Stage::filter:
-          return filtered(from);
-        default:
-          return twoWayFind(from);
+      // A stage that hands over returns kHandOver, and the next stage goes
+      // on from where the budget of the new one starts.  The first stage
+      // hands over only to the filter, and the rest run in a loop.
+      if (stage_ == Stage::rareByte) {
+        const std::size_t at = rareByte(from);
+        if (at != kHandOver) return at;
+        from = since_;
       }
+      return laterStages(from);
     }
 
    private:
     enum class Stage : std::uint8_t { rareByte, filter, twoWay };
+
+    // What a stage returns when it leaves the rest to the next one; never a
+    // position, which is below the haystack's size.
+    static constexpr std::size_t kHandOver = kNotFound - 1;
+
+    // The filter, with its offsets chosen again twice at most, and Two-Way,
+    // which never hands over: the loop turns at most four times, and no
+    // stage calls another.
+    std::size_t laterStages(std::size_t from) noexcept {
+      for (;;) {
+        if (stage_ == Stage::twoWay) return twoWayFind(from);
+        const std::size_t at = filtered(from);
+        if (at != kHandOver) return at;
+        from = since_;
+      }
+    }
 
     // What one place that the current stage tries but that fails in full
     // counts, in bytes of scanning, besides the bytes it compares: a
@@ -183,23 +202,22 @@ class Searcher {
 
     // The current stage passes too many places that fail from `from` on:
     // go on to the filter, choose its offsets again from the haystack there,
-    // or leave the rest to Two-Way.
+    // or leave the rest to Two-Way.  The stage that called returns what this
+    // returns, and next() runs the new stage from `from`.
     std::size_t adapt(std::size_t from) noexcept {
       const std::size_t last = n_ - s_.m_;
       if (stage_ == Stage::rareByte) {
         leave(Stage::filter, from);
-        return filtered(from);
-      }
-      if (choices_ < kChoices && from <= last && last - from + 1 >= kSample) {
+      } else if (choices_ < kChoices && from <= last && last - from + 1 >= kSample) {
         // The first choice stops once the sample is ruled out; should that
         // prove too few offsets, the second takes all eight.
         leave(Stage::filter, from);
         pickFromSample(from, choices_ == 0 ? 2 : kMaxProbes);
         ++choices_;
-        return filtered(from);
+      } else {
+        leave(Stage::twoWay, from);
       }
-      leave(Stage::twoWay, from);
-      return twoWayFind(from);
+      return kHandOver;
     }
 
     // Goes on to `stage` with nothing spent from `from` on.
@@ -272,7 +290,7 @@ class Searcher {
     // ---- Two-Way --------------------------------------------------------
 
     std::size_t twoWayFind(std::size_t from) noexcept {
-      if (n_ - from < s_.m_) return kNotFound;
+      if (from > n_ || n_ - from < s_.m_) return kNotFound;
       if (!factored_) factor();
       const Byte *h = h_ + from;
       const std::size_t n = n_ - from, m = s_.m_;
