@@ -15,7 +15,9 @@
 //  1. The needle's rarest byte, by a rough table of how often bytes occur
 //     in text, is looked for with the C library's memchr, the fastest scan
 //     there is while that byte is rare in the haystack too; each place
-//     found is tried.
+//     found is tried.  Of a long needle only both ends and a sample between
+//     them are looked at for that byte: nothing here costs time per needle
+//     byte before the scan needs it.
 //  2. A filter tests 16 or 32 positions at once: do the haystack's bytes at
 //     a few chosen offsets of the needle equal the needle's there?  Only
 //     the positions that pass are compared in full.  The first two offsets
@@ -380,25 +382,46 @@ class Searcher {
   };
 
  private:
+  // Of a needle longer than kLookedAt bytes, the first pair is chosen among
+  // its first and last kEnds bytes and kSpread bytes spread evenly between.
+  static constexpr std::size_t kEnds = 128, kSpread = 256, kLookedAt = 2 * kEnds + kSpread;
+
   // The first pair of offsets: the rarest byte's last place, and the first
   // place of the rarest other byte (of the same byte where there is no
-  // other, at the far end).
+  // other, at the far end), among the bytes looked at.
   void pickByRank() noexcept {
+    if (m_ <= kLookedAt) {
+      pickAmong(x_, m_, [](std::size_t i) { return i; });
+      return;
+    }
+    const std::size_t step = (m_ - 2 * kEnds) / kSpread;
+    const auto offsetOf = [&](std::size_t i) {
+      return i < kEnds ? i : i < kEnds + kSpread ? kEnds + (i - kEnds) * step : m_ - kLookedAt + i;
+    };
+    Byte sample[kLookedAt];
+    for (std::size_t i = 0; i < kLookedAt; ++i) sample[i] = x_[offsetOf(i)];
+    pickAmong(sample, kLookedAt, offsetOf);
+  }
+
+  // The pair among the n bytes at `bytes`, of which byte i stands at
+  // offsetOf(i) in the needle.
+  template <class OffsetOf>
+  void pickAmong(const Byte *bytes, std::size_t n, OffsetOf offsetOf) noexcept {
     const auto &rank = search_detail::kByteRank;
     std::size_t a = 0;
-    for (std::size_t i = 1; i < m_; ++i) {
-      if (rank[x_[i]] <= rank[x_[a]]) a = i;
+    for (std::size_t i = 1; i < n; ++i) {
+      if (rank[bytes[i]] <= rank[bytes[a]]) a = i;
     }
     std::size_t b = kNotFound;
-    for (std::size_t i = 0; i < m_; ++i) {
-      if (x_[i] != x_[a] && (b == kNotFound || rank[x_[i]] < rank[x_[b]])) b = i;
+    for (std::size_t i = 0; i < n; ++i) {
+      if (bytes[i] != bytes[a] && (b == kNotFound || rank[bytes[i]] < rank[bytes[b]])) b = i;
     }
-    if (b == kNotFound) b = a == 0 ? m_ - 1 : 0;
+    if (b == kNotFound) b = a == 0 ? n - 1 : 0;
     first_.count = 2;
-    first_.offset[0] = a;
-    first_.offset[1] = b;
-    first_.byte[0] = x_[a];
-    first_.byte[1] = x_[b];
+    first_.offset[0] = offsetOf(a);
+    first_.offset[1] = offsetOf(b);
+    first_.byte[0] = bytes[a];
+    first_.byte[1] = bytes[b];
   }
 
   const Byte *x_;
