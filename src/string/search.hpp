@@ -29,9 +29,14 @@
 //     the offsets are chosen from the haystack at hand, twice at most: the
 //     ones at which the fewest of the next 64 positions agree with the
 //     needle, enough to rule them all out the first time, eight the second.
+//     The offsets tried are a sample of the needle's and the last few at
+//     which full comparisons failed, so that a needle that differs from the
+//     text at one place anywhere is told apart by that place.
 //  4. Text that defeats even that (made to, or with a needle whose telling
 //     bytes the sample can't see) goes to Two-Way (Crochemore and Perrin),
-//     which compares at most about 2n bytes with O(1) memory.
+//     which compares at most about 2n bytes with O(1) memory.  Only this
+//     stage reads the whole needle before it scans, to factor it, and runs
+//     of whole periods in the needle are read a word at a time.
 //
 // Nothing is allocated.  The filter's inner loop is a kernel for the widest
 // instruction set the processor has (search_kernels.hpp).
@@ -165,6 +170,7 @@ class Searcher {
             return at;
           }
           spent_ += kMissCost + i;
+          learn(i);
           if (overBudget(at)) return adapt(at + 1);
         }
         if (next > last) return kNotFound;
@@ -194,6 +200,7 @@ class Searcher {
             if (overBudget(at)) leave(Stage::filter, at + 1);
             return at;
           }
+          learn(i);
         }
         spent_ += kMissCost + i;
         if (overBudget(at)) return adapt(at + 1);
@@ -222,6 +229,17 @@ class Searcher {
       return kHandOver;
     }
 
+    // The offset at which a full comparison failed, kept among the last
+    // kLearned distinct ones for the next choice of offsets.
+    void learn(std::size_t offset) noexcept {
+      for (std::size_t k = 0; k < learnedCount_; ++k) {
+        if (learned_[k] == offset) return;
+      }
+      learned_[learnedNext_] = offset;
+      learnedNext_ = (learnedNext_ + 1) % kLearned;
+      if (learnedCount_ < kLearned) ++learnedCount_;
+    }
+
     // Goes on to `stage` with nothing spent from `from` on.
     void leave(Stage stage, std::size_t from) noexcept {
       stage_ = stage;
@@ -233,28 +251,38 @@ class Searcher {
 
     static constexpr std::size_t kSample = 64;  // positions, one bit each
     static constexpr std::size_t kSampledOffsets = 256;
+    static constexpr std::size_t kLearned = 4;
+    static constexpr std::size_t kOffsets = kLearned + kSampledOffsets;
 
     // The offsets of the needle whose bytes the fewest of the positions
     // [from, from + 64) agree with, added one at a time while each still
     // rules out more of them, at least `least` and up to eight.
     void pickFromSample(std::size_t from, std::size_t least) noexcept {
       const std::size_t m = s_.m_;
-      std::size_t offsets[kSampledOffsets];
-      std::uint64_t agree[kSampledOffsets];
-      // Every offset of a short needle; of a long one the 64 at each end
-      // and 128 spread between them.
-      const std::size_t k = m <= kSampledOffsets ? m : kSampledOffsets;
+      std::size_t offsets[kOffsets];
+      std::uint64_t agree[kOffsets];
+      // The offsets where full comparisons failed, then every offset of a
+      // short needle, or of a long one the 64 at each end and 128 spread
+      // between them, but for those learnt.
+      std::size_t k = 0;
+      for (; k < learnedCount_; ++k) offsets[k] = learned_[k];
+      const std::size_t sampled = m <= kSampledOffsets ? m : kSampledOffsets;
+      for (std::size_t c = 0; c < sampled; ++c) {
+        const std::size_t offset = m <= kSampledOffsets ? c
+                                   : c < 64             ? c
+                                   : c >= 192           ? m - 256 + c
+                                                        : 64 + (c - 64) * (m - 128) / 128;
+        bool learnt = false;
+        for (std::size_t l = 0; l < learnedCount_; ++l) learnt = learnt || learned_[l] == offset;
+        if (!learnt) offsets[k++] = offset;
+      }
       for (std::size_t c = 0; c < k; ++c) {
-        offsets[c] = m <= kSampledOffsets ? c
-                     : c < 64             ? c
-                     : c >= 192           ? m - 256 + c
-                                          : 64 + (c - 64) * (m - 128) / 128;
         agree[c] = s_.kernel_->agree64(h_ + from + offsets[c], s_.x_[offsets[c]]);
       }
       // Each round takes the unused offset that leaves the fewest positions
       // alive, the rarer byte in the sample on a tie.
       std::uint64_t alive = ~std::uint64_t{0};
-      bool used[kSampledOffsets] = {};
+      bool used[kOffsets] = {};
       std::size_t chosen[kMaxProbes];
       std::size_t n = 0;
       while (n < kMaxProbes && !(n >= least && alive == 0)) {
@@ -292,24 +320,28 @@ class Searcher {
     // ---- Two-Way --------------------------------------------------------
 
     std::size_t twoWayFind(std::size_t from) noexcept {
-      if (from > n_ || n_ - from < s_.m_) return kNotFound;
       if (!factored_) factor();
-      const Byte *h = h_ + from;
-      const std::size_t n = n_ - from, m = s_.m_;
       const Byte *x = s_.x_;
-      std::size_t j = 0, memory = 0;
-      while (j <= n - m) {
-        const std::size_t start = suffix_ > memory ? suffix_ : memory;
-        std::size_t i = start < m && x[start] != h[j + start]
-                            ? start
-                            : search_detail::mismatch(x, h + j, start, m);
+      const std::size_t m = s_.m_, last = n_ - m, s = suffix_;
+      const Byte first = x[s];
+      std::size_t j = from, memory = 0;
+      while (j <= last) {
+        if (memory == 0 && h_[j + s] != first) {
+          // Two-Way moves on by one place while the first byte it compares
+          // differs; memchr finds the next place where it doesn't.
+          const void *hit = std::memchr(h_ + j + s + 1, first, last - j);
+          if (hit == nullptr) return kNotFound;
+          j = static_cast<std::size_t>(static_cast<const Byte *>(hit) - h_) - s;
+        }
+        const std::size_t start = s > memory ? s : memory;
+        std::size_t i = search_detail::mismatch(x, h_ + j, start, m);
         if (i < m) {
-          j += i - suffix_ + 1;
+          j += i - s + 1;
           memory = 0;
           continue;
         }
-        i = search_detail::mismatchDown(x, h + j, suffix_, memory);
-        if (i + 1 < memory + 1) return from + j;
+        i = search_detail::mismatchDown(x, h_ + j, s, memory);
+        if (i + 1 < memory + 1) return j;
         j += period_;
         memory = periodic_ ? m - period_ : 0;
       }
@@ -337,23 +369,34 @@ class Searcher {
       std::size_t period;
     };
     // The maximal suffix of the needle and its period, by Crochemore and
-    // Perrin; unsigned arithmetic wraps start from -1 on purpose.
+    // Perrin; unsigned arithmetic wraps start from -1 on purpose.  The
+    // candidate x[start + 1, j + k) has period p, and j - start is a multiple
+    // of p, so that comparing x[j + k] with x[start + k] compares it with
+    // x[j + k - p]: once a whole period agrees, the bytes that go on agreeing
+    // are found a word at a time, which makes a needle of short period cost
+    // about what reading it costs.
     [[nodiscard]] Suffix maximalSuffix(bool reversed) const noexcept {
       const Byte *x = s_.x_;
+      const std::size_t m = s_.m_;
       std::size_t start = kNotFound, j = 0, k = 1, p = 1;
-      while (j + k < s_.m_) {
+      while (j + k < m) {
         const Byte a = x[j + k], b = x[start + k];
-        if (reversed ? b < a : a < b) {
+        if (a == b) {
+          if (k != p) {
+            ++k;
+            continue;
+          }
+          j += p;
+          // From q = j + 1 on, the first place where x[q] != x[q - p], d
+          // bytes on: j moves by the whole periods in d, k by the rest.
+          const std::size_t q = j + 1;
+          const std::size_t d = q < m ? search_detail::mismatch(x + p, x, q - p, m - p) + p - q : 0;
+          j += d / p * p;
+          k = d % p + 1;
+        } else if (reversed ? b < a : a < b) {
           j += k;
           k = 1;
           p = j - start;
-        } else if (a == b) {
-          if (k != p) {
-            ++k;
-          } else {
-            j += p;
-            k = 1;
-          }
         } else {
           start = j++;
           k = p = 1;
@@ -371,6 +414,9 @@ class Searcher {
     std::size_t spent_ = 0;  // bytes' worth of failed full comparisons since `since_`
     std::size_t since_ = 0;
     int choices_ = 0;
+
+    std::size_t learned_[kLearned] = {};  // offsets where full comparisons failed
+    std::size_t learnedCount_ = 0, learnedNext_ = 0;
 
     std::uint64_t pending_ = 0;  // positions of the last block not yet tried, if any
     std::size_t pendingBase_ = 0;
