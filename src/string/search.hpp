@@ -36,7 +36,10 @@
 //     bytes the sample can't see) goes to Two-Way (Crochemore and Perrin),
 //     which compares at most about 2n bytes with O(1) memory.  Only this
 //     stage reads the whole needle before it scans, to factor it, and runs
-//     of whole periods in the needle are read a word at a time.
+//     of whole periods in the needle are read a word at a time.  Text made
+//     to defeat the filter is mostly near-copies of a periodic needle: there
+//     a place can only match where the text repeats itself at the needle's
+//     period, and one place where it doesn't rules out the places before.
 //
 // Nothing is allocated.  The filter's inner loop is a kernel for the widest
 // instruction set the processor has (search_kernels.hpp).
@@ -129,8 +132,9 @@ class Searcher {
     // What one place that the current stage tries but that fails in full
     // counts, in bytes of scanning, besides the bytes it compares: a
     // mispredicted branch and a comparison cost about as much as the filter
-    // takes for 256 positions.
+    // takes for 256 positions.  A byte compared costs about four scanned.
     static constexpr std::size_t kMissCost = 256;
+    static constexpr std::size_t kCompareCost = 4;
     // What one call of memchr that ends in a match counts.
     static constexpr std::size_t kCallCost = 64;
     // Scanning allowed before a stage is judged.
@@ -139,7 +143,7 @@ class Searcher {
     // misses the last choice may cost before Two-Way, which compares about
     // two bytes per haystack byte, would be the faster.
     static constexpr int kChoices = 2;
-    static constexpr std::size_t kLastChoiceAllowance = 16;
+    static constexpr std::size_t kLastChoiceAllowance = 8;
 
     [[nodiscard]] bool overBudget(std::size_t at) const noexcept {
       const std::size_t allowance = choices_ == kChoices ? kLastChoiceAllowance : 1;
@@ -169,7 +173,7 @@ class Searcher {
             pendingBase_ = base;
             return at;
           }
-          spent_ += kMissCost + i;
+          spent_ += kMissCost + kCompareCost * i;
           learn(i);
           if (overBudget(at)) return adapt(at + 1);
         }
@@ -202,7 +206,7 @@ class Searcher {
           }
           learn(i);
         }
-        spent_ += kMissCost + i;
+        spent_ += kMissCost + kCompareCost * i;
         if (overBudget(at)) return adapt(at + 1);
         j = at + 1;
       }
@@ -322,16 +326,34 @@ class Searcher {
     std::size_t twoWayFind(std::size_t from) noexcept {
       if (!factored_) factor();
       const Byte *x = s_.x_;
-      const std::size_t m = s_.m_, last = n_ - m, s = suffix_;
+      const std::size_t m = s_.m_, last = n_ - m, s = suffix_, p = period_;
       const Byte first = x[s];
       std::size_t j = from, memory = 0;
+      // The haystack is known to repeat itself at distance p from j + p or
+      // before up to cleanTo.
+      std::size_t cleanTo = 0;
       while (j <= last) {
+        // A needle of period p matches only where the haystack repeats
+        // itself at distance p over [j + p, j + m), h[t] == h[t - p].  The
+        // window is looked at from its end down to what is known, so that
+        // each byte is looked at once; a break at t rules out every place up
+        // to t - p, and what lies above it is known to repeat.
+        if (periodic_ && cleanTo < j + m) {
+          const std::size_t low = cleanTo > j + p ? cleanTo : j + p;
+          const std::size_t i = search_detail::mismatchDown(h_, h_ + p, j + m - p, low - p);
+          cleanTo = j + m;
+          if (i + 1 != low - p) {  // a break at i + p
+            j = i + 1;
+            memory = 0;
+            continue;
+          }
+        }
         if (memory == 0 && h_[j + s] != first) {
           // Two-Way moves on by one place while the first byte it compares
-          // differs; memchr finds the next place where it doesn't.
-          const void *hit = std::memchr(h_ + j + s + 1, first, last - j);
-          if (hit == nullptr) return kNotFound;
-          j = static_cast<std::size_t>(static_cast<const Byte *>(hit) - h_) - s;
+          // differs: the next place where it doesn't is found in one word,
+          // or else by memchr.
+          j = nextWith(first, s, j + 1);
+          if (j == kNotFound) return kNotFound;
         }
         const std::size_t start = s > memory ? s : memory;
         std::size_t i = search_detail::mismatch(x, h_ + j, start, m);
@@ -346,6 +368,23 @@ class Searcher {
         memory = periodic_ ? m - period_ : 0;
       }
       return kNotFound;
+    }
+
+    // The first place j, from `from` to the last, where the haystack holds
+    // `byte` at j + offset; kNotFound if none.
+    [[nodiscard]] std::size_t nextWith(Byte byte, std::size_t offset,
+                                       std::size_t from) const noexcept {
+      const std::size_t last = n_ - s_.m_;
+      if (from > last) return kNotFound;
+      if (last - from >= 8) {
+        const std::size_t at = search_detail::firstEqual(h_ + from + offset, byte);
+        if (at < 8) return from + at;
+        from += 8;
+      }
+      const void *hit = std::memchr(h_ + from + offset, byte, last - from + 1);
+      return hit == nullptr
+                 ? kNotFound
+                 : static_cast<std::size_t>(static_cast<const Byte *>(hit) - h_) - offset;
     }
 
     // The critical factorization: the later of the two maximal suffixes,

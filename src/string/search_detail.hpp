@@ -1,5 +1,6 @@
 // The searcher's small parts: word-at-a-time comparison of byte ranges,
-// both ways, and a rough table of how common each byte is in text.
+// both ways, the first of eight bytes equal to one, and a rough table of how common each byte is in
+// text.
 #pragma once
 
 #include <array>
@@ -33,6 +34,16 @@ inline std::size_t mismatch(const Byte *a, const Byte *b, std::size_t from,
   }
   while (i < to && a[i] == b[i]) ++i;
   return i;
+}
+
+// The first i below 8 where p[i] == byte, or 8.  Only a zero byte of the
+// difference sets its high bit with no borrow from below, so the lowest bit
+// set marks the first equal byte.
+inline std::size_t firstEqual(const Byte *p, Byte byte) noexcept {
+  constexpr std::uint64_t ones = 0x0101010101010101ULL;
+  const std::uint64_t d = word(p) ^ (ones * byte);
+  const std::uint64_t zero = (d - ones) & ~d & (ones << 7);
+  return zero == 0 ? 8 : static_cast<std::size_t>(std::countr_zero(zero)) / 8;
 }
 
 // Going down from `from` (exclusive) to `floor`: the highest i below `from`
