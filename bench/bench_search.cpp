@@ -5,12 +5,13 @@
 // search string and text.  The shapes are those that make searches slow:
 // needles of 'a' with one 'b' (quadratic when searched naively), periodic
 // text with a needle that breaks the period at one end or in the middle,
-// small alphabets, and needles of 64 and 128 KiB, where what the needle
-// costs to prepare counts.
+// small alphabets, needles of 64 and 128 KiB, where what the needle costs
+// to prepare counts, and text made to defeat the filter.
 #include <chrono>
 #include <cstdint>
 #include <cstring>
 #include <string>
+#include <utility>
 
 #include "bench_support.hpp"
 
@@ -88,6 +89,24 @@ std::string oneLonger(const std::string &needle) {
 
 constexpr std::size_t k64 = std::size_t{1} << 16, k128 = std::size_t{1} << 17;
 
+// Text made to defeat the filter: copies of a random period of `unit` bytes
+// over a and b, one copy in `every` with a byte at a random place changed to
+// c; the needle is the period repeated to 64 KiB, which nearly matches at
+// every copy.  The search string first, then the text.
+std::pair<std::string, std::string> nearCopies(std::size_t unit, std::size_t every) {
+  std::uint64_t state = unit * 31 + every;
+  const auto next = [&state] {
+    state = state * 6364136223846793005ULL + 1442695040888963407ULL;
+    return static_cast<std::size_t>(state >> 33);
+  };
+  std::string period(unit, 'a');
+  for (char &c : period) c = "ab"[next() % 2];
+  std::string text = repeated(period, kMiB);
+  for (std::size_t copy = 0; copy < kMiB / unit; copy += every)
+    text[copy * unit + next() % unit] = 'c';
+  return {repeated(period, k64), text};
+}
+
 struct SearchShape {
   const char *name;
   std::string needle, text;
@@ -118,6 +137,9 @@ const SearchShape kShapes[] = {
     {"abcabc, 128 KiB abc..!..abc", brokenInTheMiddle("abc", k128), repeated("abc", kMiB)},
     {"text, 64 KiB, its first half common", commonPrefix(k64), words(kMiB)},
     {"text, 128 KiB, its first half common", commonPrefix(k128), words(kMiB)},
+    {"53-byte copies, 1 in 64 changed, 64 KiB", nearCopies(53, 64).first,
+     nearCopies(53, 64).second},
+    {"20-byte copies, 1 in 2 changed, 64 KiB", nearCopies(20, 2).first, nearCopies(20, 2).second},
 };
 // The text one byte longer than a 128 KiB needle of random bytes: nearly
 // all the time goes into what the needle costs to prepare.
