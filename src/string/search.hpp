@@ -234,8 +234,13 @@ class Searcher {
     }
 
     // The offset at which a full comparison failed, kept among the last
-    // kLearned distinct ones for the next choice of offsets.
+    // kLearned distinct ones for the next choice of offsets, unless the
+    // sample holds it anyway: every offset of a short needle and the 64 at
+    // each end of a long one.  Random text fails early and often, and then
+    // this costs no more than a comparison.
     void learn(std::size_t offset) noexcept {
+      const std::size_t m = s_.m_;
+      if (m <= kSampledOffsets || offset < 64 || offset >= m - 64) return;
       for (std::size_t k = 0; k < learnedCount_; ++k) {
         if (learned_[k] == offset) return;
       }
