@@ -119,8 +119,9 @@ class Searcher {
 
     // The filter, with its offsets chosen again twice at most, and Two-Way,
     // which never hands over: the loop turns at most four times, and no
-    // stage calls another.
-    std::size_t laterStages(std::size_t from) noexcept {
+    // stage calls another.  Kept out of line, so that a short search that
+    // the first stage ends pays nothing for the others.
+    [[gnu::noinline]] std::size_t laterStages(std::size_t from) noexcept {
       for (;;) {
         if (stage_ == Stage::twoWay) return twoWayFind(from);
         const std::size_t at = filtered(from);
