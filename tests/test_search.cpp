@@ -251,18 +251,16 @@ TEST(LocateReplaceInsert, ReplaceAgreesWithTheModelAtScale) {
 // the last changed copy.
 TEST(LocateReplaceInsert, TextMadeToDefeatTheFilterNeedsNoDeepStack) {
   static std::string hay, needle;
-  static std::size_t at = 0;  // where the match starts, counted from 0
+  static Outcome located, replaced;
   std::mt19937 rng(6502);
-  std::string unit = randomText(rng, "ab", 0);
-  while (unit.size() < 53) unit += "ab"[rng() % 2];
+  std::string unit(53, 'a');
+  for (char &c : unit) c = "ab"[rng() % 2];
   const std::size_t copies = 19784, k = 1300, lastChanged = (copies - k - 1) / 64 * 64;
   for (std::size_t c = 0; c < copies; ++c) {
     hay += unit;
     if (c % 64 == 0 && c <= lastChanged) hay[hay.size() - 1 - rng() % 53] = 'c';
   }
   for (std::size_t c = 0; c < k; ++c) needle += unit;
-  at = (lastChanged + 1) * 53;
-  static Outcome located, replaced;
   const auto work = [](void *) -> void * {
     located = call("CLI_udfLOCATE4", {lob(needle), lob(hay)}, intArea());
     replaced = call("CLI_udfREPLACE2", {lob(hay), lob(needle), lob("X")}, lobArea());
@@ -275,6 +273,7 @@ TEST(LocateReplaceInsert, TextMadeToDefeatTheFilterNeedsNoDeepStack) {
   ASSERT_EQ(pthread_create(&thread, &attr, work, nullptr), 0);
   ASSERT_EQ(pthread_join(thread, nullptr), 0);
   pthread_attr_destroy(&attr);
+  const std::size_t at = (lastChanged + 1) * 53;  // where the match starts, counted from 0
   EXPECT_EQ(located, n(static_cast<std::int64_t>(at + 1)));
   EXPECT_EQ(replaced, ok(hay.substr(0, at) + "X" + hay.substr(at + needle.size())));
 }
