@@ -41,6 +41,16 @@ TEST(LocateReplaceInsert, KeepTheirLimits) {
       // A failure leaves the pieces so far as terminated text, for a one-byte search string too.
       {"CLI_udfREPLACE1", {text("ab" + std::string(3998, 'x')), text("x"), text("yy")}, textArea(), failsLeaving("10", "ab" + std::string(3998, 'y'))},
       {"CLI_udfREPLACE1", {text("ab" + std::string(3998, 'x')), text("a"), text("cc")}, textArea(), failsLeaving("10", "cc")},
+      {"CLI_udfINSERT1", {text("abcdef"), i32(3), i32(2), text("XY")}, textArea(), ok("abXYef")},
+      {"CLI_udfINSERT1", {text("abcdef"), i32(3), i32(0), text("XY")}, textArea(), ok("abXYcdef")},
+      {"CLI_udfINSERT1", {text("abcdef"), i32(6), i32(5), text("XY")}, textArea(), ok("abcdeXY")},
+      {"CLI_udfINSERT1", {text("abcdef"), i32(7), i32(0), text("XY")}, textArea(), fails("10")},
+      {"CLI_udfINSERT1", {text("abcdef"), i32(0), i32(0), text("XY")}, textArea(), fails("01")},
+      {"CLI_udfINSERT1", {text(""), i32(1), i32(0), text("XY")}, textArea(), fails("10")},
+      {"CLI_udfINSERT1", {text("abcdef"), i32(3), i32(-1), text("XY")}, textArea(), fails("01")},
+      // A deletion longer than source and new string: only the CLI_udfLob form's check wraps.
+      {"CLI_udfINSERT1", {text("abcdef"), i32(3), i32(100), text("XY")}, textArea(), ok("abXY")},
+      {"CLI_udfINSERT2", {lob("abcdef"), i32(3), i32(100), lob("XY")}, lobArea(200), fails("10")},
       {"CLI_udfINSERT1", {text("abcdef"), i32(3), i32(-5000), text("XY")}, textArea(), fails("10")},
       // A length that would wrap p + l.
       {"CLI_udfINSERT1", {text("abcdef"), i32(3), i32(2147483647), text("XY")}, textArea(), fails("01")},

@@ -3,7 +3,6 @@
 // small alphabets, where matches and near-matches are frequent.
 #pragma once
 
-#include <algorithm>
 #include <cstdint>
 #include <string>
 #include <string_view>
@@ -39,22 +38,25 @@ struct Inserted {
   std::string bytes;
 };
 
-// INSERT of `add` over the l bytes from place p, in the terminated-text
-// form (lobForm false, limit 4000) or the CLI_udfLob form (limit its
-// capacity): the checks in their order, with s - l + i in the form's
-// 32-bit type.
+// INSERT of `add` over the l bytes from place p, step by step as defined:
+// the checks that raise 10, then those that raise 01, then the source's
+// first p - 1 bytes, `add` and what follows the deleted range.  The length
+// check reckons s - l + i modulo 2^32, read as a signed number by the
+// terminated-text form (lobForm false, limit 4000) and as an unsigned one
+// by the CLI_udfLob form (limit its capacity); a range that runs past the
+// source's end counts the result's true length p - 1 + i instead.
 inline Inserted insert(bool lobForm, std::string_view in, std::int64_t p, std::int64_t l,
                        std::string_view add, std::int64_t limit) {
   const auto s = static_cast<std::int64_t>(in.size()), i = static_cast<std::int64_t>(add.size());
-  const auto wrapped = static_cast<std::uint32_t>(s - l + i);
-  const std::int64_t size = lobForm ? std::int64_t{wrapped} : static_cast<std::int32_t>(wrapped);
-  const std::int64_t trueSize = p - 1 + l > s ? p - 1 + i : s - l + i;
-  if (size > limit || p > s || (l >= 0 && trueSize > limit)) return {"10", {}};
+  constexpr std::int64_t kWord = std::int64_t{1} << 32;
+  std::int64_t reckoned = ((s - l + i) % kWord + kWord) % kWord;
+  if (!lobForm && reckoned >= kWord / 2) reckoned -= kWord;
+  const bool pastTheEnd = l >= 0 && p - 1 + l > s;
+  if (reckoned > limit || p > s || (pastTheEnd && p - 1 + i > limit)) return {"10", {}};
   if (p < 1 || (!lobForm && p > limit) || l < 0 || p + l > limit) return {"01", {}};
-  const auto head = static_cast<std::size_t>(p - 1);
-  const auto tail = static_cast<std::size_t>(std::min(p - 1 + l, s));
-  std::string out(in.substr(0, head));
-  out.append(add).append(in.substr(tail));
+  std::string out(in.substr(0, static_cast<std::size_t>(p - 1)));
+  out.append(add);
+  if (!pastTheEnd) out.append(in.substr(static_cast<std::size_t>(p - 1 + l)));
   return {"", out};
 }
 
