@@ -37,9 +37,7 @@ TEST(CharToDouble, ReadsDecimalTextAfterCuttingTrailingSpace) {
       {"nan", fails("11")},        {"1 5", fails("11")},
   };
   for (const auto &[text, want] : cases) {
-    EXPECT_EQ(call("CLI_udfCHARTODOUBLE", {orv::test::text(text)}, numberArea(Value::Layout::real)),
-              want)
-        << "'" << text << "'";
+    EXPECT_EQ(call("CLI_udfCHARTODOUBLE", {orv::test::text(text)}), want) << "'" << text << "'";
   }
 }
 
@@ -60,7 +58,7 @@ TEST(DoubleToChar, WritesTheShortNotationIn24BytesWhichReadsBack) {
       {-1.23456789012345e-100, "-1.23456789012345E-100"},
       {5e-324, "4.94065645841247E-324"}};
   for (const auto &[x, want] : cases) {
-    EXPECT_EQ(call("CLI_udfDOUBLETOCHAR", {f64(x)}, fixedArea(24)), ok(padded(want))) << x;
+    EXPECT_EQ(call("CLI_udfDOUBLETOCHAR", {f64(x)}), ok(padded(want))) << x;
   }
   const auto shaped = [](const std::string &t) {
     std::size_t i = t[0] == '-' ? 1 : 0;
@@ -77,26 +75,21 @@ TEST(DoubleToChar, WritesTheShortNotationIn24BytesWhichReadsBack) {
   };
   std::mt19937_64 rng(99);
   for (int i = 0; i < 3000; ++i) {
-    const double x = std::bit_cast<double>(rng());
+    const auto x = std::bit_cast<double>(rng());
     if (!std::isfinite(x)) continue;
-    const Outcome text = call("CLI_udfDOUBLETOCHAR", {f64(x)}, fixedArea(24));
+    const Outcome text = call("CLI_udfDOUBLETOCHAR", {f64(x)});
     const std::string t = text.bytes.substr(0, text.bytes.find(' '));
     ASSERT_TRUE(text.error.empty() && text.bytes == padded(t) && shaped(t)) << text.bytes;
     const double back = std::strtod(t.c_str(), nullptr);
     EXPECT_LE(std::fabs(back - x), std::max(std::fabs(x) * 5e-15, 5e-324)) << t;
     if (std::fabs(x) < 2.2250738585072014e-308) continue;
-    const Outcome read =
-        call("CLI_udfCHARTODOUBLE", {orv::test::text(t)}, numberArea(Value::Layout::real));
-    EXPECT_EQ(call("CLI_udfDOUBLETOCHAR", {f64(std::bit_cast<double>(read.number))}, fixedArea(24)),
-              text)
-        << t;
+    const Outcome read = call("CLI_udfCHARTODOUBLE", {orv::test::text(t)});
+    EXPECT_EQ(call("CLI_udfDOUBLETOCHAR", {f64(std::bit_cast<double>(read.number))}), text) << t;
   }
 }
 
 TEST(CollationName, NamesKnownIdentifiersAndGivesInvalidOtherwise) {
-  const auto named = [](const Value &id) {
-    return callNullable("CLI_udfCOLLATIONNAME", {id}, textArea(129));
-  };
+  const auto named = [](const Value &id) { return call("CLI_udfCOLLATIONNAME", {id}); };
   EXPECT_EQ(named(fixed(std::string(8, '\0'))), ok("IDENTITY"));
   EXPECT_EQ(named(fixed(std::string(8, '\xFF'))), ok("INVALID"));
   EXPECT_EQ(named(nullOf(fixed(std::string(8, '\0')))), ok("INVALID"));
@@ -166,8 +159,7 @@ const char *const kSmall = "CLI_udfVEBLOB_CP_SMALL";
 
 Outcome copy(const Value &object, std::int32_t from, std::int32_t to, std::int32_t order = 0,
              const char *routine = "CLI_udfVEBLOB_CP_LARGE") {
-  return callNullable(routine, {object, i32(from), i32(to), i32(order)},
-                      lobArea(cli::catalogue::find(routine)->results[0].size));
+  return call(routine, {object, i32(from), i32(to), i32(order)});
 }
 
 // A copy, which sets the result indicator to 1, and a refusal, which
@@ -276,9 +268,7 @@ TEST_F(Fakes, NamesFillOneFieldOfTheTimeRecordAndFailWithTheServiceOrTheConversi
 }
 
 TEST_F(Fakes, CollationNameTakesTheServicesLength) {
-  const auto named = [&] {
-    return callNullable("CLI_udfCOLLATIONNAME", {fixed(std::string(8, '\x07'))}, textArea(129));
-  };
+  const auto named = [&] { return call("CLI_udfCOLLATIONNAME", {fixed(std::string(8, '\x07'))}); };
   EXPECT_EQ(named(), ok("NAME"));
   EXPECT_EQ(fakes->lastCollationSize, 129u);
   for (std::int32_t length : {0, -1, 129}) {
@@ -286,18 +276,16 @@ TEST_F(Fakes, CollationNameTakesTheServicesLength) {
     EXPECT_EQ(named(), ok("INVALID")) << length;
   }
   const int calls = fakes->collationCalls;
-  callNullable("CLI_udfCOLLATIONNAME", {nullOf(fixed(std::string(8, '\0')))}, textArea(129));
+  call("CLI_udfCOLLATIONNAME", {nullOf(fixed(std::string(8, '\0')))});
   EXPECT_EQ(fakes->collationCalls, calls);
 }
 
 TEST_F(Fakes, NumberTextHandsOverTheTrimmedLengthAndShortensTheRawText) {
   fakes->a2fValue = 2.5;
-  EXPECT_EQ(call("CLI_udfCHARTODOUBLE", {text("12 \t\n")}, numberArea(Value::Layout::real)),
-            okReal(2.5));
+  EXPECT_EQ(call("CLI_udfCHARTODOUBLE", {text("12 \t\n")}), okReal(2.5));
   EXPECT_EQ(fakes->lastA2fLength, 2u);
   fakes->a2fStatus = -4;
-  EXPECT_EQ(call("CLI_udfCHARTODOUBLE", {text("12")}, numberArea(Value::Layout::real)),
-            fails("11"));
+  EXPECT_EQ(call("CLI_udfCHARTODOUBLE", {text("12")}), fails("11"));
   const std::pair<const char *, const char *> raw[] = {
       {"+1.00000000000000E+000", "1.0E0"},
       {"-9.87654321098765E-099", "-9.87654321098765E-99"},
@@ -305,7 +293,7 @@ TEST_F(Fakes, NumberTextHandsOverTheTrimmedLengthAndShortensTheRawText) {
   };
   for (const auto &[in, out] : raw) {
     std::memcpy(fakes->rawText, in, 23);
-    EXPECT_EQ(call("CLI_udfDOUBLETOCHAR", {f64(1.0)}, fixedArea(24)), ok(padded(out))) << in;
+    EXPECT_EQ(call("CLI_udfDOUBLETOCHAR", {f64(1.0)}), ok(padded(out))) << in;
   }
 }
 
