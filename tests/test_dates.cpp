@@ -12,13 +12,14 @@
 #include <cstdint>
 #include <cstdio>
 #include <cstring>
+#include <list>
 #include <random>
 #include <string>
 #include <string_view>
 #include <vector>
 
 #include "catalogue/catalogue.hpp"
-#include "frame/call.hpp"
+#include "frame/table_call.hpp"
 #include "models/calendar.hpp"
 #include "models/date_text.hpp"
 #include "models/duration.hpp"
@@ -47,51 +48,25 @@ void spell(char *out, const year_month_day &ymd, bool shortFields, const char *t
   std::memcpy(out, time, std::strlen(time) + 1);
 }
 
+// Both exports of each routine, one of which reads only the date at the
+// head of the text, are held against the date's numbers from <chrono>.
+// Each is laid out once over the same text, and the loop only changes
+// what the text holds.
 TEST(DateNumbers, AgreeWithChronoOnEveryDateOfTheCalendar) {
-  struct Routine {
-    const char *text;  // validates a time behind the date
-    const char *part;  // reads only the date
-    std::int32_t Numbers::*expected;
-  };
-  const Routine routines[] = {
-      {"CLI_udfJULIAN_DAY2", "CLI_udfJULIAN_DAY1", &Numbers::julian},
-      {"CLI_udfWEEK2", "CLI_udfWEEK1", &Numbers::week},
-      {"CLI_udfWEEK_ISO2", "CLI_udfWEEK_ISO1", &Numbers::isoWeek},
-      {"CLI_udfQUARTER2", "CLI_udfQUARTER1", &Numbers::quarter},
-      {"CLI_udfDAYOFYEAR2", "CLI_udfDAYOFYEAR1", &Numbers::ordinal},
-      {"CLI_udfDAYOFWEEK1", "CLI_udfDAYOFWEEK2", &Numbers::dayOfWeek},
-      {"CLI_udfDAYOFWEEK_ISO1", "CLI_udfDAYOFWEEK_ISO2", &Numbers::isoDayOfWeek},
-  };
-  // Each export is laid out once over the same buffers, and the loop only
-  // changes what they hold: every one of these takes a text and gives a
-  // 32-bit number, so all have the same count of arguments.
-  constexpr const cli::catalogue::Routine &kJulian = *cli::catalogue::find("CLI_udfJULIAN_DAY2");
-  constexpr std::size_t kArguments = cli::catalogue::argumentCount(kJulian);
+  const std::pair<const char *, std::int32_t Numbers::*> routines[] = {
+      {"JULIAN_DAY", &Numbers::julian},         {"WEEK", &Numbers::week},
+      {"WEEK_ISO", &Numbers::isoWeek},          {"QUARTER", &Numbers::quarter},
+      {"DAYOFYEAR", &Numbers::ordinal},         {"DAYOFWEEK", &Numbers::dayOfWeek},
+      {"DAYOFWEEK_ISO", &Numbers::isoDayOfWeek}};
   char text[40];
-  std::int32_t got = -1;
-  std::int16_t ind[2] = {};
-  cli::call::StatusBuffers status;
-  void *const inputs[] = {text};
-  void *const results[] = {&got};
-  std::int16_t *const indicators[] = {&ind[0], &ind[1]};
-  const cli::call::Frame frame =
-      cli::call::frameOf(kJulian, inputs, results, &indicators[0], &indicators[1], status);
-  struct Laid {
-    void *fn = nullptr;
-    void *args[cli::call::kMaxArguments] = {};
-  };
-  std::array<std::array<Laid, 2>, std::size(routines)> fns{};
-  for (std::size_t r = 0; r < std::size(routines); ++r) {
-    for (std::size_t form = 0; form < 2; ++form) {
-      const char *name = form == 0 ? routines[r].text : routines[r].part;
-      const cli::catalogue::Routine *row = cli::catalogue::find(name);
-      ASSERT_NE(row, nullptr) << name;
-      ASSERT_EQ(cli::catalogue::argumentCount(*row), kArguments) << name;
-      fns[r][form].fn = exportAddress(name);
-      cli::call::layOut(*row, frame, fns[r][form].args);
+  std::list<cli::call::TableCall> calls;
+  for (const auto &[name, expected] : routines) {
+    for (const cli::catalogue::Routine &row : cli::catalogue::kRoutines) {
+      if (std::string_view(row.sqlName) != name) continue;
+      calls.emplace_back(row, exportAddress(row.symbol)).setInput(0, text);
     }
-    ASSERT_TRUE(fns[r][0].fn != nullptr && fns[r][1].fn != nullptr);
   }
+  ASSERT_EQ(calls.size(), 14U);
   // Each date in full width, in short fields and with a time of day behind
   // it; trailing blanks on some.  The time must not change the number.
   const char *times[] = {"", "-23.59.59.999999", " 12:30:15", "   "};
@@ -99,21 +74,17 @@ TEST(DateNumbers, AgreeWithChronoOnEveryDateOfTheCalendar) {
   for (sys_days day = sys_days{year{1} / January / 1}; day <= sys_days{year{9999} / December / 31};
        day += days{1}) {
     const Numbers want = orv::model::numbersOf(day);
-    const year_month_day ymd{day};
     const auto n = static_cast<unsigned>(day.time_since_epoch().count());
-    for (std::size_t r = 0; r < std::size(routines); ++r) {
-      for (int form = 0; form < 2; ++form) {
-        status = {};
-        spell(text, ymd, ((n + r) & 1) != 0, times[(n + r + static_cast<unsigned>(form)) % 4]);
-        got = -1;
-        const Laid &e = fns[r][static_cast<std::size_t>(form)];
-        cli::call::invokeWith<kArguments>(e.fn, e.args);
-        if ((got != want.*routines[r].expected || status.stored()) && ++failures <= 10) {
-          ADD_FAILURE() << routines[r].part << "/" << form << " on " << text << ": " << got
-                        << ", want " << want.*routines[r].expected << " "
-                        << std::string(status.message, 9);
-        }
+    unsigned k = 0;
+    for (cli::call::TableCall &c : calls) {
+      const std::int32_t expected = want.*routines[k / 2].second;
+      spell(text, year_month_day{day}, ((n + k / 2) & 1) != 0, times[(n + k / 2 + k % 2) % 4]);
+      c.step(CLI_CALL_FETCH);
+      if ((c.number(0) != expected || c.status().stored()) && ++failures <= 10) {
+        ADD_FAILURE() << c.row().symbol << " on " << text << ": " << c.number(0) << ", want "
+                      << expected << " " << c.status().message;
       }
+      ++k;
     }
   }
   EXPECT_EQ(failures, 0);
@@ -123,12 +94,12 @@ TEST(DateText, IsTrimmedInTheCallersBuffer) {
   for (const char *input : {"2001-12-31  ", "2001-13-31  "}) {
     char buffer[16] = {};
     std::memcpy(buffer, input, std::strlen(input) + 1);
-    call("CLI_udfWEEK2", {placedAt(buffer)}, intArea());
+    call("CLI_udfWEEK2", {placedAt(buffer)});
     EXPECT_EQ(std::string(buffer, 12), std::string(input, 10) + std::string("\0 ", 2)) << input;
   }
   // TIMESTAMPDIFF reads its duration as it stands and leaves it so.
   char duration[] = "1.5  ";
-  EXPECT_EQ(call("CLI_udfTIMESTAMPDIFF", {i32(2), placedAt(duration)}, intArea()).number, 1);
+  EXPECT_EQ(call("CLI_udfTIMESTAMPDIFF", {i32(2), placedAt(duration)}).number, 1);
   EXPECT_EQ(std::string(duration, sizeof duration), std::string("1.5  ", sizeof duration));
 }
 
@@ -170,7 +141,7 @@ TEST(Timestamp, JoinsTheTextAsWrittenWithMidnightOrToday) {
         {"CLI_udfTIMESTAMPDATE", "2001-01-0000000000000000000005", fails("04")},
     };
     std::vector<Outcome> got;
-    for (const auto &c : cases) got.push_back(call(c.routine, {text(c.input)}, textArea(27)));
+    for (const auto &c : cases) got.push_back(call(c.routine, {text(c.input)}));
     if (today() != t) continue;
     for (std::size_t i = 0; i < got.size(); ++i) {
       EXPECT_EQ(got[i], cases[i].expected) << cases[i].routine << " on '" << cases[i].input << "'";
@@ -209,7 +180,7 @@ TEST(TimestampDiff, ConvertsDurationsByFixedRatios) {
       {4, "99991231235959", ok(std::int64_t{5256038879 - 4294967296})},
   };
   for (const auto &c : cases) {
-    EXPECT_EQ(call("CLI_udfTIMESTAMPDIFF", {i32(c.code), text(c.duration)}, intArea()), c.expected)
+    EXPECT_EQ(call("CLI_udfTIMESTAMPDIFF", {i32(c.code), text(c.duration)}), c.expected)
         << c.code << " '" << c.duration << "'";
     EXPECT_EQ(durationModel(c.code, c.duration), c.expected) << "model on '" << c.duration << "'";
   }
@@ -220,7 +191,7 @@ TEST(TimestampDiff, ConvertsDurationsByFixedRatios) {
     std::string d(std::uniform_int_distribution<std::size_t>(0, 22)(random), '0');
     for (char &c : d) c = alphabet[std::uniform_int_distribution<std::size_t>(0, 22)(random)];
     const std::int32_t code = 1 << std::uniform_int_distribution<int>(0, 9)(random);
-    const Outcome got = call("CLI_udfTIMESTAMPDIFF", {i32(code), text(d)}, intArea());
+    const Outcome got = call("CLI_udfTIMESTAMPDIFF", {i32(code), text(d)});
     ASSERT_EQ(got, durationModel(code, d)) << code << " '" << d << "'";
   }
 }
@@ -311,7 +282,7 @@ TEST(DateGrammar, AgreesWithAModelOnEdgesAndMutatedTexts) {
     }
     for (const auto &r : routines) {
       const dt::Answer want = r.expected(t);
-      const Outcome got = call(r.routine, {text(t)}, intArea());
+      const Outcome got = call(r.routine, {text(t)});
       if (got != (want.code.empty() ? ok(want.value) : fails(want.code)) && ++failures <= 10) {
         ADD_FAILURE() << r.routine << " on '" << t << "': " << testing::PrintToString(got);
       }
