@@ -6,6 +6,8 @@
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
+#include <optional>
+#include <string>
 
 #include "elements.hpp"
 #include "files.hpp"
@@ -31,19 +33,14 @@ uint8_t name(const CLI_nlsTimeRecord *time, uint32_t size, unsigned char *out, u
   return fakes.nameLength;
 }
 
-// Adds one entry to the trace of file and block services; an entry that
-// does not fit is dropped whole and the trace ends in "...".
-void trace(char kind, const long long *value = nullptr) {
-  char entry[32];
-  const int n = value == nullptr ? std::snprintf(entry, sizeof entry, "%c", kind)
-                                 : std::snprintf(entry, sizeof entry, "%c%lld", kind, *value);
+// Adds one entry to the trace of the services asked; a trace that would
+// pass its 4096 bytes is cut.
+void trace(char kind, std::optional<long long> value = {}) {
   const std::size_t used = std::strlen(fakes.trace);
-  if (used + static_cast<std::size_t>(n) + 5 < sizeof fakes.trace) {
-    std::snprintf(fakes.trace + used, sizeof fakes.trace - used, "%s%s", used == 0 ? "" : " ",
-                  entry);
-  } else if (used + 4 < sizeof fakes.trace) {
-    std::strcat(fakes.trace, " ...");
-  }
+  const std::string entry = (used == 0 ? std::string() : std::string(" ")) + kind +
+                            (value ? std::to_string(*value) : std::string());
+  static_cast<void>(
+      std::snprintf(fakes.trace + used, sizeof fakes.trace - used, "%s", entry.c_str()));
 }
 
 }  // namespace
@@ -104,7 +101,7 @@ int32_t sqlnlsCollIDMapIDToName(char *out, uint32_t size, const unsigned char *,
 }
 
 void *sqlo_get_static_data(void) {
-  ++fakes.staticDataCalls;
+  trace('s');
   const void *p = chain.p, *q = chain.q, *r = chain.r;
   std::memcpy(chain.head + 88, &p, sizeof p);
   std::memcpy(chain.p, &q, sizeof q);
@@ -121,7 +118,6 @@ int32_t sqleinstancepath(int32_t, char *path) {
 // The files are the stand-in's; the fakes count and fail.
 int32_t sqloopenp(const char *path, int32_t, int32_t, CLI_fileHandle *handle, int32_t) {
   const int32_t status = orv::standin::openFile(path, handle);
-  if (status == 0) ++fakes.opens;
   if (status == 0) trace('o');
   return status;
 }
@@ -130,47 +126,38 @@ int32_t sqloopenp(const char *path, int32_t, int32_t, CLI_fileHandle *handle, in
 // does, so a caller that hands it no word is caught.
 int32_t sqloread(CLI_fileHandle handle, void *out, uint32_t count, uint32_t *read) {
   *read = 0;
-  const long long n = count;
-  trace('r', &n);
-  if (++fakes.reads == fakes.failReadAt) return 1;
+  trace('r', count);
   return orv::standin::readFile(handle, out, count, read);
 }
 
 int32_t sqlochgfileptr(CLI_fileHandle handle, int64_t offset, int32_t origin, int32_t) {
-  const long long n = offset;
-  trace('m', &n);
-  if (fakes.seekFails != 0) return 1;
+  trace('m', offset);
   return orv::standin::moveIn(handle, offset, origin);
 }
 
 int32_t sqloclose(CLI_fileHandle handle) {
-  ++fakes.closes;
   trace('c');
   return orv::standin::closeFile(handle);
 }
 
 int32_t sqlogmblkEx(void *, uint64_t size, int32_t, void **block, const char *, int32_t, int32_t) {
-  const auto n = static_cast<long long>(size);
-  trace('a', &n);
+  trace('a', static_cast<long long>(size));
   if (fakes.allocationStatus != 0) return fakes.allocationStatus;
-  ++fakes.allocations;
   *block = std::malloc(size == 0 ? 1 : size);
   return *block == nullptr ? 1 : 0;
 }
 
 int32_t sqlofmblkEx(const char *, int32_t, void *block) {
-  ++fakes.frees;
   trace('f');
   std::free(block);
   return 0;
 }
 
 void sqlt_logerr_data(const char *message, const void *data, int32_t size, int32_t) {
-  ++fakes.logCalls;
   static_cast<void>(std::snprintf(fakes.logMessage, sizeof fakes.logMessage, "%s", message));
-  if (size == 4) std::memcpy(&fakes.logStatus, data, 4);
-  const long long n = fakes.logStatus;
-  trace('l', &n);
+  int32_t status = 0;
+  if (size == 4) std::memcpy(&status, data, 4);
+  trace('l', status);
 }
 
 void sqlm_filter_file_name(char *) {}

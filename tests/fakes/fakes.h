@@ -46,14 +46,10 @@ typedef struct OrvFakes {
   /* Snapshot services: real file reads on `instancePath`, with failures. */
   int32_t instanceStatus;
   char instancePath[264];
-  int failReadAt; /* the n-th sqloread fails (1-based); 0 never */
-  int seekFails;  /* sqlochgfileptr fails when set */
   int32_t allocationStatus;
-  int staticDataCalls, reads, opens, closes, allocations, frees, logCalls;
   char logMessage[128];
-  int32_t logStatus;
-  /* The file and block services asked, in order: "o" open, "rN" a read of
-   * N bytes, "mN" a move by N, "aN" a block of N bytes, "f" a free,
+  /* The services asked, in order: "s" the static data, "o" open, "rN" a
+   * read of N bytes, "mN" a move by N, "aN" a block of N bytes, "f" a free,
    * "lS" a log line with status S, "c" a close; blank-separated. */
   char trace[4096];
 } OrvFakes;

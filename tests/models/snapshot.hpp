@@ -1,6 +1,7 @@
 // SQLCACHE_SNAPSHOT over a file held in memory, step by step as the table
 // is defined, trusting the file as that definition does.  It writes the
-// services it would ask into a trace in the fake services' format, and
+// services it would ask into a trace in the fake services' format (the
+// static data on every entry, then the file and block services), and
 // keeps the scratchpad's fields, so that the routine can be held against
 // it on files cut at any byte.
 #pragma once
@@ -25,14 +26,16 @@ class SnapshotTable {
   std::string trace;
 
   void open() {
+    note('s');
     capacity = 0;
     block = false;
-    note("o");
+    note('o');
     closed = 0;
   }
 
   // A row as "section text:statement text", or nothing at the end.
   std::optional<std::string> fetch() {
+    note('s');
     if (closed != 0) return {};
     std::uint32_t size = 0;
     std::uint16_t id = 0;
@@ -44,7 +47,7 @@ class SnapshotTable {
         if (!header(size, id)) return {};
         std::string data;
         if (id == 19) {
-          note("m" + std::to_string(size));
+          note('m', size);
           at_ += size;
           rewind -= std::int64_t{size} + 8;
           continue;
@@ -58,7 +61,7 @@ class SnapshotTable {
         (id == 321 ? gotText : gotData) = true;
       }
       if (rewind != 0) {
-        note("m" + std::to_string(rewind));
+        note('m', rewind);
         at_ += static_cast<std::size_t>(rewind);
       }
       if (!header(size, id) || id != 19) return {};
@@ -66,8 +69,8 @@ class SnapshotTable {
       return {};
     }
     if (capacity < size) {
-      if (capacity > 0) note("f");
-      note("a" + std::to_string(size));
+      if (capacity > 0) note('f');
+      note('a', size);
       block = true;
       capacity = size;
     }
@@ -85,18 +88,23 @@ class SnapshotTable {
   }
 
   void close() {
+    note('s');
     if (closed != 0) return;
-    note("c");
-    if (capacity > 0) note("f");
+    note('c');
+    if (capacity > 0) note('f');
   }
 
  private:
-  void note(const std::string &entry) { trace += (trace.empty() ? "" : " ") + entry; }
+  void note(char kind, std::optional<std::int64_t> n = {}) {
+    if (!trace.empty()) trace += ' ';
+    trace += kind;
+    if (n) trace += std::to_string(*n);
+  }
 
   // A read delivers what the file still holds of the bytes asked for, as
   // a file read does, and fails when that is fewer.
   bool read(std::uint32_t n, std::string &out) {
-    note("r" + std::to_string(n));
+    note('r', n);
     out = at_ < file_.size() ? file_.substr(at_, n) : std::string();
     at_ += out.size();
     return out.size() == n;
