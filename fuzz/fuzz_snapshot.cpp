@@ -39,21 +39,20 @@ fs::path &file() {
 // Each argument has a block of its own, kept across calls and runs and
 // laid out afresh before every call.
 struct Table {
-  std::vector<Block> numbers;
-  Block text{9};
-  Block statement{CLI_LOB_AREA_SIZE(std::size_t{CLI_LOB_LIMIT})};
-  std::vector<Block> indicators;
-  Block scratchpad{100, 0};
-  Block sqlstate{CLI_SQLSTATE_SIZE}, message{CLI_MESSAGE_SIZE}, type{4};
+  std::vector<Block> numbers, indicators;
+  Block text{9}, statement{CLI_LOB_AREA_SIZE(std::size_t{CLI_LOB_LIMIT})};
+  Block scratchpad{100, 0}, sqlstate{CLI_SQLSTATE_SIZE}, message{CLI_MESSAGE_SIZE}, type{4};
   Export routine = lookUp(kName);
-  Arguments args;
+  Frame frame{sqlstate, message};
 
   Table() {
     for (int i = 0; i < 16; ++i) numbers.emplace_back(4);
     for (int i = 0; i < 18; ++i) indicators.emplace_back(2);
-    for (std::size_t i = 0; i < 16; ++i) args.result(numbers[i], indicators[i]);
-    args.result(text, indicators[16]).result(statement, indicators[17]);
-    args.status(sqlstate, message).scratchpad(scratchpad).callType(type);
+    for (std::size_t i = 0; i < 16; ++i) frame.result(numbers[i], indicators[i]);
+    frame.result(text, indicators[16]);
+    frame.result(statement, indicators[17]);
+    frame.f.scratchpad = scratchpad.data();
+    frame.f.callType = reinterpret_cast<std::int32_t *>(type.data());
   }
 
   // One call; returns the SQLSTATE's five characters, empty for none.
@@ -65,21 +64,22 @@ struct Table {
     std::memset(sqlstate.data(), 'S', sqlstate.size());
     std::memset(message.data(), 'M', message.size());
     std::memcpy(type.data(), &callType, 4);
-    args.call(routine);
-    ORV_CHECK(kName, Call::untouched(message, 'M'));
-    if (Call::untouched(sqlstate, 'S')) return {};
-    ORV_CHECK(kName, sqlstate.holds(std::string_view("02000\0", 6)));
+    frame.call(routine);
+    ORV_CHECK(kName, allAre(message.data(), message.size(), 'M'));
+    if (allAre(sqlstate.data(), sqlstate.size(), 'S')) return {};
+    ORV_CHECK(kName, sqlstate.view() == std::string_view("02000\0", 6));
     return "02000";
   }
 
   bool nothingWritten() const {
-    for (const Block &n : numbers) {
-      if (!allUnwritten(n.data(), 4)) return false;
+    for (std::size_t i = 0; i < 16; ++i) {
+      if (!allAre(numbers[i].data(), 4) || numberIn<std::int16_t>(indicators[i]) != kIndicator) {
+        return false;
+      }
     }
-    for (const Block &i : indicators) {
-      if (numberIn<std::int16_t>(i) != kIndicator) return false;
-    }
-    return allUnwritten(text.data(), text.size()) && allUnwritten(statement.data(), 8);
+    return numberIn<std::int16_t>(indicators[16]) == kIndicator &&
+           numberIn<std::int16_t>(indicators[17]) == kIndicator && allAre(text.data(), 9) &&
+           allAre(statement.data(), 8);
   }
 };
 
@@ -129,9 +129,8 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t *data, std::size_t size
     ORV_CHECK(kName, numberIn<std::int16_t>(t.indicators[16]) == kIndicator);
     for (int c = 0; c < 16; ++c) {
       const auto ind = numberIn<std::int16_t>(t.indicators[static_cast<std::size_t>(c)]);
-      ORV_CHECK(kName,
-                ind == 0 || (ind == kIndicator &&
-                             allUnwritten(t.numbers[static_cast<std::size_t>(c)].data(), 4)));
+      ORV_CHECK(kName, ind == 0 || (ind == kIndicator &&
+                                    allAre(t.numbers[static_cast<std::size_t>(c)].data(), 4)));
     }
     const std::string_view section = textIn(kName, t.text);
     ORV_CHECK(kName, section.size() <= 8);
@@ -139,11 +138,10 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t *data, std::size_t size
     const auto ind18 = numberIn<std::int16_t>(t.indicators[17]);
     ORV_CHECK(kName, ind18 == 0 || ind18 == kIndicator);
     if (ind18 == 0) {
-      const std::uint32_t length = lobLength(t.statement);
-      ORV_CHECK(kName, length < CLI_LOB_LIMIT);
-      const std::string_view statement = lobData(t.statement, length);
+      const std::string_view statement = lobIn(t.statement);
+      ORV_CHECK(kName, statement.size() < CLI_LOB_LIMIT);
       ORV_CHECK(kName, stream.find(statement) != std::string_view::npos);
-      ORV_CHECK(kName, t.statement.data()[CLI_LOB_DATA_OFFSET + length] == 0);
+      ORV_CHECK(kName, t.statement.data()[CLI_LOB_DATA_OFFSET + statement.size()] == 0);
     }
   }
   ORV_CHECK(kName, t.call(CLI_CALL_CLOSE).empty() && t.nothingWritten());

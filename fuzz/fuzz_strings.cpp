@@ -76,8 +76,8 @@ struct StringCall {
     ORV_CHECK(c.name(), code == want.code);
     if (!code.empty()) return;
     if (lob) {
-      const std::uint32_t n = lobLength(c.out());
-      ORV_CHECK(c.name(), n <= capacity && lobData(c.out(), n) == want.bytes);
+      ORV_CHECK(c.name(),
+                numberIn<std::uint32_t>(c.out()) <= capacity && lobIn(c.out()) == want.bytes);
     } else {
       ORV_CHECK(c.name(), textIn(c.name(), c.out()) == want.bytes);
     }

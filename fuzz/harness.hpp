@@ -1,28 +1,219 @@
-// What every fuzz target shares: calling an export the way an engine does,
-// with each argument in a heap block of its own (block.hpp) handed to the
-// library's frame caller (arguments.hpp), and the checks that hold for
-// every call whatever the routine.
+// What every fuzz target shares.  Each value of a call sits in a heap block
+// of exactly its size, so that a routine reading or writing one byte past
+// an input, a result, an indicator or a status buffer is caught by
+// AddressSanitizer; the blocks' addresses go into a cli::call::Frame, and
+// the library's frame caller (src/frame/call.hpp) calls the export with
+// them in the frame's order, as an engine does.  A broken invariant is
+// reported on standard error and ends the run with __builtin_trap, which
+// libFuzzer records as a crash with its input.
 #pragma once
 
+#include <dlfcn.h>
+
 #include <algorithm>
+#include <array>
 #include <cstddef>
 #include <cstdint>
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
+#include <memory>
 #include <string>
 #include <string_view>
 #include <utility>
 #include <vector>
 
-#include "arguments.hpp"
-#include "block.hpp"
 #include "catalogue/catalogue.hpp"
 #include "frame/call.hpp"
 #include "frame/cliudf.h"
 #include "frame/status.hpp"
 
 namespace orv::fuzz {
+
+namespace cat = cli::catalogue;
+
+[[noreturn]] inline void broken(const char *routine, const char *what) {
+  static_cast<void>(std::fprintf(stderr, "\n*** %s: %s\n", routine, what));
+  __builtin_trap();
+}
+
+#define ORV_CHECK(routine, condition)                           \
+  do {                                                          \
+    if (!(condition)) ::orv::fuzz::broken(routine, #condition); \
+  } while (0)
+
+inline constexpr unsigned char kUnwritten = 0xCD;  // fills result areas before a call
+inline constexpr std::int16_t kIndicator = 0x5A5A;
+
+// Whether `n` bytes all hold `fill`: the first does, and each the same as
+// the one before.  memcmp, not a loop, which the fuzzer's comparison
+// tracing would make slow on a 1 MiB area.
+inline bool allAre(const void *at, std::size_t n, unsigned char fill = kUnwritten) {
+  const auto *p = static_cast<const unsigned char *>(at);
+  return n == 0 || (p[0] == fill && std::memcmp(p, p + 1, n - 1) == 0);
+}
+
+// Large blocks are kept for the next block of the same size: a 1 MiB
+// CLI_udfLob area, mapped and unmapped on every call, would make a run
+// slow.  Never destroyed, so that the kept blocks stay reachable at exit
+// and the leak check does not count them.
+inline std::vector<std::pair<std::size_t, unsigned char *>> &keptBlocks() {
+  static auto *kept = new std::vector<std::pair<std::size_t, unsigned char *>>;
+  return *kept;
+}
+struct Release {
+  std::size_t size = 0;
+  void operator()(unsigned char *p) const {
+    if (size < 65536 || keptBlocks().size() >= 16) {
+      delete[] p;
+    } else {
+      keptBlocks().emplace_back(size, p);
+    }
+  }
+};
+
+// Bytes on the heap with nothing behind them: the allocation is exactly
+// the value's size (a byte for an empty value).
+class Block {
+ public:
+  Block() = default;
+  explicit Block(std::size_t size, unsigned char fill = kUnwritten) : size_(size) {
+    const std::size_t n = std::max<std::size_t>(size, 1);
+    auto &kept = keptBlocks();
+    const auto at = std::find_if(kept.begin(), kept.end(), [&](auto &k) { return k.first == n; });
+    bytes_ = {at == kept.end() ? new unsigned char[n] : at->second, Release{n}};
+    if (at != kept.end()) kept.erase(at);
+    std::memset(bytes_.get(), fill, n);
+  }
+  unsigned char *data() const { return bytes_.get(); }
+  char *chars() const { return reinterpret_cast<char *>(bytes_.get()); }
+  std::size_t size() const { return size_; }
+  std::string_view view() const { return {chars(), size_}; }
+
+ private:
+  std::unique_ptr<unsigned char[], Release> bytes_;
+  std::size_t size_ = 0;
+};
+
+// The next value of type T from the fuzzer's bytes, zero-filled where the
+// bytes run out.
+template <typename T>
+T take(const std::uint8_t *&data, std::size_t &size) {
+  T v{};
+  const std::size_t n = std::min(size, sizeof v);
+  std::memcpy(&v, data, n);
+  data += n;
+  size -= n;
+  return v;
+}
+
+inline Block textBlock(std::string_view s) {
+  Block b(s.size() + 1);
+  std::memcpy(b.data(), s.data(), s.size());
+  b.data()[s.size()] = 0;
+  return b;
+}
+inline Block lobBlock(std::string_view s) {
+  Block b(CLI_LOB_AREA_SIZE(s.size()));
+  cli::call::layOutLob(b.data(), s.data(), s.size());
+  return b;
+}
+template <typename T>
+Block numberBlock(T v) {
+  Block b(sizeof v);
+  std::memcpy(b.data(), &v, sizeof v);
+  return b;
+}
+// A CLI_udfLob result area: its length word holds the capacity on entry,
+// its data bytes are unwritten.
+inline Block lobArea(std::uint32_t capacity) {
+  Block b(CLI_LOB_AREA_SIZE(std::size_t{capacity}));
+  cli::call::prepareLobResult(b.data(), capacity);
+  return b;
+}
+
+template <typename T>
+T numberIn(const Block &b) {
+  T v;
+  std::memcpy(&v, b.data(), sizeof v);
+  return v;
+}
+// A CLI_udfLob's data, as long as its length word says.
+inline std::string_view lobIn(const Block &b) {
+  return b.view().substr(CLI_LOB_DATA_OFFSET, numberIn<std::uint32_t>(b));
+}
+// The terminated text in an area; the terminator must lie inside it.
+inline std::string_view textIn(const char *routine, const Block &b) {
+  const std::size_t end = b.view().find('\0');
+  ORV_CHECK(routine, end != std::string_view::npos);
+  return b.view().substr(0, end);
+}
+// A terminated text from fuzz bytes: everything up to the first NUL.
+inline std::string_view upToNul(std::string_view s) { return s.substr(0, s.find('\0')); }
+
+// An export of the linked library, found by name as an engine finds it,
+// with its catalogue row.  Lookups are kept by the address of the name
+// (almost always a literal, confirmed by the name itself): a run makes
+// hundreds of calls, and the lookup would otherwise cost as much as the
+// routine.
+struct Export {
+  const cat::Routine *routine = nullptr;
+  void *address = nullptr;
+};
+inline Export lookUp(const char *name) {
+  struct Seen {
+    const char *at;
+    std::string name;
+    Export found;
+  };
+  static auto *seen = new std::vector<Seen>;  // never destroyed, as keptBlocks
+  for (const Seen &s : *seen) {
+    if (s.at == name && s.name == name) return s.found;
+  }
+  const Export e{cat::find(name), dlsym(RTLD_DEFAULT, name)};
+  if (e.address == nullptr || e.routine == nullptr) broken(name, "not exported, or not catalogued");
+  if (seen->size() < 256) seen->push_back({name, name, e});
+  return e;
+}
+
+// The frame of a call whose values, indicators and status buffers are
+// blocks that outlive it; the same frame serves any number of calls.  The
+// extras are set on `f` by what they are.
+class Frame {
+ public:
+  Frame(const Block &sqlstate, const Block &message) {
+    f.inputs = in_.data();
+    f.results = out_.data();
+    f.inputIndicators = inIndicators_.data();
+    f.resultIndicators = outIndicators_.data();
+    f.sqlstate = sqlstate.chars();
+    f.functionName = "FUNCTION";
+    f.specificName = "SPECIFIC";
+    f.message = message.chars();
+  }
+  Frame(const Frame &) = delete;
+  Frame &operator=(const Frame &) = delete;
+  void input(const Block &value, const Block &indicator) {
+    in_.at(inputs_) = value.data();
+    inIndicators_[inputs_++] = reinterpret_cast<std::int16_t *>(indicator.data());
+  }
+  void result(const Block &value, const Block &indicator) {
+    out_.at(results_) = value.data();
+    outIndicators_[results_++] = reinterpret_cast<std::int16_t *>(indicator.data());
+  }
+  // The caller reads as many values as the row has slots, and the extras
+  // of the row's frame.
+  void call(const Export &e) const { cli::call::call(*e.routine, e.address, f); }
+
+  cli::call::Frame f;
+
+ private:
+  std::array<void *, cat::kMaxInputs> in_{};
+  std::array<void *, cat::kMaxResults> out_{};
+  std::array<std::int16_t *, cat::kMaxInputs> inIndicators_{};
+  std::array<std::int16_t *, cat::kMaxResults> outIndicators_{};
+  std::size_t inputs_ = 0, results_ = 0;
+};
 
 // How an input may differ after the call.
 enum class Trim {
@@ -31,9 +222,7 @@ enum class Trim {
   whiteSpace,  // a NUL in place of the first of its trailing blanks, tabs, LF, CR, VT, FF
 };
 
-inline bool isWhite(unsigned char c) {
-  return c == 0x20 || c == 0x09 || c == 0x0A || c == 0x0D || c == 0x0B || c == 0x0C;
-}
+inline bool isWhite(unsigned char c) { return c == 0x20 || (c >= 0x09 && c <= 0x0D); }
 
 // `after` is `before` as it was, or with the NUL of the trim rule.
 inline bool trimmedOrSame(std::string_view before, std::string_view after, Trim trim) {
@@ -54,15 +243,7 @@ inline bool trimmedOrSame(std::string_view before, std::string_view after, Trim 
 // block, with indicators and status buffers of their exact sizes.
 class Call {
  public:
-  explicit Call(const char *name) : name_(name), export_(lookUp(name)) {
-    inputs_.reserve(4);
-    results_.reserve(2);
-    indicators_.reserve(6);
-    trims_.reserve(4);
-    heads_.reserve(2);
-    before_.reserve(4);
-    resultsBefore_.reserve(2);
-  }
+  explicit Call(const char *name) : name_(name), export_(lookUp(name)) {}
 
   Call &input(Block b, Trim trim = Trim::none) {
     inputs_.push_back(std::move(b));
@@ -76,17 +257,10 @@ class Call {
     heads_.push_back(head);
     return *this;
   }
-  // The extras, for a routine whose frame has them (the call stops the
-  // run otherwise, and where one of the frame's extras is not given).
-  // The database information block stays the caller's and may be null,
-  // as an engine may pass it.
+  // The database information block, for a routine whose frame has it;
+  // it stays the caller's and may be null, as an engine may pass it.
   Call &dbinfo(const void *block) {
     dbinfo_ = block;
-    hasDbinfo_ = true;
-    return *this;
-  }
-  Call &scratchpad(Block b) {
-    scratchpad_ = std::move(b);
     return *this;
   }
   // A failed call may leave what the routine stored before its test.
@@ -108,87 +282,67 @@ class Call {
     for (const Block &ind : indicators_)
       ORV_CHECK(name_, numberIn<std::int16_t>(ind) == kIndicator);
     const std::string code = sysfunCode();
-    if (!code.empty() && !mayStore_) {
-      for (std::size_t i = 0; i < results_.size(); ++i) {
-        ORV_CHECK(name_, resultUntouched(i));
-      }
+    for (std::size_t i = 0; i < results_.size() && !code.empty() && !mayStore_; ++i) {
+      ORV_CHECK(name_, resultUntouched(i));
     }
     return code;
   }
 
-  // For a routine that reads its first input indicator: runs the call
-  // with that indicator set to `first`, and checks nothing of its own.
-  void runRawWithFirstIndicator(std::int16_t first) {
-    firstIndicator_ = first;
-    runRaw();
-  }
-
-  // Runs the call and checks nothing of its own.
-  void runRaw() {
+  // Runs the call, the first input indicator set to `first`, and checks
+  // nothing of its own.
+  void runRaw(std::int16_t first = kIndicator) {
     before_.clear();
-    for (const Block &b : inputs_) before_.push_back(b.copy());
-    // Only the head of a result area is kept to compare; the rest is the
-    // unwritten fill.
-    resultsBefore_.clear();
+    for (const Block &b : inputs_) before_.emplace_back(b.view());
+    headsBefore_.clear();
     for (std::size_t i = 0; i < results_.size(); ++i) {
-      resultsBefore_.push_back(std::string(results_[i].view().substr(0, heads_[i])));
+      headsBefore_.emplace_back(results_[i].view().substr(0, heads_[i]));
     }
     indicators_.clear();
     for (std::size_t i = 0; i < inputs_.size() + results_.size(); ++i) {
-      indicators_.push_back(numberBlock(kIndicator));
+      indicators_.push_back(numberBlock(i == 0 ? first : kIndicator));
     }
-    if (!inputs_.empty()) std::memcpy(indicators_[0].data(), &firstIndicator_, 2);
     sqlstate_ = Block(CLI_SQLSTATE_SIZE, 'S');
     message_ = Block(CLI_MESSAGE_SIZE, 'M');
-    Arguments args;
-    for (std::size_t i = 0; i < inputs_.size(); ++i) args.input(inputs_[i], indicators_[i]);
+    Frame frame(sqlstate_, message_);
+    for (std::size_t i = 0; i < inputs_.size(); ++i) frame.input(inputs_[i], indicators_[i]);
     for (std::size_t i = 0; i < results_.size(); ++i) {
-      args.result(results_[i], indicators_[inputs_.size() + i]);
+      frame.result(results_[i], indicators_[inputs_.size() + i]);
     }
-    args.status(sqlstate_, message_);
-    if (hasDbinfo_) args.dbinfo(dbinfo_);
-    if (scratchpad_.data() != nullptr) args.scratchpad(scratchpad_);
-    args.call(export_);
+    frame.f.dbinfo = dbinfo_;
+    frame.call(export_);
   }
 
   // The SYSFUN code of the call, after checking the exact form of the
   // status: both buffers untouched, or "38552" and "SYSFUN:NN" with their
   // terminators and nothing else written, NN one of the routine's codes.
   std::string sysfunCode() const {
-    if (untouched(sqlstate_, 'S')) {
-      ORV_CHECK(name_, untouched(message_, 'M'));
+    if (allAre(sqlstate_.data(), sqlstate_.size(), 'S')) {
+      ORV_CHECK(name_, allAre(message_.data(), message_.size(), 'M'));
       return {};
     }
-    ORV_CHECK(name_, sqlstate_.holds(std::string_view("38552\0", 6)));
+    ORV_CHECK(name_, sqlstate_.view() == std::string_view("38552\0", 6));
     const std::string_view m = message_.view();
-    ORV_CHECK(name_, m.substr(0, 7) == "SYSFUN:" && m[9] == '\0');
-    ORV_CHECK(name_, std::all_of(m.begin() + 10, m.end(), [](char c) { return c == 'M'; }));
-    // A code of the library's table, and one of the routine's own.
-    const cli::Sysfun sysfun = cli::call::sysfunIn(sqlstate_.chars(), message_.chars());
-    ORV_CHECK(name_, sysfun != cli::Sysfun::none);
-    const std::string code(m.substr(7, 2));
-    ORV_CHECK(name_, code == cli::textOf(sysfun).digits);
     ORV_CHECK(name_,
-              std::string_view(export_.routine->sysfunCodes).find(code) != std::string_view::npos);
-    return code;
-  }
-
-  static bool untouched(const Block &b, char fill) {
-    return std::all_of(b.view().begin(), b.view().end(), [fill](char c) { return c == fill; });
+              m.substr(0, 7) == "SYSFUN:" && m[9] == '\0' && allAre(&m[10], m.size() - 10, 'M'));
+    const cli::Sysfun sysfun = cli::call::sysfunIn(sqlstate_.chars(), message_.chars());
+    ORV_CHECK(name_, sysfun != cli::Sysfun::none && m.substr(7, 2) == cli::textOf(sysfun).digits);
+    ORV_CHECK(name_, std::string_view(export_.routine->sysfunCodes).find(m.substr(7, 2)) !=
+                         std::string_view::npos);
+    return std::string(m.substr(7, 2));
   }
 
   const char *name() const { return name_; }
   const Block &in(std::size_t i) const { return inputs_[i]; }
   const Block &out(std::size_t i = 0) const { return results_[i]; }
   const std::string &inputBefore(std::size_t i) const { return before_[i]; }
-  const Block &indicator(std::size_t i) const { return indicators_[i]; }
+  std::int16_t indicator(std::size_t i) const { return numberIn<std::int16_t>(indicators_[i]); }
   const Block &sqlstate() const { return sqlstate_; }
   const Block &message() const { return message_; }
+  // The head of the area as the caller set it, the rest unwritten.
   bool resultUntouched(std::size_t i = 0) const {
     const Block &b = results_[i];
-    const std::string &head = resultsBefore_[i];
-    return b.view().substr(0, head.size()) == head &&
-           allUnwritten(b.data() + head.size(), b.size() - head.size());
+    return b.view().starts_with(headsBefore_[i]) &&
+           allAre(b.data() + heads_[i], b.size() - heads_[i]);
   }
 
  private:
@@ -197,13 +351,10 @@ class Call {
   std::vector<Block> inputs_, results_, indicators_;
   std::vector<Trim> trims_;
   std::vector<std::size_t> heads_;
-  std::vector<std::string> before_, resultsBefore_;
+  std::vector<std::string> before_, headsBefore_;
   const void *dbinfo_ = nullptr;
-  bool hasDbinfo_ = false;
-  Block scratchpad_;
   Block sqlstate_, message_;
   bool mayStore_ = false;
-  std::int16_t firstIndicator_ = kIndicator;
 };
 
 // With ORV_FUZZ_LAST_INPUT set, each input is written to that file before
