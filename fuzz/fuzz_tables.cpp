@@ -59,6 +59,13 @@ std::int32_t callback(std::int32_t slots, void *request) {
   return engine->openStatus;
 }
 
+template <typename T>
+std::int64_t field(const unsigned char *at) {
+  T v;
+  std::memcpy(&v, at, sizeof v);
+  return v;
+}
+
 std::string failed(std::int32_t status) {
   char text[CLI_MESSAGE_SIZE];
   static_cast<void>(std::snprintf(text, sizeof text, "API call failed %" PRId32, status));
@@ -162,24 +169,16 @@ void drive(bool threads, const std::uint8_t *&data, std::size_t &size) {
     // A row: which one is the fetch count so far, skipping the unknown types.
     const std::size_t index = i - i / 5;
     ORV_CHECK(name, index < rows);
+    // FmpThreads: six 32-bit fields from byte 4; FmpRows: two 32-bit, two
+    // 16-bit and two bytes.
     const unsigned char *r = e.table.data() + index * rowSize;
-    std::int64_t want[6];
-    if (threads) {
-      for (std::size_t k = 0; k < 6; ++k) {
-        std::int32_t v;
-        std::memcpy(&v, r + 4 + 4 * k, 4);
-        want[k] = v;
-      }
-    } else {
-      std::int32_t a, b;
-      std::int16_t c, d;
-      std::memcpy(&a, r, 4);
-      std::memcpy(&b, r + 4, 4);
-      std::memcpy(&c, r + 8, 2);
-      std::memcpy(&d, r + 10, 2);
-      want[0] = a, want[1] = b, want[2] = c, want[3] = d, want[4] = r[12], want[5] = r[13];
+    for (std::size_t k = 0; k < 6; ++k) {
+      const std::int64_t want = threads ? field<std::int32_t>(r + 4 + 4 * k)
+                                : k < 2 ? field<std::int32_t>(r + 4 * k)
+                                : k < 4 ? field<std::int16_t>(r + 4 + 2 * k)
+                                        : r[8 + k];
+      ORV_CHECK(name, row[k] == want && indicators[k] == 0);
     }
-    for (std::size_t k = 0; k < 6; ++k) ORV_CHECK(name, row[k] == want[k] && indicators[k] == 0);
   }
   run(CLI_CALL_CLOSE, row, indicators, state);
   const bool held = e.giveTable && (!openFailed || threads) && e.table.data() != nullptr;

@@ -85,6 +85,10 @@ class Block {
     if (at != kept.end()) kept.erase(at);
     std::memset(bytes_.get(), fill, n);
   }
+  // A block that holds these bytes.
+  explicit Block(std::string_view bytes) : Block(bytes.size()) {
+    std::copy(bytes.begin(), bytes.end(), chars());
+  }
   unsigned char *data() const { return bytes_.get(); }
   char *chars() const { return reinterpret_cast<char *>(bytes_.get()); }
   std::size_t size() const { return size_; }
@@ -107,22 +111,17 @@ T take(const std::uint8_t *&data, std::size_t &size) {
   return v;
 }
 
-inline Block textBlock(std::string_view s) {
-  Block b(s.size() + 1);
-  std::memcpy(b.data(), s.data(), s.size());
-  b.data()[s.size()] = 0;
-  return b;
-}
-inline Block lobBlock(std::string_view s) {
-  Block b(CLI_LOB_AREA_SIZE(s.size()));
-  cli::call::layOutLob(b.data(), s.data(), s.size());
-  return b;
+template <typename T>
+std::string_view bytesOf(const T &v) {
+  return {reinterpret_cast<const char *>(&v), sizeof v};
 }
 template <typename T>
 Block numberBlock(T v) {
-  Block b(sizeof v);
-  std::memcpy(b.data(), &v, sizeof v);
-  return b;
+  return Block(bytesOf(v));
+}
+inline Block textBlock(std::string_view s) { return Block(std::string(s) + '\0'); }
+inline Block lobBlock(std::string_view s) {
+  return Block(std::string(bytesOf(static_cast<std::uint32_t>(s.size()))) + std::string(s));
 }
 // A CLI_udfLob result area: its length word holds the capacity on entry,
 // its data bytes are unwritten.
@@ -215,28 +214,18 @@ class Frame {
   std::size_t inputs_ = 0, results_ = 0;
 };
 
-// How an input may differ after the call.
-enum class Trim {
-  none,        // not at all
-  blanks,      // a NUL in place of the first of its trailing 0x20 bytes
-  whiteSpace,  // a NUL in place of the first of its trailing blanks, tabs, LF, CR, VT, FF
-};
-
-inline bool isWhite(unsigned char c) { return c == 0x20 || (c >= 0x09 && c <= 0x0D); }
-
-// `after` is `before` as it was, or with the NUL of the trim rule.
-inline bool trimmedOrSame(std::string_view before, std::string_view after, Trim trim) {
+// `after` is the terminated text `before` as it was, or, for a routine
+// that may cut trailing white space off its text inputs in place, with a
+// NUL in place of one byte from which only white space runs to the end.
+inline bool trimmedOrSame(std::string_view before, std::string_view after, bool mayTrim) {
   if (before == after) return true;
-  if (trim == Trim::none || before.size() != after.size()) return false;
-  // Terminated text: `before` ends with its NUL.
-  std::size_t end = before.size() - 1;
-  while (end > 0 && (trim == Trim::blanks ? before[end - 1] == ' '
-                                          : isWhite(static_cast<unsigned char>(before[end - 1])))) {
-    --end;
-  }
-  std::string want(before);
-  want[end] = '\0';
-  return after == want;
+  const std::size_t k = static_cast<std::size_t>(
+      std::mismatch(before.begin(), before.end(), after.begin(), after.end()).first -
+      before.begin());
+  const std::string_view rest = before.substr(k, before.size() - k - 1);
+  return mayTrim && before.size() == after.size() && after[k] == '\0' &&
+         after.substr(k + 1) == before.substr(k + 1) &&
+         rest.find_first_not_of(" \t\n\v\f\r") == std::string_view::npos;
 }
 
 // One call of a scalar export: its inputs and results, each in its own
@@ -245,9 +234,8 @@ class Call {
  public:
   explicit Call(const char *name) : name_(name), export_(lookUp(name)) {}
 
-  Call &input(Block b, Trim trim = Trim::none) {
+  Call &input(Block b) {
     inputs_.push_back(std::move(b));
-    trims_.push_back(trim);
     return *this;
   }
   // A result area: `head` bytes as the caller set them (4 for the length
@@ -271,13 +259,14 @@ class Call {
 
   // Runs the call and checks what holds for every scalar routine without
   // null handling: indicators untouched, inputs untouched but for their
-  // trim rule, status buffers untouched on success and a SYSFUN error of
+  // trailing white space, status buffers untouched on success and a SYSFUN error of
   // the routine's own list on failure, the result untouched on failure.
   // Returns the two-digit SYSFUN code, empty on success.
   std::string run() {
     runRaw();
+    const bool mayTrim = (export_.routine->properties & cat::kWritesInputs) != 0;
     for (std::size_t i = 0; i < inputs_.size(); ++i) {
-      ORV_CHECK(name_, trimmedOrSame(before_[i], inputs_[i].view(), trims_[i]));
+      ORV_CHECK(name_, trimmedOrSame(before_[i], inputs_[i].view(), mayTrim));
     }
     for (const Block &ind : indicators_)
       ORV_CHECK(name_, numberIn<std::int16_t>(ind) == kIndicator);
@@ -349,7 +338,6 @@ class Call {
   const char *name_;
   Export export_;
   std::vector<Block> inputs_, results_, indicators_;
-  std::vector<Trim> trims_;
   std::vector<std::size_t> heads_;
   std::vector<std::string> before_, headsBefore_;
   const void *dbinfo_ = nullptr;
