@@ -47,9 +47,9 @@ void trace(char kind, std::optional<long long> value = {}) {
 
 extern "C" {
 
-OrvFakes *orv_fakes(void) { return &fakes; }
+OrvFakes *orv_fakes() { return &fakes; }
 
-void orv_fakes_reset(void) {
+void orv_fakes_reset() {
   fakes = OrvFakes{};
   fakes.nameLength = 6;
   std::memcpy(fakes.name, "Sunday", 6);

@@ -1,69 +1,50 @@
-/*
- * fakes.h - a fake set of the engine's services, linked into a copy of the
- * library in place of the stand-ins, so that tests can make each service
- * fail and see what the routines handed it.  orv_fakes() gives the one
- * control block; orv_fakes_reset() puts it back to services that succeed.
- */
-#ifndef ORVCLIFN_TESTS_FAKES_H
-#define ORVCLIFN_TESTS_FAKES_H
+// A fake set of the engine's services, linked into a copy of the library in
+// place of the stand-ins, so that tests can make each service fail and see
+// what the routines handed it.  orv_fakes() gives the one control block;
+// orv_fakes_reset() puts it back to services that succeed.
+#pragma once
 
-/* NOLINTBEGIN(modernize-deprecated-headers, modernize-use-using): plain C */
-#include <stdint.h>
+#include <cstdint>
 
 #include "engine/services.h"
 
-#ifdef __cplusplus
-extern "C" {
-#endif
-
-typedef struct OrvFakes {
-  /* Name services: the length they return (0 fails) and the bytes, in UTF-8. */
-  uint8_t nameLength;
+struct OrvFakes {
+  // Name services: the length they return (0 fails) and the bytes, in UTF-8.
+  std::uint8_t nameLength;
   unsigned char name[256];
   CLI_nlsTimeRecord lastTime;
-  uint32_t lastNameSize;
-
-  /* sqlocpcv: copies up to `convertBytes` source bytes (all when -1) and
-   * returns `convertStatus`; what it was given is kept. */
-  int32_t convertStatus, convertBytes;
+  std::uint32_t lastNameSize;
+  // sqlocpcv: copies up to `convertBytes` source bytes (all when -1) and
+  // returns `convertStatus`; what it was given is kept.
+  std::int32_t convertStatus, convertBytes;
   int convertCalls;
-  CLI_conversionRecord lastRecord; /* as it was handed in */
-  uint32_t lastSourceCodePage, lastTargetCodePage;
-
-  int32_t encodingClass; /* sqlnls_Encoding2 */
-
-  /* sqlnlsCollIDMapIDToName: returns collationLength after copying "NAME". */
-  int32_t collationLength;
+  CLI_conversionRecord lastRecord;  // as it was handed in
+  std::uint32_t lastSourceCodePage, lastTargetCodePage;
+  std::int32_t encodingClass;  // sqlnls_Encoding2
+  // sqlnlsCollIDMapIDToName: returns collationLength after copying "NAME".
+  std::int32_t collationLength;
   int collationCalls;
-  uint32_t lastCollationSize;
-
-  /* Number text. */
-  int32_t a2fStatus;
+  std::uint32_t lastCollationSize;
+  // Number text: what sqlrxa2f gives, and the text sqlrxf2a writes.
+  std::int32_t a2fStatus;
   double a2fValue;
-  uint32_t lastA2fLength;
-  char rawText[23]; /* what sqlrxf2a writes */
-
-  /* Snapshot services: real file reads on `instancePath`, with failures. */
-  int32_t instanceStatus;
+  std::uint32_t lastA2fLength;
+  char rawText[23];
+  // Snapshot services: real file reads on `instancePath`, with failures.
+  std::int32_t instanceStatus;
   char instancePath[264];
-  int32_t allocationStatus;
+  std::int32_t allocationStatus;
   char logMessage[128];
-  /* The services asked, in order: "s" the static data, "o" open, "rN" a
-   * read of N bytes, "mN" a move by N, "aN" a block of N bytes, "f" a free,
-   * "lS" a log line with status S, "c" a close; blank-separated. */
+  // The services asked, in order: "s" the static data, "o" open, "rN" a
+  // read of N bytes, "mN" a move by N, "aN" a block of N bytes, "f" a free,
+  // "lS" a log line with status S, "c" a close; blank-separated.
   char trace[4096];
-} OrvFakes;
+};
 
-CLI_SERVICE_API OrvFakes *orv_fakes(void);
-CLI_SERVICE_API void orv_fakes_reset(void);
+extern "C" CLI_SERVICE_API OrvFakes *orv_fakes();
+extern "C" CLI_SERVICE_API void orv_fakes_reset();
 
-#ifdef __cplusplus
-}
-#endif
-
-/* NOLINTEND(modernize-deprecated-headers, modernize-use-using) */
-
-#if defined(__cplusplus) && defined(ORV_FAKE_SERVICES_PATH)
+#if defined(ORV_FAKE_SERVICES_PATH)
 #include "support/platform.hpp"
 
 // For the tests: the control block, reset; null when the fake services
@@ -75,5 +56,4 @@ inline OrvFakes *orvFreshFakes() {
   reinterpret_cast<void (*)()>(orv::test::findExport(services, "orv_fakes_reset"))();
   return reinterpret_cast<OrvFakes *(*)()>(orv::test::findExport(services, "orv_fakes"))();
 }
-#endif
 #endif

@@ -3,6 +3,7 @@
 // the routine with.
 #pragma once
 
+#include <bit>
 #include <cstdint>
 #include <string>
 #include <string_view>
@@ -35,39 +36,14 @@ inline Duration timestampDiff(std::int32_t interval, std::string_view text) {
   const std::int64_t y = at(0, 4), mo = at(4, 2), d = at(6, 2), h = at(8, 2), mi = at(10, 2),
                      sec = at(12, 2), f = std::stoll((fraction + "000000").substr(0, 6));
   // At most 9999 years of 525600 minutes, so no sum below leaves 64 bits.
-  const std::int64_t minutes = ((y * 365 + mo * 30 + d) * 24 + h) * 60 + mi;
-  std::int64_t value = 0;
-  switch (interval) {
-    case 1:
-      value = (minutes * 60 + sec) * 1000000 + f;
-      break;
-    case 2:
-      value = minutes * 60 + sec;
-      break;
-    case 4:
-      value = minutes;
-      break;
-    case 8:
-      value = (y * 365 + mo * 30 + d) * 24 + h;
-      break;
-    case 16:
-      value = y * 365 + mo * 30 + d;
-      break;
-    case 32:
-      value = y * 52 + (mo * 30 + d) / 7;
-      break;
-    case 64:
-      value = y * 12 + mo;
-      break;
-    case 128:
-      value = y * 4 + mo / 3;
-      break;
-    case 256:
-      value = y;
-      break;
-    default:
-      return {"08"};
-  }
+  const std::int64_t days = y * 365 + mo * 30 + d, hours = days * 24 + h, minutes = hours * 60 + mi,
+                     seconds = minutes * 60 + sec;
+  // The interval codes are the powers of two from 1 to 256, for these units.
+  const std::int64_t byCode[] = {
+      seconds * 1000000 + f,      seconds,     minutes,        hours, days,
+      y * 52 + (mo * 30 + d) / 7, y * 12 + mo, y * 4 + mo / 3, y};
+  if (interval <= 0 || interval > 256 || (interval & (interval - 1)) != 0) return {"08"};
+  const std::int64_t value = byCode[std::countr_zero(static_cast<std::uint32_t>(interval))];
   // Minutes have no overflow test: their sum is kept in 32 bits.
   if (interval != 4 && value > 2147483647) return {"03"};
   const std::int64_t signedValue = negative ? -value : value;

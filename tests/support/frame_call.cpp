@@ -26,9 +26,7 @@ constexpr unsigned char kUnwritten = 0xCD;  // fills result areas before a call
 constexpr unsigned char kCanary = 0xA5;     // fills the bytes behind a result area
 constexpr std::size_t kCanaryBytes = 64;
 constexpr std::int16_t kIndicator = 0x5A5A;
-// The message buffer of the frame, and a guard behind it that a routine
-// writing past the message would reach.
-constexpr std::size_t kMessageBytes = CLI_MESSAGE_SIZE + 42;
+constexpr std::size_t kMessageBytes = CLI_MESSAGE_SIZE + 42;  // with a guard behind
 
 const char *currentLibrary = ORV_LIBRARY_PATH;
 
@@ -59,24 +57,14 @@ Bytes bytesOf(const Value &v) {
   return out;
 }
 
-// The shape of a catalogue result slot.
+// The shape of a catalogue result slot, whose layouts run in the same
+// order, behind `none` and with two fixed ones.
+static_assert(static_cast<int>(cat::Layout::int16) == static_cast<int>(L::int16) + 1 &&
+              static_cast<int>(cat::Layout::fixedText) == static_cast<int>(L::fixed) + 1);
 Value areaFor(const cat::Slot &slot) {
-  switch (slot.layout) {
-    case cat::Layout::int16:
-      return numberArea(L::int16);
-    case cat::Layout::int32:
-      return intArea();
-    case cat::Layout::int64:
-      return numberArea(L::int64);
-    case cat::Layout::real:
-      return numberArea(L::real);
-    case cat::Layout::text:
-      return textArea(slot.size + 1);
-    case cat::Layout::lob:
-      return lobArea(slot.size);
-    default:
-      return fixedArea(slot.size);
-  }
+  const auto layout = static_cast<L>(
+      std::min(static_cast<int>(slot.layout), static_cast<int>(cat::Layout::fixedText)) - 1);
+  return {layout, 0, {}, layout == L::text ? slot.size + 1 : slot.size};
 }
 
 // The result area read back in the result's layout.  After a failure a
@@ -109,15 +97,10 @@ Outcome callFrame(const char *name, const std::vector<Value> &inputs, const Valu
                   const std::vector<void *> &extras) {
   const cat::Routine *row = cat::find(name);
   void *fn = exportAddress(name);
-  if (row == nullptr || fn == nullptr) {
-    ADD_FAILURE() << name << (row == nullptr ? " has no row in the catalogue" : " is not exported");
-    return fails("no export");
-  }
-  if (inputs.size() != cat::inputCount(*row) || cat::resultCount(*row) != 1 ||
-      extras.size() != cat::extraCount(row->frame)) {
-    ADD_FAILURE() << name << ": its row takes " << cat::inputCount(*row) << " inputs, "
-                  << cat::resultCount(*row) << " results and " << cat::extraCount(row->frame)
-                  << " extras, not " << inputs.size() << ", 1 and " << extras.size();
+  if (row == nullptr || fn == nullptr || inputs.size() != cat::inputCount(*row) ||
+      cat::resultCount(*row) != 1 || extras.size() != cat::extraCount(row->frame)) {
+    ADD_FAILURE() << name << " is no export of " << inputs.size() << " inputs, one result and "
+                  << extras.size() << " extras";
     return fails("no frame");
   }
   const Value result = shape != nullptr ? *shape : areaFor(row->results[0]);
