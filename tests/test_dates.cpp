@@ -164,20 +164,15 @@ TEST(TimestampDiff, ConvertsDurationsByFixedRatios) {
     const char *duration;
     Outcome expected;
   } cases[] = {
-      {8, "10000", ok(std::int64_t{1})},
-      {32, "100000000", ok(std::int64_t{4})},
-      {16, "1200000000", ok(std::int64_t{360})},
-      {16, "10000000000", ok(std::int64_t{365})},
-      {1, "1.5", ok(std::int64_t{1500000})},
-      {2, "-100", ok(std::int64_t{-60})},
-      {1, "3547.483647", ok(std::int64_t{2147483647})},
-      {1, "3547.483648", fails("03")},
-      {2, "680105031407", ok(std::int64_t{2147483647})},
-      {2, "680105031408", fails("03")},
-      {2, "   ", fails("07")},
-      {3, "", fails("08")},
-      {4, "-40860000000000", ok(std::int64_t{4294967296 - 2147601600})},
-      {4, "99991231235959", ok(std::int64_t{5256038879 - 4294967296})},
+      // clang-format off
+    {8, "10000", ok(1)},                 {32, "100000000", ok(4)},      {16, "1200000000", ok(360)},
+    {16, "10000000000", ok(365)},        {1, "1.5", ok(1500000)},       {2, "-100", ok(-60)},
+    {1, "3547.483647", ok(2147483647)},  {1, "3547.483648", fails("03")},
+    {2, "680105031407", ok(2147483647)}, {2, "680105031408", fails("03")},
+    {2, "   ", fails("07")},             {3, "", fails("08")},
+    {4, "-40860000000000", ok(4294967296 - 2147601600)},
+    {4, "99991231235959", ok(5256038879 - 4294967296)},
+      // clang-format on
   };
   for (const auto &c : cases) {
     EXPECT_EQ(call("CLI_udfTIMESTAMPDIFF", {i32(c.code), text(c.duration)}), c.expected)
@@ -226,13 +221,11 @@ TEST(DateGrammar, AgreesWithAModelOnEdgesAndMutatedTexts) {
     out.append(digits, static_cast<std::size_t>(n));
   };
   const char alphabet[] = "0123456789-. :x";
-  const struct {
-    const char *routine;
-    dt::Answer (*expected)(dt::Text);
-  } routines[] = {{"CLI_udfJULIAN_DAY2", dt::julianDayOfText},
-                  {"CLI_udfJULIAN_DAY1", dt::julianDayOfHead},
-                  {"CLI_udfMIDNIGHT_SECONDS1", dt::secondsOfTime},
-                  {"CLI_udfMIDNIGHT_SECONDS2", dt::secondsOfAny}};
+  const std::pair<const char *, dt::Answer (*)(dt::Text)> routines[] = {
+      {"CLI_udfJULIAN_DAY2", dt::julianDayOfText},
+      {"CLI_udfJULIAN_DAY1", dt::julianDayOfHead},
+      {"CLI_udfMIDNIGHT_SECONDS1", dt::secondsOfTime},
+      {"CLI_udfMIDNIGHT_SECONDS2", dt::secondsOfAny}};
   int failures = 0;
   for (std::size_t from = 0, n = 0; n < 40000; ++n) {
     std::string t;
@@ -268,23 +261,17 @@ TEST(DateGrammar, AgreesWithAModelOnEdgesAndMutatedTexts) {
       for (std::uint64_t k = pick(4); k > 0 && !t.empty(); --k) {
         const std::size_t at = pick(t.size());
         const char c = alphabet[pick(sizeof alphabet - 1)];
-        switch (pick(3)) {
-          case 0:
-            t[at] = c;
-            break;
-          case 1:
-            t.insert(at, 1, c);
-            break;
-          default:
-            t.erase(at, 1);
-        }
+        const auto how = pick(3);
+        if (how == 0) t[at] = c;
+        if (how == 1) t.insert(at, 1, c);
+        if (how == 2) t.erase(at, 1);
       }
     }
-    for (const auto &r : routines) {
-      const dt::Answer want = r.expected(t);
-      const Outcome got = call(r.routine, {text(t)});
+    for (const auto &[routine, model] : routines) {
+      const dt::Answer want = model(t);
+      const Outcome got = call(routine, {text(t)});
       if (got != (want.code.empty() ? ok(want.value) : fails(want.code)) && ++failures <= 10) {
-        ADD_FAILURE() << r.routine << " on '" << t << "': " << testing::PrintToString(got);
+        ADD_FAILURE() << routine << " on '" << t << "': " << testing::PrintToString(got);
       }
     }
   }
