@@ -102,14 +102,11 @@ Outcome name(const char *routine, const char *date, void *dbinfo) {
   return call(routine, {text(date)}, textArea(102), {dbinfo});
 }
 
-class Names : public ::testing::Test {
- protected:
-  void SetUp() override { orv::test::setEnvironment("ORVENGINE_LOCALE", "en_US"); }
-  void TearDown() override { orv::test::unsetEnvironment("ORVENGINE_LOCALE"); }
-  DatabaseInfo utf8{1208};
-};
+DatabaseInfo utf8{1208};
 
-TEST_F(Names, GiveTheServersNamesForEachReader) {
+// In the stand-in's default locale, en_US.
+TEST(Names, GiveTheServersNamesForEachReader) {
+  orv::test::unsetEnvironment("ORVENGINE_LOCALE");
   const struct {
     const char *routine, *date;
     Outcome want;
@@ -133,7 +130,7 @@ TEST_F(Names, GiveTheServersNamesForEachReader) {
   EXPECT_EQ(name("CLI_udfMONTHNAME2", "2001-01-05", nullptr), leftAlone());
 }
 
-TEST_F(Names, ConvertIntoTheDatabasesCodePage) {
+TEST(Names, ConvertIntoTheDatabasesCodePage) {
   orv::test::setEnvironment("ORVENGINE_LOCALE", "de_DE");
   DatabaseInfo latin1{819}, ebcdic{37}, unknown{70000};
   EXPECT_EQ(name("CLI_udfMONTHNAME1", "2001-03-01", utf8.block), ok("M\xC3\xA4rz"));
@@ -141,6 +138,7 @@ TEST_F(Names, ConvertIntoTheDatabasesCodePage) {
   EXPECT_EQ(name("CLI_udfDAYNAME2", "2001-01-07", ebcdic.block),
             ok("\xE2\x96\x95\x95\xA3\x81\x87"));
   EXPECT_EQ(name("CLI_udfDAYNAME2", "2001-01-07", unknown.block).error, "03");
+  orv::test::unsetEnvironment("ORVENGINE_LOCALE");
 }
 
 // A record: head, tag, length field in the given byte order, string.
@@ -230,7 +228,6 @@ class Fakes : public ::testing::Test {
   }
   LibraryInUse use{ORV_FAKES_LIBRARY_PATH};
   OrvFakes *fakes = nullptr;
-  DatabaseInfo utf8{1208};
 };
 
 TEST_F(Fakes, NamesFillOneFieldOfTheTimeRecordAndFailWithTheServiceOrTheConversion) {
