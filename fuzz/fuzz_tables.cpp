@@ -59,13 +59,6 @@ std::int32_t callback(std::int32_t slots, void *request) {
   return engine->openStatus;
 }
 
-template <typename T>
-std::int64_t field(const unsigned char *at) {
-  T v;
-  std::memcpy(&v, at, sizeof v);
-  return v;
-}
-
 std::string failed(std::int32_t status) {
   char text[CLI_MESSAGE_SIZE];
   static_cast<void>(std::snprintf(text, sizeof text, "API call failed %" PRId32, status));
@@ -119,28 +112,20 @@ void drive(bool threads, const std::uint8_t *&data, std::size_t &size) {
     bool untouched = true;
     for (std::size_t i = 0; i < 6; ++i) {
       indicators[i] = numberIn<std::int16_t>(inds[i]);
-      row[i] = results[i].size() == 2 ? std::int64_t{numberIn<std::int16_t>(results[i])}
-                                      : std::int64_t{numberIn<std::int32_t>(results[i])};
+      row[i] = results[i].size() == 2 ? numberAt<std::int16_t>(results[i].data())
+                                      : numberAt<std::int32_t>(results[i].data());
       untouched =
           untouched && allAre(results[i].data(), results[i].size()) && indicators[i] == kIndicator;
     }
-    state.clear();
-    const bool plainMessage = allAre(message.data(), message.size(), 'M');
-    if (allAre(sqlstate.data(), sqlstate.size(), 'S')) {
-      ORV_CHECK(name, plainMessage);
-    } else {
-      state = std::string(sqlstate.view().substr(0, 5));
-      ORV_CHECK(name, sqlstate.data()[5] == 0);
-      if (state == "02000") {
-        ORV_CHECK(name, plainMessage);
-      } else {
-        ORV_CHECK(name, state == "38620" || state == "38660");
-        const std::string want = failed(state == "38620" ? e.openStatus : e.closeStatus);
-        ORV_CHECK(name,
-                  message.view().starts_with(want) &&
-                      allAre(message.data() + want.size(), message.size() - want.size(), 'M'));
-      }
-    }
+    // A state with its terminator, and only a failed callback's message.
+    state = allAre(sqlstate.data(), sqlstate.size(), 'S') ? "" : sqlstate.view().substr(0, 5);
+    const std::string want = state == "38620"   ? failed(e.openStatus)
+                             : state == "38660" ? failed(e.closeStatus)
+                                                : "";
+    ORV_CHECK(name,
+              state.empty() || ((state == "02000" || !want.empty()) && sqlstate.data()[5] == 0));
+    ORV_CHECK(name, message.view().starts_with(want) &&
+                        allAre(message.data() + want.size(), message.size() - want.size(), 'M'));
     return untouched;
   };
 
@@ -173,9 +158,9 @@ void drive(bool threads, const std::uint8_t *&data, std::size_t &size) {
     // 16-bit and two bytes.
     const unsigned char *r = e.table.data() + index * rowSize;
     for (std::size_t k = 0; k < 6; ++k) {
-      const std::int64_t want = threads ? field<std::int32_t>(r + 4 + 4 * k)
-                                : k < 2 ? field<std::int32_t>(r + 4 * k)
-                                : k < 4 ? field<std::int16_t>(r + 4 + 2 * k)
+      const std::int64_t want = threads ? numberAt<std::int32_t>(r + 4 + 4 * k)
+                                : k < 2 ? numberAt<std::int32_t>(r + 4 * k)
+                                : k < 4 ? numberAt<std::int16_t>(r + 4 + 2 * k)
                                         : r[8 + k];
       ORV_CHECK(name, row[k] == want && indicators[k] == 0);
     }

@@ -132,10 +132,14 @@ inline Block lobArea(std::uint32_t capacity) {
 }
 
 template <typename T>
-T numberIn(const Block &b) {
+T numberAt(const void *at) {
   T v;
-  std::memcpy(&v, b.data(), sizeof v);
+  std::memcpy(&v, at, sizeof v);
   return v;
+}
+template <typename T>
+T numberIn(const Block &b) {
+  return numberAt<T>(b.data());
 }
 // A CLI_udfLob's data, as long as its length word says.
 inline std::string_view lobIn(const Block &b) {
@@ -228,7 +232,7 @@ inline bool trimmedOrSame(std::string_view before, std::string_view after, bool 
          rest.find_first_not_of(" \t\n\v\f\r") == std::string_view::npos;
 }
 
-// One call of a scalar export: its inputs and results, each in its own
+// One call of a scalar export: its inputs and its result, each in its own
 // block, with indicators and status buffers of their exact sizes.
 class Call {
  public:
@@ -238,11 +242,11 @@ class Call {
     inputs_.push_back(std::move(b));
     return *this;
   }
-  // A result area: `head` bytes as the caller set them (4 for the length
+  // The result area: `head` bytes as the caller set them (4 for the length
   // word of a CLI_udfLob area), then the unwritten fill.
   Call &result(Block b, std::size_t head = 0) {
-    results_.push_back(std::move(b));
-    heads_.push_back(head);
+    result_ = std::move(b);
+    head_ = std::string(result_.view().substr(0, head));
     return *this;
   }
   // The database information block, for a routine whose frame has it;
@@ -259,21 +263,18 @@ class Call {
 
   // Runs the call and checks what holds for every scalar routine without
   // null handling: indicators untouched, inputs untouched but for their
-  // trailing white space, status buffers untouched on success and a SYSFUN error of
-  // the routine's own list on failure, the result untouched on failure.
-  // Returns the two-digit SYSFUN code, empty on success.
+  // trailing white space, status buffers untouched on success and a SYSFUN
+  // error of the routine's own list on failure, the result untouched on
+  // failure.  Returns the two-digit SYSFUN code, empty on success.
   std::string run() {
     runRaw();
     const bool mayTrim = (export_.routine->properties & cat::kWritesInputs) != 0;
     for (std::size_t i = 0; i < inputs_.size(); ++i) {
       ORV_CHECK(name_, trimmedOrSame(before_[i], inputs_[i].view(), mayTrim));
     }
-    for (const Block &ind : indicators_)
-      ORV_CHECK(name_, numberIn<std::int16_t>(ind) == kIndicator);
+    for (std::size_t i = 0; i <= inputs_.size(); ++i) ORV_CHECK(name_, indicator(i) == kIndicator);
     const std::string code = sysfunCode();
-    for (std::size_t i = 0; i < results_.size() && !code.empty() && !mayStore_; ++i) {
-      ORV_CHECK(name_, resultUntouched(i));
-    }
+    if (!code.empty() && !mayStore_) ORV_CHECK(name_, resultUntouched());
     return code;
   }
 
@@ -282,21 +283,15 @@ class Call {
   void runRaw(std::int16_t first = kIndicator) {
     before_.clear();
     for (const Block &b : inputs_) before_.emplace_back(b.view());
-    headsBefore_.clear();
-    for (std::size_t i = 0; i < results_.size(); ++i) {
-      headsBefore_.emplace_back(results_[i].view().substr(0, heads_[i]));
-    }
     indicators_.clear();
-    for (std::size_t i = 0; i < inputs_.size() + results_.size(); ++i) {
+    for (std::size_t i = 0; i <= inputs_.size(); ++i) {
       indicators_.push_back(numberBlock(i == 0 ? first : kIndicator));
     }
     sqlstate_ = Block(CLI_SQLSTATE_SIZE, 'S');
     message_ = Block(CLI_MESSAGE_SIZE, 'M');
     Frame frame(sqlstate_, message_);
     for (std::size_t i = 0; i < inputs_.size(); ++i) frame.input(inputs_[i], indicators_[i]);
-    for (std::size_t i = 0; i < results_.size(); ++i) {
-      frame.result(results_[i], indicators_[inputs_.size() + i]);
-    }
+    frame.result(result_, indicators_.back());
     frame.f.dbinfo = dbinfo_;
     frame.call(export_);
   }
@@ -322,26 +317,26 @@ class Call {
 
   const char *name() const { return name_; }
   const Block &in(std::size_t i) const { return inputs_[i]; }
-  const Block &out(std::size_t i = 0) const { return results_[i]; }
+  const Block &out() const { return result_; }
   const std::string &inputBefore(std::size_t i) const { return before_[i]; }
+  // Input i's indicator, or the result's for the last i.
   std::int16_t indicator(std::size_t i) const { return numberIn<std::int16_t>(indicators_[i]); }
   const Block &sqlstate() const { return sqlstate_; }
   const Block &message() const { return message_; }
   // The head of the area as the caller set it, the rest unwritten.
-  bool resultUntouched(std::size_t i = 0) const {
-    const Block &b = results_[i];
-    return b.view().starts_with(headsBefore_[i]) &&
-           allAre(b.data() + heads_[i], b.size() - heads_[i]);
+  bool resultUntouched() const {
+    return result_.view().starts_with(head_) &&
+           allAre(result_.data() + head_.size(), result_.size() - head_.size());
   }
 
  private:
   const char *name_;
   Export export_;
-  std::vector<Block> inputs_, results_, indicators_;
-  std::vector<std::size_t> heads_;
-  std::vector<std::string> before_, headsBefore_;
+  std::vector<Block> inputs_, indicators_;
+  Block result_, sqlstate_, message_;
+  std::string head_;
+  std::vector<std::string> before_;
   const void *dbinfo_ = nullptr;
-  Block sqlstate_, message_;
   bool mayStore_ = false;
 };
 
