@@ -27,17 +27,13 @@ constexpr std::int32_t kCodePages[] = {
     1234, 1236, 1252, 1386, 1392, 1394, 5039, 5488, 13488, 13490, 17584, 17586, 65535, 12345, -1};
 
 std::uint32_t lengthAt(std::string_view s, std::size_t at, unsigned width, bool swap) {
-  std::uint32_t v = 0;
   if (width == 1) return static_cast<unsigned char>(s[at]);
   if (width == 2) {
-    std::uint16_t h = 0;
-    std::memcpy(&h, s.data() + at, 2);
-    v = swap ? static_cast<std::uint16_t>(__builtin_bswap16(h)) : h;
-  } else {
-    std::memcpy(&v, s.data() + at, 4);
-    if (swap) v = __builtin_bswap32(v);
+    const auto h = numberAt<std::uint16_t>(s.data() + at);
+    return swap ? __builtin_bswap16(h) : h;
   }
-  return v;
+  const auto v = numberAt<std::uint32_t>(s.data() + at);
+  return swap ? __builtin_bswap32(v) : v;
 }
 
 unsigned widthOf(unsigned char tag) {
