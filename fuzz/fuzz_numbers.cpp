@@ -9,10 +9,11 @@
 // its result bit for bit and, for a finite argument, no infinity on
 // success, DOUBLETOCHAR's 24 bytes read back as the number, and
 // CHARTODOUBLE gives what strtod gives for the text it accepts.
+#include <array>
+#include <bit>
 #include <cmath>
 #include <cstdint>
 #include <cstdlib>
-#include <cstring>
 #include <limits>
 #include <numbers>
 #include <string>
@@ -27,11 +28,7 @@ namespace {
 using namespace orv::fuzz;
 using I128 = orv::model::Int128;
 
-std::uint64_t bits(double d) {
-  std::uint64_t b;
-  std::memcpy(&b, &d, 8);
-  return b;
-}
+std::uint64_t bits(double d) { return std::bit_cast<std::uint64_t>(d); }
 
 bool sameDouble(double a, double b) {
   return bits(a) == bits(b) || (std::isnan(a) && std::isnan(b));
@@ -45,35 +42,9 @@ std::string call(const char *name, R &out, bool store, A... in) {
   (c.input(numberBlock(in)), ...);
   c.result(Block(sizeof(R)));
   if (store) c.mayStoreOnFailure();
-  const std::string code = c.run();
+  std::string code = c.run();
   out = numberIn<R>(c.out());
   return code;
-}
-
-template <typename T>
-void integerForms(const char *abs, const char *sign, const char *ceiling, const char *floor, T x) {
-  T r{};
-  const std::string absCode = call(abs, r, false, x);
-  if (x == std::numeric_limits<T>::min()) {
-    ORV_CHECK(abs, absCode == "01");
-  } else {
-    ORV_CHECK(abs, absCode.empty() && r == (x < 0 ? static_cast<T>(-x) : x));
-  }
-  ORV_CHECK(sign, call(sign, r, false, x).empty() && r == (x > 0) - (x < 0));
-  ORV_CHECK(ceiling, call(ceiling, r, false, x).empty() && r == x);
-  ORV_CHECK(floor, call(floor, r, false, x).empty() && r == x);
-}
-
-template <typename T>
-void mod(const char *name, const char *zeroCode, T x, T y) {
-  T r{};
-  const std::string code = call(name, r, false, x, y);
-  if (y == 0) {
-    ORV_CHECK(name, code == zeroCode);
-    return;
-  }
-  ORV_CHECK(name, code.empty());
-  ORV_CHECK(name, I128{r} == I128{x} % I128{y});
 }
 
 // A call whose outcome is exactly `want`.
@@ -82,6 +53,21 @@ void exactly(const char *name, const orv::model::Exact &want, A... in) {
   R r{};
   ORV_CHECK(name,
             call(name, r, false, in...) == want.code && (!want.code.empty() || r == want.value));
+}
+
+// ABS, SIGN, CEILING and FLOOR of an integer and MOD of two, exactly.
+template <typename T>
+void integers(const std::array<const char *, 5> &names, const char *modByZero, T x, T y) {
+  using orv::model::Exact;
+  const std::int64_t wide = x;
+  exactly<T>(names[0], x == std::numeric_limits<T>::min() ? Exact{"01"} : Exact{"", std::abs(wide)},
+             x);
+  exactly<T>(names[1], Exact{"", (x > 0) - (x < 0)}, x);
+  exactly<T>(names[2], Exact{"", x}, x);
+  exactly<T>(names[3], Exact{"", x}, x);
+  exactly<T>(names[4],
+             y == 0 ? Exact{modByZero} : Exact{"", static_cast<std::int64_t>(I128{x} % I128{y})}, x,
+             y);
 }
 
 // The 32-bit ROUND and TRUNCATE: the 64-bit models' value where it fits 32
@@ -125,12 +111,12 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t *data, std::size_t size
             call("CLI_udfCEILING1", r, false, x).empty() && sameDouble(r, std::ceil(x)));
   ORV_CHECK("CLI_udfFLOOR1",
             call("CLI_udfFLOOR1", r, false, x).empty() && sameDouble(r, std::floor(x)));
-  integerForms("CLI_udfABS2", "CLI_udfSIGN2", "CLI_udfCEILING2", "CLI_udfFLOOR2", a);
-  integerForms("CLI_udfABS3", "CLI_udfSIGN3", "CLI_udfCEILING3", "CLI_udfFLOOR3", c);
-  integerForms("CLI_udfABS4", "CLI_udfSIGN4", "CLI_udfCEILING4", "CLI_udfFLOOR4", e);
-  mod("CLI_udfMOD1", "02", a, b);
-  mod("CLI_udfMOD2", "03", c, d);
-  mod("CLI_udfMOD3", "03", e, f);
+  integers({"CLI_udfABS2", "CLI_udfSIGN2", "CLI_udfCEILING2", "CLI_udfFLOOR2", "CLI_udfMOD1"}, "02",
+           a, b);
+  integers({"CLI_udfABS3", "CLI_udfSIGN3", "CLI_udfCEILING3", "CLI_udfFLOOR3", "CLI_udfMOD2"}, "03",
+           c, d);
+  integers({"CLI_udfABS4", "CLI_udfSIGN4", "CLI_udfCEILING4", "CLI_udfFLOOR4", "CLI_udfMOD3"}, "03",
+           e, f);
 
   exactly<std::int32_t>("CLI_udfROUND2", in32Bits(orv::model::round64(a, n), n), a, n);
   exactly<std::int32_t>("CLI_udfTRUNCATE2", in32Bits(orv::model::truncate64(a, n), n), a, n);

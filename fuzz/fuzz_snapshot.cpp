@@ -74,11 +74,11 @@ struct Table {
   }
 
   // Column c untouched, or all of them.
-  bool untouched(std::size_t c) const {
+  [[nodiscard]] bool untouched(std::size_t c) const {
     return allAre(columns[c].data(), std::min<std::size_t>(columns[c].size(), 9)) &&
            numberIn<std::int16_t>(indicators[c]) == kIndicator;
   }
-  bool nothingWritten() const {
+  [[nodiscard]] bool nothingWritten() const {
     for (std::size_t c = 0; c < 18; ++c) {
       if (!untouched(c)) return false;
     }
@@ -100,13 +100,10 @@ extern "C" int LLVMFuzzerInitialize(int *, char ***) {
   setenv("ORVENGINE_SNAPSHOT_NAME", "cache", 1);
   file() = dir / "tmp" / "cache.sql";
   // The directory goes when the process ends normally.
-  static const struct Remove {
-    fs::path d;
-    ~Remove() {
-      std::error_code ignored;
-      fs::remove_all(d, ignored);
-    }
-  } remove{dir};
+  static_cast<void>(std::atexit([] {
+    std::error_code ignored;
+    fs::remove_all(file().parent_path().parent_path(), ignored);
+  }));
   return 0;
 }
 
@@ -117,7 +114,7 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t *data, std::size_t size
     std::ofstream out(file(), std::ios::binary | std::ios::trunc);
     out.write(stream.data(), static_cast<std::streamsize>(stream.size()));
   }
-  static Table *table = new Table;  // its 1 MiB column is kept across runs
+  static auto *table = new Table;  // its 1 MiB column is kept across runs
   Table &t = *table;
   std::memset(t.scratchpad.data(), 0, t.scratchpad.size());
 

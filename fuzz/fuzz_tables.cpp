@@ -36,10 +36,16 @@ struct Engine {
 };
 Engine *engine = nullptr;
 
+// The number a request slot points at.
+std::int32_t *target(std::uint64_t slot) {
+  std::int32_t *p = nullptr;
+  std::memcpy(&p, &slot, sizeof p);
+  return p;
+}
+
 std::int32_t callback(std::int32_t slots, void *request) {
   auto *slot = static_cast<std::uint64_t *>(request);
-  std::int32_t code = 0;
-  std::memcpy(&code, reinterpret_cast<void *>(static_cast<std::uintptr_t>(slot[0])), 4);
+  const std::int32_t code = *target(slot[0]);
   if (code == 1) {
     ORV_CHECK("callback", slots == 2);
     ++engine->closes;
@@ -50,8 +56,7 @@ std::int32_t callback(std::int32_t slots, void *request) {
   const bool threads = code == 3;
   ORV_CHECK("callback", slots == (threads ? 4 : 3));
   ++engine->opens;
-  auto *count =
-      reinterpret_cast<std::int32_t *>(static_cast<std::uintptr_t>(slot[threads ? 2 : 1]));
+  std::int32_t *count = target(slot[threads ? 2 : 1]);
   ORV_CHECK("callback", *count == 0 && slot[threads ? 3 : 2] == 0);
   *count = engine->count;
   if (engine->giveTable)
@@ -62,7 +67,7 @@ std::int32_t callback(std::int32_t slots, void *request) {
 std::string failed(std::int32_t status) {
   char text[CLI_MESSAGE_SIZE];
   static_cast<void>(std::snprintf(text, sizeof text, "API call failed %" PRId32, status));
-  return std::string(text, std::strlen(text) + 1);
+  return {text, std::strlen(text) + 1};
 }
 
 void drive(bool threads, const std::uint8_t *&data, std::size_t &size) {

@@ -13,6 +13,7 @@
 // eight bytes "sqlocpcv", leaving the length word and the indicator alone.
 #include <cstdint>
 #include <cstring>
+#include <iterator>
 #include <string>
 #include <string_view>
 
@@ -36,17 +37,14 @@ std::uint32_t lengthAt(std::string_view s, std::size_t at, unsigned width, bool 
   return swap ? __builtin_bswap32(v) : v;
 }
 
-unsigned widthOf(unsigned char tag) {
-  return tag == 0x4B ? 1 : tag == 0x8B ? 2 : tag == 0xCB ? 4 : 0;
-}
-
 // Records of a chain that lies wholly inside `s`, or -1 where one does not.
 long records(std::string_view s, bool swap) {
   long n = 0;
   std::size_t t = 22;
   if (s.size() < 23) return 0;
   while (true) {
-    const unsigned width = widthOf(static_cast<unsigned char>(s[t]));
+    const auto tag = static_cast<unsigned char>(s[t]);
+    const unsigned width = tag == 0x4B ? 1 : tag == 0x8B ? 2 : tag == 0xCB ? 4 : 0;
     if (width == 0 || t + 1 + width > s.size()) return -1;
     const std::uint32_t length = lengthAt(s, t + 1, width, swap);
     if (t + 1 + width + std::size_t{length} > s.size()) return -1;
@@ -62,11 +60,9 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t *data, std::size_t size
   keepLastInput(data, size);
   if (size < 15) return 0;
   const std::uint8_t options = data[0];
-  std::int32_t source = 0, target = 0, order = 0;
-  std::memcpy(&source, data + 3, 4);
-  std::memcpy(&target, data + 7, 4);
-  std::memcpy(&order, data + 11, 4);
-  constexpr std::size_t kPages = sizeof kCodePages / sizeof kCodePages[0];
+  auto source = numberAt<std::int32_t>(data + 3), target = numberAt<std::int32_t>(data + 7),
+       order = numberAt<std::int32_t>(data + 11);
+  constexpr std::size_t kPages = std::size(kCodePages);
   if (data[1] < 2 * kPages) source = kCodePages[data[1] % kPages];
   if (data[2] < 2 * kPages) target = kCodePages[data[2] % kPages];
   const std::int32_t orders[] = {-1, 0, 1, order};

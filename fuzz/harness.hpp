@@ -17,6 +17,7 @@
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
+#include <map>
 #include <memory>
 #include <string>
 #include <string_view>
@@ -89,10 +90,10 @@ class Block {
   explicit Block(std::string_view bytes) : Block(bytes.size()) {
     std::copy(bytes.begin(), bytes.end(), chars());
   }
-  unsigned char *data() const { return bytes_.get(); }
-  char *chars() const { return reinterpret_cast<char *>(bytes_.get()); }
-  std::size_t size() const { return size_; }
-  std::string_view view() const { return {chars(), size_}; }
+  [[nodiscard]] unsigned char *data() const { return bytes_.get(); }
+  [[nodiscard]] char *chars() const { return reinterpret_cast<char *>(bytes_.get()); }
+  [[nodiscard]] std::size_t size() const { return size_; }
+  [[nodiscard]] std::string_view view() const { return {chars(), size_}; }
 
  private:
   std::unique_ptr<unsigned char[], Release> bytes_;
@@ -155,28 +156,18 @@ inline std::string_view textIn(const char *routine, const Block &b) {
 inline std::string_view upToNul(std::string_view s) { return s.substr(0, s.find('\0')); }
 
 // An export of the linked library, found by name as an engine finds it,
-// with its catalogue row.  Lookups are kept by the address of the name
-// (almost always a literal, confirmed by the name itself): a run makes
-// hundreds of calls, and the lookup would otherwise cost as much as the
-// routine.
+// with its catalogue row; each once, since a run makes hundreds of calls
+// and the lookup would otherwise cost as much as the routine.
 struct Export {
   const cat::Routine *routine = nullptr;
   void *address = nullptr;
 };
 inline Export lookUp(const char *name) {
-  struct Seen {
-    const char *at;
-    std::string name;
-    Export found;
-  };
-  static auto *seen = new std::vector<Seen>;  // never destroyed, as keptBlocks
-  for (const Seen &s : *seen) {
-    if (s.at == name && s.name == name) return s.found;
-  }
+  static auto *seen = new std::map<std::string, Export, std::less<>>;  // never destroyed
+  if (const auto at = seen->find(std::string_view(name)); at != seen->end()) return at->second;
   const Export e{cat::find(name), dlsym(RTLD_DEFAULT, name)};
   if (e.address == nullptr || e.routine == nullptr) broken(name, "not exported, or not catalogued");
-  if (seen->size() < 256) seen->push_back({name, name, e});
-  return e;
+  return seen->emplace(name, e).first->second;
 }
 
 // The frame of a call whose values, indicators and status buffers are
@@ -273,7 +264,7 @@ class Call {
       ORV_CHECK(name_, trimmedOrSame(before_[i], inputs_[i].view(), mayTrim));
     }
     for (std::size_t i = 0; i <= inputs_.size(); ++i) ORV_CHECK(name_, indicator(i) == kIndicator);
-    const std::string code = sysfunCode();
+    std::string code = sysfunCode();
     if (!code.empty() && !mayStore_) ORV_CHECK(name_, resultUntouched());
     return code;
   }
@@ -299,7 +290,7 @@ class Call {
   // The SYSFUN code of the call, after checking the exact form of the
   // status: both buffers untouched, or "38552" and "SYSFUN:NN" with their
   // terminators and nothing else written, NN one of the routine's codes.
-  std::string sysfunCode() const {
+  [[nodiscard]] std::string sysfunCode() const {
     if (allAre(sqlstate_.data(), sqlstate_.size(), 'S')) {
       ORV_CHECK(name_, allAre(message_.data(), message_.size(), 'M'));
       return {};
@@ -315,16 +306,18 @@ class Call {
     return std::string(m.substr(7, 2));
   }
 
-  const char *name() const { return name_; }
-  const Block &in(std::size_t i) const { return inputs_[i]; }
-  const Block &out() const { return result_; }
-  const std::string &inputBefore(std::size_t i) const { return before_[i]; }
+  [[nodiscard]] const char *name() const { return name_; }
+  [[nodiscard]] const Block &in(std::size_t i) const { return inputs_[i]; }
+  [[nodiscard]] const Block &out() const { return result_; }
+  [[nodiscard]] const std::string &inputBefore(std::size_t i) const { return before_[i]; }
   // Input i's indicator, or the result's for the last i.
-  std::int16_t indicator(std::size_t i) const { return numberIn<std::int16_t>(indicators_[i]); }
-  const Block &sqlstate() const { return sqlstate_; }
-  const Block &message() const { return message_; }
+  [[nodiscard]] std::int16_t indicator(std::size_t i) const {
+    return numberIn<std::int16_t>(indicators_[i]);
+  }
+  [[nodiscard]] const Block &sqlstate() const { return sqlstate_; }
+  [[nodiscard]] const Block &message() const { return message_; }
   // The head of the area as the caller set it, the rest unwritten.
-  bool resultUntouched() const {
+  [[nodiscard]] bool resultUntouched() const {
     return result_.view().starts_with(head_) &&
            allAre(result_.data() + head_.size(), result_.size() - head_.size());
   }
