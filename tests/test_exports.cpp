@@ -144,7 +144,7 @@ TEST(Exports, AreExactlyTheCataloguedRoutinesAndTheDataExportAsData) {
   const Surface surface = exportsOf(static_cast<const unsigned char *>(library));
   EXPECT_EQ(surface.name, "ORVCLIFN.dll");
 #else
-  std::ifstream in(libraryFile(library), std::ios::binary);
+  std::ifstream in(ORV_LIBRARY_PATH, std::ios::binary);
   const Surface surface = exportsOf({std::istreambuf_iterator<char>(in), {}});
   EXPECT_EQ(surface.name, "liborvclifn.so.1");
 #endif

@@ -6,7 +6,6 @@
 #include <windows.h>
 #else
 #include <dlfcn.h>
-#include <link.h>
 #include <sys/mman.h>
 #include <sys/stat.h>
 #include <unistd.h>
@@ -29,12 +28,6 @@ void closeLibrary(void *library) { ::FreeLibrary(static_cast<HMODULE>(library));
 
 std::string loaderError() {
   return "LoadLibraryA failed with error " + std::to_string(::GetLastError());
-}
-
-std::string libraryFile(void *library) {
-  char path[MAX_PATH + 1] = {};
-  const DWORD n = ::GetModuleFileNameA(static_cast<HMODULE>(library), path, MAX_PATH);
-  return std::string(path, n);
 }
 
 void setEnvironment(const char *name, const char *value) { ::_putenv_s(name, value); }
@@ -73,12 +66,6 @@ void closeLibrary(void *library) { ::dlclose(library); }
 std::string loaderError() {
   const char *why = ::dlerror();
   return why == nullptr ? "" : why;
-}
-
-std::string libraryFile(void *library) {
-  const link_map *map = nullptr;
-  if (::dlinfo(library, RTLD_DI_LINKMAP, &map) != 0 || map == nullptr) return {};
-  return map->l_name;
 }
 
 void setEnvironment(const char *name, const char *value) { ::setenv(name, value, 1); }

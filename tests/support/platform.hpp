@@ -23,9 +23,6 @@ void closeLibrary(void *library);
 // Why the last openLibrary failed.
 std::string loaderError();
 
-// The path of the file an opened library was loaded from.
-std::string libraryFile(void *library);
-
 void setEnvironment(const char *name, const char *value);
 void unsetEnvironment(const char *name);
 
