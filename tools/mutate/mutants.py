@@ -1,6 +1,6 @@
 """The mutants of the library's sources: how they are found, stored and applied.
 
-A mutant is one small edit of one line of a source under src/.  It is kept
+A mutant is one small edit of one line of a source under src/ or hosts/.  It is kept
 in mutants.tsv without line or column numbers, so that edits elsewhere in a
 file leave it valid: it names the file, the line's text (stripped of its
 indentation), which occurrence of that text in the file it is (usually 1),
@@ -13,8 +13,13 @@ import re
 from dataclasses import dataclass
 from pathlib import Path
 
-# The folders of the library whose code is mutated, in the order of the report.
-FOLDERS = ("src/calendar", "src/datetime", "src/numeric", "src/string", "src/engine", "src/frame")
+# The folders of the library whose code is mutated, and those of the hosts,
+# in the order of the report.  A set drawn without naming folders is drawn
+# from the library's.
+LIBRARY_FOLDERS = ("src/calendar", "src/datetime", "src/numeric", "src/string", "src/engine",
+                   "src/frame")
+HOST_FOLDERS = ("hosts/sqlite", "hosts/postgres")
+FOLDERS = LIBRARY_FOLDERS + HOST_FOLDERS
 
 KINDS = ("relational", "constant", "arithmetic", "logical", "negate", "branch", "bound")
 
@@ -112,6 +117,40 @@ def apply(text, mutant):
     lines = text.split("\n")
     lines[index] = lines[index].replace(mutant.original, mutant.mutated, 1)
     return "\n".join(lines), index + 1
+
+
+def windows_only_lines(text):
+    """The 1-based numbers of the lines that only a Windows build compiles.
+
+    They are the lines inside `#if defined(_WIN32)` or `#ifdef _WIN32`
+    (before its `#else` or `#elif`), and after the `#else` of `#if
+    !defined(_WIN32)` or `#ifndef _WIN32`.  A condition that names _WIN32
+    among others is not followed: the lines under it count as compiled on
+    both.
+    """
+    windows = re.compile(r"#\s*(ifdef\s+_WIN32|if\s+defined\s*\(?\s*_WIN32\s*\)?)\s*(//.*)?$")
+    not_windows = re.compile(r"#\s*(ifndef\s+_WIN32|if\s+!\s*defined\s*\(?\s*_WIN32\s*\)?)\s*(//.*)?$")
+    stack = []  # per open #if: "win", "linux" (compiled only off Windows) or "any"
+    lines = set()
+    for number, line in enumerate(text.split("\n"), 1):
+        code = line.strip()
+        if code.startswith("#"):
+            if windows.match(code):
+                stack.append("win")
+            elif not_windows.match(code):
+                stack.append("linux")
+            elif re.match(r"#\s*if", code):
+                stack.append("any")
+            elif re.match(r"#\s*else", code) and stack:
+                stack[-1] = {"win": "linux", "linux": "win"}.get(stack[-1], "any")
+            elif re.match(r"#\s*elif", code) and stack:
+                stack[-1] = "linux" if stack[-1] == "win" else "any"
+            elif re.match(r"#\s*endif", code) and stack:
+                stack.pop()
+            continue
+        if "win" in stack:
+            lines.add(number)
+    return lines
 
 
 # --------------------------------------------------------------------------
