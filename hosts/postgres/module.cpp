@@ -251,10 +251,14 @@ bool timestampOf(const char *text, std::size_t size, Timestamp &out) {
       !readDigits(text + 20, 6, f)) {
     return false;
   }
+  // The library ends a day at 24.00.00.000000 (TIMESTAMPTIME of 24:00:00,
+  // which PostgreSQL's time takes too): the next day's midnight.
+  const bool endOfDay = h == 24 && mi == 0 && s == 0 && f == 0;
+  if (endOfDay) h = 0;
   if (y < 1 || mo < 1 || mo > 12 || d < 1 || d > 31 || h > 23 || mi > 59 || s > 59) return false;
   const std::int64_t days =
       daysFromCivil(y, static_cast<unsigned>(mo), static_cast<unsigned>(d)) - kEpochShift;
-  out = days * kDay + ((h * 60 + mi) * 60 + s) * USECS_PER_SEC + f;
+  out = (days + (endOfDay ? 1 : 0)) * kDay + ((h * 60 + mi) * 60 + s) * USECS_PER_SEC + f;
   return true;
 }
 
