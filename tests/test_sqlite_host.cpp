@@ -116,9 +116,12 @@ TEST_F(SqliteHost, AnswersQueries) {
       {"SELECT sysfun_left('abc', 2147483647)",
        "error: LEFT: SQLSTATE 38552, SYSFUN:01: an argument lies outside what the function "
        "accepts"},
-      // The plain name validates the time; the narrower export reads only the date.
-      {"SELECT JULIAN_DAY('2001-09-27') || ' ' || sysfun_julian_day1('2001-09-27-99.99.99')",
-       "2452180 2452180"},
+      // The plain name validates the time to its last digit; the narrower
+      // export reads only the date.
+      {"SELECT JULIAN_DAY('2001-09-27-13.30.15.123456') || ' ' || "
+       "MIDNIGHT_SECONDS('2001-09-27-13.30.15.123456') || ' ' || "
+       "sysfun_julian_day1('2001-09-27-99.99.99')",
+       "2452180 48615 2452180"},
       {"SELECT JULIAN_DAY('2001-09-27-99.99.99')",
        "error: JULIAN_DAY: SQLSTATE 38552, SYSFUN:06: the time of the timestamp is not valid, or "
        "the text has no form that is taken"},
@@ -154,10 +157,8 @@ TEST_F(SqliteHost, AnswersQueries) {
       // scalar argument is.
       {"SELECT count(*) || '/' || sum(column6 & 4 != 0) FROM fmprows", "104/3"},
       {"SELECT column2 FROM fmprows WHERE column1 = 0", "8"},  // SPACE: 8 arguments
-      {"SELECT count(*) > 0 FROM fmpthreads(0)", "1"},
       {"SELECT count(*) FROM fmpthreads(-5)", "0"},
       {"SELECT count(*) FROM fmpthreads WHERE selector = NULL", "0"},
-      {"SELECT count(*) > 0 FROM fmpthreads(0.0)", "1"},
       {"SELECT count(*) FROM fmpthreads(4294967296)",
        "error: FmpThreads: argument 1 (selector) is 4294967296, outside the 32-bit range"},
       {"SELECT count(*) FROM fmpthreads(-1.5)",
@@ -177,6 +178,8 @@ TEST_F(SqliteHost, AnswersQueries) {
        "CLI_udfLEFT1, CLI_udfLEFT2 / string: text | CLI_udfLob, n: 32-bit integer / 01 / left"},
       {"SELECT exports FROM sysfun_functions WHERE name = 'sysfun_julian_day1'",
        "CLI_udfJULIAN_DAY1"},
+      {"SELECT summary FROM sysfun_functions WHERE name = 'sysfun_julian_day'",
+       "Julian day number of a date or timestamp, validated to its end."},
       // Every row names a function that SQLite has with that argument count,
       // under both names where a plain name is given, and every registered
       // sysfun_ function has its row.
@@ -198,6 +201,11 @@ TEST_F(SqliteHost, AnswersQueries) {
        "0"},
   };
   for (const auto &c : cases) EXPECT_EQ(eval(c.sql), c.expected) << c.sql;
+  // FmpThreads holds this thread, running ('R', 82), among all of the
+  // process's; a whole REAL selects it alone.
+  const std::string self = std::to_string(::gettid());
+  EXPECT_EQ(eval("SELECT count(*) || column2 FROM fmpthreads(0) WHERE column1 = " + self), "182");
+  EXPECT_EQ(eval("SELECT count(*) || column1 FROM fmpthreads(" + self + ".0)"), "1" + self);
 }
 
 // The snapshot is read where the instance path says, one row per fetch.
@@ -210,14 +218,33 @@ TEST_F(SqliteHost, ReadsTheSnapshotAsATable) {
   st.text = "SELECT 1";
   std::ofstream(dir / "tmp" / "sqlcache.sql", std::ios::binary)
       << orv::snapshot::section("PKG") + orv::snapshot::statement(st) +
-             orv::snapshot::statement(st);
+             orv::snapshot::statement(st) +
+             orv::snapshot::element(19, orv::snapshot::element(312, "SELECT 2"));
   setenv("ORVENGINE_INSTANCE_PATH", dir.c_str(), 1);
-  EXPECT_EQ(eval("SELECT count(*) || group_concat(column1 || column17 || column18, ',') "
-                 "FROM sqlcache_snapshot"),
-            "27PKGSELECT 1,7PKGSELECT 1");
+  // A column whose element a statement lacks is NULL.
+  EXPECT_EQ(eval("SELECT count(*) || group_concat(ifnull(column1, 'N') || column17 || column18, "
+                 "',') FROM sqlcache_snapshot"),
+            "37PKGSELECT 1,7PKGSELECT 1,NPKGSELECT 2");
   unsetenv("ORVENGINE_INSTANCE_PATH");
   EXPECT_EQ(eval("SELECT count(*) FROM sysfun_sqlcache_snapshot"), "0");
   fs::remove_all(dir);
+}
+
+// A module that the connection has under a table function's plain name is
+// kept: the extension adds only its sysfun_ name.
+TEST(SqliteHostModules, KeepAModuleOfTheConnectionsOwn) {
+  static constexpr sqlite3_module kOwn{};
+  bool replaced = false;
+  sqlite3 *db = nullptr;
+  ASSERT_EQ(sqlite3_open(":memory:", &db), SQLITE_OK);
+  sqlite3_create_module_v2(db, "FMPROWS", &kOwn, &replaced,
+                           [](void *flag) { *static_cast<bool *>(flag) = true; });
+  char *error = nullptr;
+  sqlite3_enable_load_extension(db, 1);
+  EXPECT_EQ(sqlite3_load_extension(db, ORV_SQLITE_HOST_PATH, nullptr, &error), SQLITE_OK);
+  sqlite3_free(error);
+  EXPECT_FALSE(replaced);
+  sqlite3_close(db);
 }
 
 // Connections load the extension while others run its table functions:
