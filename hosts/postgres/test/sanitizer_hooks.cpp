@@ -1,5 +1,5 @@
 // Preloaded after the address sanitizer's runtime into the test servers
-// of a sanitized build (test/server.sh), for two faults of the runtimes in
+// of a sanitized build (test/PgServers.pm), for two faults of the runtimes in
 // a server that was not built with them.
 #include <cstddef>
 #include <cstdlib>
