@@ -131,7 +131,7 @@ sub start {
 # this tree) makes it ours.
 END {
   my $status = $?;
-  $_->teardown_node for @nodes;
+  $_->stop('immediate', fail_ok => 1) for @nodes;    # also one that a crash stopped
   for my $file (glob("$work/sanitizer/report.*"), map { $_->logfile } @nodes) {
     open my $f, '<', $file or next;
     my ($text, $on) = ('');
