@@ -28,6 +28,7 @@ use POSIX ();
 our ($work, $install, $sources, %preload);
 BEGIN {
   my $build = $ENV{ORV_BUILD} // die "ORV_BUILD names neither a build folder nor --system\n";
+  $build eq '--system' or -f "$build/CMakeCache.txt" or die "no CMakeCache.txt in $build\n";
   my %cache = $build eq '--system' ? () : `cat '$build/CMakeCache.txt'` =~ /^(\w+):\w+=(.*)$/mg;
   my $pg_config = $cache{ORV_PG_CONFIG} // '/usr/lib/postgresql/15/bin/pg_config';
   my %pg = map { $_ => `$pg_config --$_` =~ s/\n//r } qw(bindir sharedir pkglibdir);
@@ -52,7 +53,7 @@ BEGIN {
     }
     $install = $root . $install;
     if (($cache{ORV_SANITIZE} // '') =~ /address/) {
-      my ($asan) = `ldd $build/lib/postgresql/orvclifn.so` =~ /=> (\S*libasan\S*)/
+      my ($asan) = `ldd '$build/lib/postgresql/orvclifn.so'` =~ /=> (\S*libasan\S*)/
         or die "the sanitized module names no ASan runtime\n";
       mkdir "$work/sanitizer";
       system('cp', "$build/lib/orv_pg_sanitizer_hooks.so", $work) == 0 or die "no hooks\n";
