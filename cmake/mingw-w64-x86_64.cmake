@@ -1,5 +1,6 @@
 # Cross build for 64-bit Windows with Debian's mingw-w64 (the posix thread
-# model, for std::thread in the tests).  Executables run under Wine.
+# model, for std::thread in the tests).  The tests run under Wine; the
+# programs that the build itself runs are built natively (NativeTools.cmake).
 set(CMAKE_SYSTEM_NAME Windows)
 set(CMAKE_SYSTEM_PROCESSOR x86_64)
 
