@@ -17,6 +17,7 @@
 #include <string_view>
 
 #include "frame/cliudf.h"
+#include "frame/positions.hpp"
 
 namespace cli::catalogue {
 
@@ -251,9 +252,11 @@ constexpr std::size_t countSlots(const Slot (&slots)[N]) {
 constexpr std::size_t inputCount(const Routine &r) { return countSlots(r.inputs); }
 constexpr std::size_t resultCount(const Routine &r) { return countSlots(r.results); }
 
-// The extras that a frame variant has, as bits; the bits run in the order
-// in which the extras follow the diagnostic message buffer.
-enum : unsigned { kDbinfo = 1u, kScratchpad = 2u, kCallType = 4u, kCallback = 8u };
+// The extras that a frame variant has, as the bits of frame/positions.hpp.
+using frame::kCallback;
+using frame::kCallType;
+using frame::kDbinfo;
+using frame::kScratchpad;
 
 constexpr unsigned extrasOf(Frame f) {
   switch (f) {
@@ -275,11 +278,13 @@ constexpr std::size_t extraCount(Frame f) {
   return static_cast<std::size_t>(std::popcount(extrasOf(f)));
 }
 
-// Number of arguments of the export: values, indicators, the four status
-// and name arguments, and the extras.
-constexpr std::size_t argumentCount(const Routine &r) {
-  return 2 * (inputCount(r) + resultCount(r)) + 4 + extraCount(r.frame);
+// Where each argument of the row's export stands, and how many there are.
+constexpr frame::Positions positionsOf(const Routine &r) {
+  return frame::positionsOf(inputCount(r), resultCount(r), extrasOf(r.frame));
 }
+template <std::size_t Row>
+inline constexpr frame::Positions kPositions = positionsOf(kRoutines[Row]);
+constexpr std::size_t argumentCount(const Routine &r) { return positionsOf(r).count; }
 
 constexpr const Routine *find(std::string_view symbol) {
   for (const Routine &r : kRoutines) {
@@ -288,9 +293,20 @@ constexpr const Routine *find(std::string_view symbol) {
   return nullptr;
 }
 
-static_assert(argumentCount(*find("CLI_udfFmpRows")) == 19, "FmpRows has 19 arguments");
-static_assert(argumentCount(*find("CLI_udfFmpThreads")) == 21, "FmpThreads has 21 arguments");
-static_assert(argumentCount(*find("SQLCACHE_SNAPSHOT")) == 42,
-              "SQLCACHE_SNAPSHOT has 42 arguments");
+static_assert(positionsOf(*find("CLI_udfFmpThreads")).count == 21 &&
+              positionsOf(*find("CLI_udfFmpThreads")).callback == 20);
+static_assert(positionsOf(*find("CLI_udfFmpRows")).count == 19 &&
+              positionsOf(*find("CLI_udfFmpRows")).scratchpad == 16);
+static_assert(positionsOf(*find("SQLCACHE_SNAPSHOT")).count == 42 &&
+              positionsOf(*find("SQLCACHE_SNAPSHOT")).callType == 41 &&
+              !frame::present(positionsOf(*find("SQLCACHE_SNAPSHOT")).callback));
+static_assert(positionsOf(*find("CLI_udfRAND1")).resultIndicator(0) == 1 &&
+              positionsOf(*find("CLI_udfRAND1")).count == 6);
+static_assert(positionsOf(*find("CLI_udfRAND2")).scratchpad == 8 &&
+              positionsOf(*find("CLI_udfDAYNAME1")).dbinfo == 8);
+static_assert(positionsOf(*find("CLI_udfSPACE")).sqlstate == 4 &&
+              positionsOf(*find("CLI_udfSPACE")).message == 7);
+static_assert(positionsOf(*find("CLI_udfMOD1")).sqlstate == 6 &&
+              positionsOf(*find("CLI_udfMOD1")).message == 9);
 
 }  // namespace cli::catalogue
