@@ -54,22 +54,24 @@ inline constexpr std::size_t kMaxArguments = [] {
 // room for them all (kMaxArguments is enough for any row); returns how many
 // there are.
 inline std::size_t layOut(const cat::Routine &row, const Frame &f, void **args) noexcept {
-  const std::size_t n = cat::inputCount(row), m = cat::resultCount(row);
-  std::size_t k = 0;
-  for (std::size_t i = 0; i < n; ++i) args[k++] = f.inputs[i];
-  for (std::size_t i = 0; i < m; ++i) args[k++] = f.results[i];
-  for (std::size_t i = 0; i < n; ++i) args[k++] = f.inputIndicators[i];
-  for (std::size_t i = 0; i < m; ++i) args[k++] = f.resultIndicators[i];
-  args[k++] = f.sqlstate;
-  args[k++] = const_cast<char *>(f.functionName);
-  args[k++] = const_cast<char *>(f.specificName);
-  args[k++] = f.message;
-  const unsigned extras = cat::extrasOf(row.frame);
-  if ((extras & cat::kDbinfo) != 0) args[k++] = const_cast<void *>(f.dbinfo);
-  if ((extras & cat::kScratchpad) != 0) args[k++] = f.scratchpad;
-  if ((extras & cat::kCallType) != 0) args[k++] = f.callType;
-  if ((extras & cat::kCallback) != 0) args[k++] = reinterpret_cast<void *>(f.callback);
-  return k;
+  const frame::Positions at = cat::positionsOf(row);
+  for (std::size_t i = 0; i < at.inputs; ++i) {
+    args[at.input(i)] = f.inputs[i];
+    args[at.inputIndicator(i)] = f.inputIndicators[i];
+  }
+  for (std::size_t j = 0; j < at.results; ++j) {
+    args[at.result(j)] = f.results[j];
+    args[at.resultIndicator(j)] = f.resultIndicators[j];
+  }
+  args[at.sqlstate] = f.sqlstate;
+  args[at.functionName] = const_cast<char *>(f.functionName);
+  args[at.specificName] = const_cast<char *>(f.specificName);
+  args[at.message] = f.message;
+  if (frame::present(at.dbinfo)) args[at.dbinfo] = const_cast<void *>(f.dbinfo);
+  if (frame::present(at.scratchpad)) args[at.scratchpad] = f.scratchpad;
+  if (frame::present(at.callType)) args[at.callType] = f.callType;
+  if (frame::present(at.callback)) args[at.callback] = reinterpret_cast<void *>(f.callback);
+  return at.count;
 }
 
 // Calls `fn` with the K arguments at `args`.
@@ -129,30 +131,26 @@ inline void call(const cat::Routine &row, void *fn, const Frame &f) noexcept {
 // call is as direct as a hand-written one.
 template <std::size_t Row>
 [[gnu::always_inline]] inline void call(void *fn, const Frame &f) noexcept {
-  constexpr std::size_t n = cat::inputCount(cat::kRoutines[Row]);
-  constexpr std::size_t m = cat::resultCount(cat::kRoutines[Row]);
-  constexpr std::size_t k = cat::argumentCount(cat::kRoutines[Row]);
-  constexpr unsigned extras = cat::extrasOf(cat::kRoutines[Row].frame);
+  static constexpr frame::Positions at = cat::kPositions<Row>;
   [&]<std::size_t... I, std::size_t... J>(std::index_sequence<I...>, std::index_sequence<J...>) {
-    void *args[k] = {f.inputs[I]...,
-                     f.results[J]...,
-                     f.inputIndicators[I]...,
-                     f.resultIndicators[J]...,
-                     f.sqlstate,
-                     const_cast<char *>(f.functionName),
-                     const_cast<char *>(f.specificName),
-                     f.message};
-    // The extras stand in their frame order behind the message.
-    std::size_t at = 2 * (n + m) + 4;
-    if constexpr ((extras & cat::kDbinfo) != 0) args[at++] = const_cast<void *>(f.dbinfo);
-    if constexpr ((extras & cat::kScratchpad) != 0) args[at++] = f.scratchpad;
-    if constexpr ((extras & cat::kCallType) != 0) args[at++] = f.callType;
-    if constexpr ((extras & cat::kCallback) != 0) {
-      args[at++] = reinterpret_cast<void *>(f.callback);
+    void *args[at.count] = {};
+    ((args[at.input(I)] = f.inputs[I]), ...);
+    ((args[at.result(J)] = f.results[J]), ...);
+    ((args[at.inputIndicator(I)] = f.inputIndicators[I]), ...);
+    ((args[at.resultIndicator(J)] = f.resultIndicators[J]), ...);
+    args[at.sqlstate] = f.sqlstate;
+    args[at.functionName] = const_cast<char *>(f.functionName);
+    args[at.specificName] = const_cast<char *>(f.specificName);
+    args[at.message] = f.message;
+    if constexpr (frame::present(at.dbinfo)) args[at.dbinfo] = const_cast<void *>(f.dbinfo);
+    if constexpr (frame::present(at.scratchpad)) args[at.scratchpad] = f.scratchpad;
+    if constexpr (frame::present(at.callType)) args[at.callType] = f.callType;
+    if constexpr (frame::present(at.callback)) {
+      args[at.callback] = reinterpret_cast<void *>(f.callback);
     }
-    invokeWith<k>(fn, args);
+    invokeWith<at.count>(fn, args);
   }
-  (std::make_index_sequence<n>{}, std::make_index_sequence<m>{});
+  (std::make_index_sequence<at.inputs>{}, std::make_index_sequence<at.results>{});
 }
 
 // The status buffers of one call, cleared.

@@ -76,12 +76,13 @@ auto resultView(Pointer p) noexcept {
 // indicator for a routine that handles NULL.
 template <std::size_t R, std::size_t I, class Arguments>
 auto inputArgument(const Arguments &a) noexcept {
-  constexpr std::size_t n = inputCount(cat::kRoutines[R]), m = resultCount(cat::kRoutines[R]);
+  constexpr frame::Positions at = cat::kPositions<R>;
   if constexpr ((cat::kRoutines[R].properties & cat::kHandlesNull) != 0) {
-    using View = decltype(inputView<R, I>(std::get<I>(a)));
-    return Nullable<View>{inputView<R, I>(std::get<I>(a)), *std::get<n + m + I>(a)};
+    using View = decltype(inputView<R, I>(std::get<at.input(I)>(a)));
+    return Nullable<View>{inputView<R, I>(std::get<at.input(I)>(a)),
+                          *std::get<at.inputIndicator(I)>(a)};
   } else {
-    return inputView<R, I>(std::get<I>(a));
+    return inputView<R, I>(std::get<at.input(I)>(a));
   }
 }
 
@@ -90,21 +91,21 @@ auto inputArgument(const Arguments &a) noexcept {
 // reach the logic in registers.
 template <std::size_t R, class Arguments, class F>
 decltype(auto) withExtras(const Arguments &a, F f) noexcept {
-  constexpr std::size_t first =
-      2 * (inputCount(cat::kRoutines[R]) + resultCount(cat::kRoutines[R])) + 4;
+  constexpr frame::Positions at = cat::kPositions<R>;
   constexpr unsigned extras = cat::extrasOf(cat::kRoutines[R].frame);
   if constexpr (extras == 0) {
     return f();
   } else if constexpr (extras == cat::kDbinfo) {
-    return f(DbInfo{std::get<first>(a)});
+    return f(DbInfo{std::get<at.dbinfo>(a)});
   } else if constexpr (extras == cat::kScratchpad) {
-    return f(Scratchpad{std::get<first>(a)});
+    return f(Scratchpad{std::get<at.scratchpad>(a)});
   } else if constexpr (extras == (cat::kScratchpad | cat::kCallType)) {
-    return f(Scratchpad{std::get<first>(a)}, static_cast<CallType>(*std::get<first + 1>(a)));
+    return f(Scratchpad{std::get<at.scratchpad>(a)},
+             static_cast<CallType>(*std::get<at.callType>(a)));
   } else {
     static_assert(extras == (cat::kScratchpad | cat::kCallType | cat::kCallback));
-    return f(Scratchpad{std::get<first>(a)}, static_cast<CallType>(*std::get<first + 1>(a)),
-             std::get<first + 2>(a));
+    return f(Scratchpad{std::get<at.scratchpad>(a)},
+             static_cast<CallType>(*std::get<at.callType>(a)), std::get<at.callback>(a));
   }
 }
 
@@ -124,11 +125,12 @@ decltype(auto) callLogic(const Arguments &a, Between... between) noexcept {
 template <std::size_t R, class Arguments>
 struct RowArguments {
   static constexpr const cat::Routine &r = cat::kRoutines[R];
-  static constexpr std::size_t n = inputCount(r), m = resultCount(r);
+  static constexpr frame::Positions at = cat::kPositions<R>;
+  static constexpr std::size_t m = at.results;
   explicit RowArguments(const Arguments &a) noexcept {
     [&]<std::size_t... I>(std::index_sequence<I...>) {
-      ((values[I] = std::get<n + I>(a)), ...);
-      ((indicators[I] = std::get<2 * n + m + I>(a)), ...);
+      ((values[I] = std::get<at.result(I)>(a)), ...);
+      ((indicators[I] = std::get<at.resultIndicator(I)>(a)), ...);
     }
     (std::make_index_sequence<m>{});
   }
@@ -149,31 +151,32 @@ struct RowArguments {
 template <std::size_t R, auto Logic, class... Raw>
 void run(Raw... raw) noexcept {
   constexpr const cat::Routine &r = cat::kRoutines[R];
-  constexpr std::size_t n = inputCount(r), m = resultCount(r);
-  static_assert(sizeof...(Raw) == cat::argumentCount(r), "the export's arguments are its row's");
+  constexpr frame::Positions at = cat::kPositions<R>;
+  constexpr std::size_t m = at.results;
+  static_assert(sizeof...(Raw) == at.count, "the export's arguments are its row's");
   const std::tuple<Raw...> a{raw...};
-  char *const sqlstate = std::get<2 * (n + m)>(a);
-  char *const message = std::get<2 * (n + m) + 3>(a);
+  char *const sqlstate = std::get<at.sqlstate>(a);
+  char *const message = std::get<at.message>(a);
 
   if constexpr (r.frame == cat::Frame::table || r.frame == cat::Frame::tableCallback) {
     const RowArguments<R, std::tuple<Raw...>> row(a);
     callLogic<R, Logic>(a, row.view()).store(sqlstate, message);
   } else if constexpr ((r.properties & cat::kResultByAddress) != 0) {
     static_assert(m == 1 && isNumber(r.results[0].layout));
-    callLogic<R, Logic>(a, std::get<n>(a)).store(sqlstate, message);
+    callLogic<R, Logic>(a, std::get<at.result(0)>(a)).store(sqlstate, message);
   } else if constexpr (isNumber(r.results[0].layout)) {
     static_assert(m == 1 && (r.properties & cat::kHandlesNull) == 0);
     const auto answer = callLogic<R, Logic>(a);
-    if (answer.code == Sysfun::none || answer.stored) *std::get<n>(a) = answer.value;
+    if (answer.code == Sysfun::none || answer.stored) *std::get<at.result(0)>(a) = answer.value;
     if (answer.code != Sysfun::none) Report(answer.code).store(sqlstate, message);
   } else if constexpr ((r.properties & cat::kHandlesNull) != 0) {
     static_assert(m == 1);
-    callLogic<R, Logic>(a, resultView<R, 0>(std::get<n>(a)),
-                        ResultIndicator{std::get<2 * n + 1>(a)})
+    callLogic<R, Logic>(a, resultView<R, 0>(std::get<at.result(0)>(a)),
+                        ResultIndicator{std::get<at.resultIndicator(0)>(a)})
         .store(sqlstate, message);
   } else {
     static_assert(m == 1);
-    const Report report = callLogic<R, Logic>(a, resultView<R, 0>(std::get<n>(a)));
+    const Report report = callLogic<R, Logic>(a, resultView<R, 0>(std::get<at.result(0)>(a)));
     if (report.failed()) report.store(sqlstate, message);
   }
 }

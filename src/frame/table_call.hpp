@@ -29,8 +29,9 @@ class TableCall {
       : row_(row),
         fn_(fn),
         unset_(unset),
-        inputs_(cat::inputCount(row)),
-        results_(cat::resultCount(row)) {
+        at_(cat::positionsOf(row)),
+        inputs_(at_.inputs),
+        results_(at_.results) {
     std::array<void *, cat::kMaxResults> areas{};
     std::array<std::int16_t *, cat::kMaxInputs> inputIndicators{};
     std::array<std::int16_t *, cat::kMaxResults> resultIndicators{};
@@ -52,11 +53,10 @@ class TableCall {
   TableCall(const TableCall &) = delete;
   TableCall &operator=(const TableCall &) = delete;
 
-  // Input i, the caller's value, read on every call; input i is the frame's
-  // argument i.
+  // Input i, the caller's value, read on every call.
   void setInput(std::size_t i, void *value, std::int16_t indicator = 0) noexcept {
     inputValues_[i] = value;
-    args_[i] = value;
+    args_[at_.input(i)] = value;
     inputIndicators_[i] = indicator;
   }
 
@@ -136,6 +136,7 @@ class TableCall {
   const cat::Routine &row_;
   void *fn_;
   std::int16_t unset_;
+  frame::Positions at_;           // where the frame's arguments stand
   std::size_t inputs_, results_;  // the row's counts
   std::int32_t callType_ = CLI_CALL_OPEN;
   std::array<unsigned char, kScratchpadSize> scratchpad_{};
