@@ -26,6 +26,7 @@ using cli::catalogue::kRoutines;
 using cli::catalogue::Layout;
 using cli::catalogue::Routine;
 using cli::catalogue::Slot;
+using cli::frame::Positions;
 
 bool isNumber(Layout l) {
   return l == Layout::int16 || l == Layout::int32 || l == Layout::int64 || l == Layout::real;
@@ -101,34 +102,38 @@ std::string resultPointer(const Slot &s) {
   }
 }
 
-// The extras, in their frame order: the export's parameter and the view
-// that the routine's logic takes in its place.
+// The extras, in their frame order: where the export's parameter stands,
+// the parameter, and the view that the routine's logic takes in its place.
 struct Extra {
-  unsigned bit;
+  std::size_t Positions::*at;
   const char *argument;
   const char *view;
 };
 constexpr Extra kExtras[] = {
-    {cli::catalogue::kDbinfo, "const unsigned char *dbinfo", "DbInfo dbinfo"},
-    {cli::catalogue::kScratchpad, "unsigned char *scratchpad", "Scratchpad scratchpad"},
-    {cli::catalogue::kCallType, "const int32_t *call_type", "CallType call_type"},
-    {cli::catalogue::kCallback, "CLI_tableCallback callback", "CLI_tableCallback callback"},
+    {&Positions::dbinfo, "const unsigned char *dbinfo", "DbInfo dbinfo"},
+    {&Positions::scratchpad, "unsigned char *scratchpad", "Scratchpad scratchpad"},
+    {&Positions::callType, "const int32_t *call_type", "CallType call_type"},
+    {&Positions::callback, "CLI_tableCallback callback", "CLI_tableCallback callback"},
 };
 
-// The export's parameters, in the frame's order.
+// The export's parameters, each at its position in the frame.
 std::vector<std::string> parameters(const Routine &r) {
-  std::vector<std::string> p;
-  const std::size_t n = inputCount(r), m = resultCount(r);
-  for (std::size_t i = 0; i < n; ++i) p.push_back(inputPointer(r.inputs[i]) + inputName(r, i));
-  for (std::size_t i = 0; i < m; ++i) p.push_back(resultPointer(r.results[i]) + resultName(r, i));
-  for (std::size_t i = 0; i < n; ++i) p.push_back("const int16_t *" + inputName(r, i) + "_null");
-  for (std::size_t i = 0; i < m; ++i) p.push_back("int16_t *" + resultName(r, i) + "_null");
-  p.emplace_back("char *sqlstate");
-  p.emplace_back("const char *function_name");
-  p.emplace_back("const char *specific_name");
-  p.emplace_back("char *message");
+  const Positions at = positionsOf(r);
+  std::vector<std::string> p(at.count);
+  for (std::size_t i = 0; i < at.inputs; ++i) {
+    p[at.input(i)] = inputPointer(r.inputs[i]) + inputName(r, i);
+    p[at.inputIndicator(i)] = "const int16_t *" + inputName(r, i) + "_null";
+  }
+  for (std::size_t j = 0; j < at.results; ++j) {
+    p[at.result(j)] = resultPointer(r.results[j]) + resultName(r, j);
+    p[at.resultIndicator(j)] = "int16_t *" + resultName(r, j) + "_null";
+  }
+  p[at.sqlstate] = "char *sqlstate";
+  p[at.functionName] = "const char *function_name";
+  p[at.specificName] = "const char *specific_name";
+  p[at.message] = "char *message";
   for (const Extra &e : kExtras) {
-    if ((cli::catalogue::extrasOf(r.frame) & e.bit) != 0) p.emplace_back(e.argument);
+    if (cli::frame::present(at.*e.at)) p[at.*e.at] = e.argument;
   }
   return p;
 }
@@ -182,7 +187,7 @@ std::string logicDeclaration(const Routine &r) {
     if (handlesNull(r)) p.emplace_back("ResultIndicator result_null");
   }
   for (const Extra &e : kExtras) {
-    if ((cli::catalogue::extrasOf(r.frame) & e.bit) != 0) p.emplace_back(e.view);
+    if (cli::frame::present(positionsOf(r).*e.at)) p.emplace_back(e.view);
   }
   return "// " + std::string(r.summary) + "\n" + returned + " " + logicName(r) + "(" +
          joined(p, ", ") + ") noexcept;\n";
