@@ -5,7 +5,8 @@
 // them into the views of frame.hpp by the row's layouts, calls the
 // routine's logic with them and stores what the logic gives back.  So the
 // compiler checks every routine against its row: a logic function whose
-// parameters don't take the views that the row implies does not compile.
+// type is not exactly the one that the row implies does not compile, even
+// where its values would convert (tests/compile_fail holds such cases).
 //
 // The logic of a routine takes, in this order:
 //   its inputs: a number by value, TextIn (WritableTextIn for a routine
@@ -17,13 +18,14 @@
 //     ResultIndicator for a routine that handles NULL; a table's Row;
 //   the extras of its frame: DbInfo; Scratchpad; Scratchpad, CallType;
 //     Scratchpad, CallType, CLI_tableCallback.
-// and gives back an Answer or a Report.
+// and gives back an Answer of its result's type or a Report; it is noexcept.
 #pragma once
 
 #include <array>
 #include <cstddef>
 #include <cstdint>
 #include <tuple>
+#include <type_traits>
 #include <utility>
 
 #include "catalogue/catalogue.hpp"
@@ -109,12 +111,38 @@ decltype(auto) withExtras(const Arguments &a, F f) noexcept {
   }
 }
 
+// The number type of a numeric layout.
+template <cat::Layout L>
+using NumberOf = std::conditional_t<
+    L == cat::Layout::int16, std::int16_t,
+    std::conditional_t<L == cat::Layout::int32, std::int32_t,
+                       std::conditional_t<L == cat::Layout::int64, std::int64_t, double>>>;
+
+// What the logic of row R gives back: its one numeric result in an Answer
+// of that result's type, unless a service writes it at its address; a
+// Report for everything else.
+template <std::size_t R>
+using Returned =
+    std::conditional_t<cat::kRoutines[R].frame != cat::Frame::table &&
+                           cat::kRoutines[R].frame != cat::Frame::tableCallback &&
+                           (cat::kRoutines[R].properties & cat::kResultByAddress) == 0 &&
+                           isNumber(cat::kRoutines[R].results[0].layout),
+                       Answer<NumberOf<cat::kRoutines[R].results[0].layout>>, Report>;
+
 // Calls the logic with the inputs of row R, then `between` (the result's
-// views), then the extras.
+// views), then the extras.  The logic's type must be exactly the one that
+// these imply: a call would otherwise compile wherever the values convert,
+// a double taken for a 32-bit input or a 16-bit Answer stored into a
+// 32-bit result.
 template <std::size_t R, auto Logic, class Arguments, class... Between>
 decltype(auto) callLogic(const Arguments &a, Between... between) noexcept {
-  return withExtras<R>(a, [&](auto... extras) {
+  return withExtras<R>(a, [&]<class... Extras>(Extras... extras) {
     return [&]<std::size_t... I>(std::index_sequence<I...>) {
+      using Exact =
+          Returned<R> (*)(decltype(inputArgument<R, I>(a))..., Between..., Extras...) noexcept;
+      static_assert(std::is_same_v<decltype(Logic), Exact>,
+                    "the logic takes the views that its row implies and gives back its Answer "
+                    "or Report, noexcept");
       return Logic(inputArgument<R, I>(a)..., between..., extras...);
     }
     (std::make_index_sequence<inputCount(cat::kRoutines[R])>{});
