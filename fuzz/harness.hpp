@@ -301,8 +301,7 @@ class Call {
               m.substr(0, 7) == "SYSFUN:" && m[9] == '\0' && allAre(&m[10], m.size() - 10, 'M'));
     const cli::Sysfun sysfun = cli::call::sysfunIn(sqlstate_.chars(), message_.chars());
     ORV_CHECK(name_, sysfun != cli::Sysfun::none && m.substr(7, 2) == cli::textOf(sysfun).digits);
-    ORV_CHECK(name_, std::string_view(export_.routine->sysfunCodes).find(m.substr(7, 2)) !=
-                         std::string_view::npos);
+    ORV_CHECK(name_, export_.routine->raises.contains(sysfun));
     return std::string(m.substr(7, 2));
   }
 

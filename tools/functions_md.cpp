@@ -37,7 +37,7 @@ std::string results(const Routine &r) {
   return out;
 }
 
-std::string codes(const Routine &r) { return *r.sysfunCodes != '\0' ? r.sysfunCodes : "none"; }
+std::string codes(const Routine &r) { return r.raises.empty() ? "none" : r.raises.digits(); }
 
 constexpr const char *kIntroduction = R"(# Function reference
 

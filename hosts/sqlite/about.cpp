@@ -6,7 +6,6 @@ SQLITE_EXTENSION_INIT3
 
 #include <algorithm>
 #include <cstddef>
-#include <set>
 #include <string>
 #include <vector>
 
@@ -28,16 +27,12 @@ Entry entryOf(const Group &g, bool plain) {
   e.name = g.sysfunName;
   if (plain) e.plainName = g.plainName;
   e.argumentCount = g.argumentCount;
-  std::set<std::string> codes;
+  cli::catalogue::SysfunSet codes;
   for (std::size_t row : g.rows) {
     const Routine &r = kRoutines[row];
     e.exports += (e.exports.empty() ? "" : ", ") + std::string(r.symbol);
     e.deterministic = e.deterministic && (r.properties & cli::catalogue::kDeterministic) != 0;
-    std::string_view list = r.sysfunCodes;
-    while (list.size() >= 2) {
-      codes.insert(std::string(list.substr(0, 2)));
-      list.remove_prefix(std::min<std::size_t>(3, list.size()));
-    }
+    codes |= r.raises;
   }
   // The summary of the export that the name prefers: one that reads its
   // whole text.
@@ -56,7 +51,7 @@ Entry entryOf(const Group &g, bool plain) {
     e.arguments +=
         (i == 0 ? "" : ", ") + std::string(kRoutines[g.rows[0]].inputs[i].name) + ": " + joined;
   }
-  for (const std::string &c : codes) e.codes += (e.codes.empty() ? "" : " ") + c;
+  e.codes = codes.digits();
   return e;
 }
 

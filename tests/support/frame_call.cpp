@@ -169,7 +169,7 @@ Outcome callFrame(const char *name, const std::vector<Value> &inputs, const Valu
     EXPECT_EQ(std::string(sqlstate, 6), std::string("38552\0", 6)) << name;
     EXPECT_TRUE(code.starts_with("SYSFUN:") && std::isdigit(static_cast<unsigned char>(code[7])) &&
                 std::isdigit(static_cast<unsigned char>(code[8])) && code[9] == '\0' &&
-                std::string_view(row->sysfunCodes).find(code.substr(7, 2)) != std::string::npos)
+                row->raises.contains(cli::sysfunOf(&code[7])))
         << name << ": message " << ::testing::PrintToString(code);
     EXPECT_TRUE(allAre(message + 10, message + kMessageBytes, 'M'))
         << name << " wrote past the message";
