@@ -2,13 +2,14 @@
 //
 // A row (routine.hpp) names the export and gives its SQL name, frame
 // variant, the layouts of its inputs and results, its properties, the
-// SYSFUN codes it can raise and a one-line summary.  Everything that names
-// an export is made from this table: the exports themselves and the
-// declarations of their logic (written by orv_generate, see generate.cpp),
-// the linker's export lists, the public header, the hosts' registrations,
-// the function reference in docs/functions.md and the test that the
-// library exports exactly what the table says.  Adding a routine is one
-// row in the rows file of its family and one logic function with the
+// SYSFUN codes it can raise, a one-line summary and an example.
+// Everything that names an export is made from this table: the exports
+// themselves and the declarations of their logic (written by orv_generate,
+// see generate.cpp), the linker's export lists, the public header, the
+// hosts' registrations, the function reference in docs/functions.md, the
+// test that the library exports exactly what the table says and the test
+// that runs each example through both hosts.  Adding a routine is one row
+// in the rows file of its family and one logic function with the
 // signature that the row declares.
 #pragma once
 
@@ -43,6 +44,13 @@ inline constexpr auto kRoutines =
     joined(kDatetimeRows, kNumericRows, kMathsRows, kStringRows, kEngineRows);
 
 inline constexpr std::size_t kRoutineCount = kRoutines.size();
+
+// Every routine but a table function shows a call and its result.
+constexpr bool hasExampleAsItShould(const Routine &r) {
+  const bool table = r.frame == Frame::table || r.frame == Frame::tableCallback;
+  return table == (r.example.call == nullptr) && table == (r.example.result == nullptr);
+}
+static_assert(std::ranges::all_of(kRoutines, hasExampleAsItShould));
 
 // The data export, which is no routine and has no row.
 inline constexpr const char *kDataExport = "sqlzThisIsAORVLibrary";

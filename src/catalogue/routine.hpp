@@ -1,6 +1,6 @@
 // What a row of the catalogue says of one export: its names, frame, the
-// layouts of its values, its properties, the SYSFUN codes it can raise and
-// a summary; and the makers that the rows are written with.
+// layouts of its values, its properties, the SYSFUN codes it can raise, a
+// summary and an example; and the makers that the rows are written with.
 #pragma once
 
 #include <cstddef>
@@ -108,6 +108,20 @@ class SysfunSet {
   std::uint32_t bits_ = 0;
 };
 
+// A call of the routine as a user writes it in SQL, and what it gives.
+//
+// `call` is the SQL name with the arguments as SQL literals: numbers,
+// 'text' and x'0A1B' for bytes.  `result` is the result as such a literal,
+// or, for a result that changes from call to call, a condition on it:
+// "LIKE 'pattern'" (where _ stands for any one character) or
+// "BETWEEN low AND high".  A double agrees with the literal to 12 digits.
+// Every example is called through both hosts by its export's own name
+// (tools/examples_sql.cpp writes the scripts).
+struct Example {
+  const char *call = nullptr;  // null: none, for a table function
+  const char *result = nullptr;
+};
+
 inline constexpr std::size_t kMaxInputs = 4;
 inline constexpr std::size_t kMaxResults = 18;
 
@@ -120,6 +134,7 @@ struct Routine {
   unsigned properties = 0;
   SysfunSet raises = {};
   const char *summary = "";
+  Example example = {};
 };
 
 // Slot makers.  Inputs carry a name for the reference; results a size.

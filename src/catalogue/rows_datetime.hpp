@@ -17,6 +17,7 @@ inline constexpr Routine kDatetimeRows[] = {
         .raises = {Sysfun::badDate},
         .summary = "Julian day number of the date at the head of the text; what stands behind the "
                    "date is not read.",
+        .example = {"JULIAN_DAY('2001-09-27')", "2452180"},
     },
     {
         .symbol = "CLI_udfJULIAN_DAY2",
@@ -26,6 +27,7 @@ inline constexpr Routine kDatetimeRows[] = {
         .properties = kPure | kWritesInputs,
         .raises = {Sysfun::badDate, Sysfun::badTimestamp},
         .summary = "Julian day number of a date or timestamp, validated to its end.",
+        .example = {"JULIAN_DAY('2000-01-01-23.59.59.999999')", "2451545"},
     },
     {
         .symbol = "CLI_udfMIDNIGHT_SECONDS1",
@@ -35,6 +37,7 @@ inline constexpr Routine kDatetimeRows[] = {
         .properties = kPure | kNarrowerForm | kWritesInputs,
         .raises = {Sysfun::badTime},
         .summary = "Seconds since midnight of a time.",
+        .example = {"MIDNIGHT_SECONDS('12.30')", "45000"},
     },
     {
         .symbol = "CLI_udfMIDNIGHT_SECONDS2",
@@ -44,6 +47,7 @@ inline constexpr Routine kDatetimeRows[] = {
         .properties = kPure | kWritesInputs,
         .raises = {Sysfun::badDate, Sysfun::badTime, Sysfun::badTimestamp},
         .summary = "Seconds since midnight of a time, or of the time of day of a timestamp.",
+        .example = {"MIDNIGHT_SECONDS('2001-01-05-13.30.15')", "48615"},
     },
     // Timestamps
     {
@@ -54,6 +58,7 @@ inline constexpr Routine kDatetimeRows[] = {
         .properties = kInnocuous | kWritesInputs,
         .raises = {Sysfun::badDate, Sysfun::badTime, Sysfun::badTimestamp},
         .summary = "Timestamp text from a date, a time (on today's UTC date) or a timestamp.",
+        .example = {"TIMESTAMP('2001-01-05')", "'2001-01-05-00.00.00.000000'"},
     },
     {
         .symbol = "CLI_udfTIMESTAMPDATE",
@@ -63,6 +68,7 @@ inline constexpr Routine kDatetimeRows[] = {
         .properties = kPure | kWritesInputs,
         .raises = {Sysfun::badDate},
         .summary = "Timestamp text of a date at midnight.",
+        .example = {"TIMESTAMPDATE('2001-1-5')", "'2001-1-5-00.00.00.000000'"},
     },
     {
         .symbol = "CLI_udfTIMESTAMPTIME",
@@ -72,6 +78,7 @@ inline constexpr Routine kDatetimeRows[] = {
         .properties = kInnocuous | kWritesInputs,
         .raises = {Sysfun::badTime},
         .summary = "Timestamp text of a time on today's UTC date.",
+        .example = {"TIMESTAMPTIME('13.30.15')", "LIKE '____-__-__-13.30.15.000000'"},
     },
     // Timestamp durations
     {
@@ -82,6 +89,7 @@ inline constexpr Routine kDatetimeRows[] = {
         .properties = kPure,
         .raises = {Sysfun::overflow, Sysfun::badDuration, Sysfun::badInterval, Sysfun::tooLong},
         .summary = "A timestamp duration as a number of the unit that the interval code names.",
+        .example = {"TIMESTAMPDIFF(32, '200000000')", "8"},
     },
     // Weeks
     {
@@ -93,6 +101,7 @@ inline constexpr Routine kDatetimeRows[] = {
         .raises = {Sysfun::badDate},
         .summary =
             "Week of the year, weeks starting on Sunday, of the date at the head of the text.",
+        .example = {"WEEK('2005-01-02')", "2"},
     },
     {
         .symbol = "CLI_udfWEEK2",
@@ -102,6 +111,7 @@ inline constexpr Routine kDatetimeRows[] = {
         .properties = kPure | kWritesInputs,
         .raises = {Sysfun::badDate, Sysfun::badTimestamp},
         .summary = "Week of the year, weeks starting on Sunday, of a date or timestamp.",
+        .example = {"WEEK('2000-12-31-12.00.00')", "54"},
     },
     {
         .symbol = "CLI_udfWEEK_ISO1",
@@ -111,6 +121,7 @@ inline constexpr Routine kDatetimeRows[] = {
         .properties = kPure | kNarrowerForm | kWritesInputs,
         .raises = {Sysfun::badDate},
         .summary = "ISO 8601 week number of the date at the head of the text.",
+        .example = {"WEEK_ISO('2005-01-01')", "53"},
     },
     {
         .symbol = "CLI_udfWEEK_ISO2",
@@ -120,6 +131,7 @@ inline constexpr Routine kDatetimeRows[] = {
         .properties = kPure | kWritesInputs,
         .raises = {Sysfun::badDate, Sysfun::badTimestamp},
         .summary = "ISO 8601 week number of a date or timestamp.",
+        .example = {"WEEK_ISO('2008-12-29')", "1"},
     },
     // Numbers in a date
     {
@@ -130,6 +142,7 @@ inline constexpr Routine kDatetimeRows[] = {
         .properties = kPure | kNarrowerForm | kWritesInputs,
         .raises = {Sysfun::badDate},
         .summary = "Quarter of the year of the date at the head of the text.",
+        .example = {"QUARTER('2026-11-24')", "4"},
     },
     {
         .symbol = "CLI_udfQUARTER2",
@@ -139,6 +152,7 @@ inline constexpr Routine kDatetimeRows[] = {
         .properties = kPure | kWritesInputs,
         .raises = {Sysfun::badDate, Sysfun::badTimestamp},
         .summary = "Quarter of the year of a date or timestamp.",
+        .example = {"QUARTER('2001-03-31-23.59.59')", "1"},
     },
     {
         .symbol = "CLI_udfDAYOFYEAR1",
@@ -148,6 +162,7 @@ inline constexpr Routine kDatetimeRows[] = {
         .properties = kPure | kNarrowerForm | kWritesInputs,
         .raises = {Sysfun::badDate},
         .summary = "Ordinal day in the year of the date at the head of the text.",
+        .example = {"DAYOFYEAR('2000-03-01')", "61"},
     },
     {
         .symbol = "CLI_udfDAYOFYEAR2",
@@ -157,6 +172,7 @@ inline constexpr Routine kDatetimeRows[] = {
         .properties = kPure | kWritesInputs,
         .raises = {Sysfun::badDate, Sysfun::badTimestamp},
         .summary = "Ordinal day in the year of a date or timestamp.",
+        .example = {"DAYOFYEAR('2024-12-31')", "366"},
     },
     {
         .symbol = "CLI_udfDAYOFWEEK1",
@@ -166,6 +182,7 @@ inline constexpr Routine kDatetimeRows[] = {
         .properties = kPure | kWritesInputs,
         .raises = {Sysfun::badDate, Sysfun::badTimestamp},
         .summary = "Day of the week, Sunday = 1, of a date or timestamp.",
+        .example = {"DAYOFWEEK('2026-11-24-13.30.15')", "3"},
     },
     {
         .symbol = "CLI_udfDAYOFWEEK2",
@@ -175,6 +192,7 @@ inline constexpr Routine kDatetimeRows[] = {
         .properties = kPure | kNarrowerForm | kWritesInputs,
         .raises = {Sysfun::badDate},
         .summary = "Day of the week, Sunday = 1, of the date at the head of the text.",
+        .example = {"DAYOFWEEK('2000-01-01')", "7"},
     },
     {
         .symbol = "CLI_udfDAYOFWEEK_ISO1",
@@ -184,6 +202,7 @@ inline constexpr Routine kDatetimeRows[] = {
         .properties = kPure | kWritesInputs,
         .raises = {Sysfun::badDate, Sysfun::badTimestamp},
         .summary = "Day of the week, Monday = 1, of a date or timestamp.",
+        .example = {"DAYOFWEEK_ISO('2000-12-31')", "7"},
     },
     {
         .symbol = "CLI_udfDAYOFWEEK_ISO2",
@@ -193,6 +212,7 @@ inline constexpr Routine kDatetimeRows[] = {
         .properties = kPure | kNarrowerForm | kWritesInputs,
         .raises = {Sysfun::badDate},
         .summary = "Day of the week, Monday = 1, of the date at the head of the text.",
+        .example = {"DAYOFWEEK_ISO('2026-11-24')", "2"},
     },
     // Names in a date
     {
@@ -204,6 +224,7 @@ inline constexpr Routine kDatetimeRows[] = {
         .properties = kInnocuous | kWritesInputs,
         .raises = {Sysfun::overflow, Sysfun::badDate, Sysfun::badTimestamp},
         .summary = "Name of the day of the week of a date or timestamp, in the server's language.",
+        .example = {"DAYNAME('2026-11-24')", "'Tuesday'"},
     },
     {
         .symbol = "CLI_udfDAYNAME2",
@@ -214,6 +235,7 @@ inline constexpr Routine kDatetimeRows[] = {
         .properties = kInnocuous | kNarrowerForm | kWritesInputs,
         .raises = {Sysfun::overflow, Sysfun::badDate},
         .summary = "Name of the day of the week of the date at the head of the text.",
+        .example = {"DAYNAME('2001-01-01')", "'Monday'"},
     },
     {
         .symbol = "CLI_udfMONTHNAME1",
@@ -225,6 +247,7 @@ inline constexpr Routine kDatetimeRows[] = {
         .raises = {Sysfun::overflow, Sysfun::badDate},
         .summary =
             "Name of the month of the date at the head of the text, in the server's language.",
+        .example = {"MONTHNAME('2026-02-01')", "'February'"},
     },
     {
         .symbol = "CLI_udfMONTHNAME2",
@@ -235,6 +258,7 @@ inline constexpr Routine kDatetimeRows[] = {
         .properties = kInnocuous | kWritesInputs,
         .raises = {Sysfun::overflow, Sysfun::badDate, Sysfun::badTimestamp},
         .summary = "Name of the month of a date or timestamp.",
+        .example = {"MONTHNAME('2000-12-31-23.59.59')", "'December'"},
     },
 };
 

@@ -8,7 +8,8 @@
 namespace cli::catalogue {
 
 inline constexpr Routine kEngineRows[] = {
-    // Table functions
+    // Table functions.  Their rows are the engine's data, so they have no
+    // example with a result that a test could hold them to.
     {
         .symbol = "CLI_udfFmpThreads",
         .sqlName = "FmpThreads",
@@ -43,6 +44,9 @@ inline constexpr Routine kEngineRows[] = {
         .results = {lobOf(1000000)},
         .properties = kPure | kHandlesNull,
         .summary = "A record-chain object copied into another code page, up to 1000000 bytes.",
+        .example = {"VEBLOB_CP_LARGE(x'000000000000000000000000000000000000000000004B02C3A9', "
+                    "1208, 819, 0)",
+                    "x'000000000000000000000000000000000000000000004B01E9'"},
     },
     {
         .symbol = "CLI_udfVEBLOB_CP_SMALL",
@@ -52,6 +56,9 @@ inline constexpr Routine kEngineRows[] = {
         .results = {lobOf(500000)},
         .properties = kPure | kHandlesNull,
         .summary = "A record-chain object copied into another code page, up to 500000 bytes.",
+        .example = {"VEBLOB_CP_SMALL(x'000000000000000000000000000000000000000000008B00024142', "
+                    "1208, 819, -1)",
+                    "x'000000000000000000000000000000000000000000008B00024142'"},
     },
     // Collation
     {
@@ -61,6 +68,7 @@ inline constexpr Routine kEngineRows[] = {
         .results = {textOf(128)},
         .properties = kPure | kHandlesNull,
         .summary = "Name of a collation identifier; INVALID for NULL or an unknown one.",
+        .example = {"COLLATIONNAME(x'0000000000000000')", "'IDENTITY'"},
     },
 };
 

@@ -16,6 +16,7 @@ inline constexpr Routine kMathsRows[] = {
         .results = {real()},
         .properties = kPure,
         .summary = "Sine of x radians.",
+        .example = {"SIN(0.5)", "0.479425538604203"},
     },
     {
         .symbol = "CLI_udfCOS",
@@ -24,6 +25,7 @@ inline constexpr Routine kMathsRows[] = {
         .results = {real()},
         .properties = kPure,
         .summary = "Cosine of x radians.",
+        .example = {"COS(1)", "0.5403023058681397"},
     },
     {
         .symbol = "CLI_udfTAN",
@@ -33,6 +35,7 @@ inline constexpr Routine kMathsRows[] = {
         .properties = kPure,
         .raises = {Sysfun::outOfRange},
         .summary = "Tangent of x radians.",
+        .example = {"TAN(0.7853981633974483)", "1"},
     },
     {
         .symbol = "CLI_udfCOT",
@@ -42,6 +45,7 @@ inline constexpr Routine kMathsRows[] = {
         .properties = kPure,
         .raises = {Sysfun::divisionByZero},
         .summary = "Cotangent of x radians.",
+        .example = {"COT(1)", "0.6420926159343307"},
     },
     {
         .symbol = "CLI_udfASIN",
@@ -51,6 +55,7 @@ inline constexpr Routine kMathsRows[] = {
         .properties = kPure,
         .raises = {Sysfun::outOfRange},
         .summary = "Arc sine in radians.",
+        .example = {"ASIN(1)", "1.5707963267948966"},
     },
     {
         .symbol = "CLI_udfACOS",
@@ -60,6 +65,7 @@ inline constexpr Routine kMathsRows[] = {
         .properties = kPure,
         .raises = {Sysfun::outOfRange},
         .summary = "Arc cosine in radians.",
+        .example = {"ACOS(0.5)", "1.0471975511965977"},
     },
     {
         .symbol = "CLI_udfATAN",
@@ -68,6 +74,7 @@ inline constexpr Routine kMathsRows[] = {
         .results = {real()},
         .properties = kPure,
         .summary = "Arc tangent in radians.",
+        .example = {"ATAN(1)", "0.7853981633974483"},
     },
     {
         .symbol = "CLI_udfATAN2",
@@ -77,6 +84,7 @@ inline constexpr Routine kMathsRows[] = {
         .properties = kPure,
         .raises = {Sysfun::divisionByZero},
         .summary = "Arc tangent of a / b in radians, by quadrant.",
+        .example = {"ATAN2(0.0, 1.0)", "1.5707963267948966"},
     },
     {
         .symbol = "CLI_udfLOG",
@@ -86,6 +94,7 @@ inline constexpr Routine kMathsRows[] = {
         .properties = kPure,
         .raises = {Sysfun::outOfRange},
         .summary = "Natural logarithm.",
+        .example = {"LOG(2.718281828459045)", "1"},
     },
     {
         .symbol = "CLI_udfLOG10",
@@ -95,6 +104,7 @@ inline constexpr Routine kMathsRows[] = {
         .properties = kPure,
         .raises = {Sysfun::outOfRange},
         .summary = "Logarithm to base 10.",
+        .example = {"LOG10(1000)", "3"},
     },
     {
         .symbol = "CLI_udfEXP",
@@ -104,6 +114,7 @@ inline constexpr Routine kMathsRows[] = {
         .properties = kPure,
         .raises = {Sysfun::overflow},
         .summary = "e to the power x.",
+        .example = {"EXP(1)", "2.718281828459045"},
     },
     {
         .symbol = "CLI_udfSQRT",
@@ -113,6 +124,7 @@ inline constexpr Routine kMathsRows[] = {
         .properties = kPure,
         .raises = {Sysfun::outOfRange},
         .summary = "Square root.",
+        .example = {"SQRT(2.25)", "1.5"},
     },
     {
         .symbol = "CLI_udfDEGREES1",
@@ -121,6 +133,7 @@ inline constexpr Routine kMathsRows[] = {
         .results = {real()},
         .properties = kPure,
         .summary = "Radians in degrees.",
+        .example = {"DEGREES(3.141592653589793)", "180"},
     },
     {
         .symbol = "CLI_udfRADIANS1",
@@ -129,6 +142,7 @@ inline constexpr Routine kMathsRows[] = {
         .results = {real()},
         .properties = kPure,
         .summary = "Degrees in radians.",
+        .example = {"RADIANS(180)", "3.141592653589793"},
     },
     // Random
     {
@@ -137,6 +151,7 @@ inline constexpr Routine kMathsRows[] = {
         .results = {real()},
         .properties = kInnocuous | kSharedState,
         .summary = "A pseudo-random double from 0.0 to 1.0.",
+        .example = {"RAND()", "BETWEEN 0 AND 1"},
     },
     {
         .symbol = "CLI_udfRAND2",
@@ -147,6 +162,7 @@ inline constexpr Routine kMathsRows[] = {
         .properties = kInnocuous | kSharedState,
         .summary = "A pseudo-random double from 0.0 to 1.0; the first call of a statement seeds "
                    "the generator.",
+        .example = {"RAND(7)", "BETWEEN 0 AND 1"},
     },
     // Number text
     {
@@ -157,6 +173,7 @@ inline constexpr Routine kMathsRows[] = {
         .properties = kPure | kResultByAddress | kWritesInputs,
         .raises = {Sysfun::notANumber},
         .summary = "The number that a text spells, as a double.",
+        .example = {"CHARTODOUBLE('1.5e3')", "1500"},
     },
     {
         .symbol = "CLI_udfDOUBLETOCHAR",
@@ -165,6 +182,7 @@ inline constexpr Routine kMathsRows[] = {
         .results = {fixedText(24)},
         .properties = kPure,
         .summary = "A double in short scientific notation, 24 bytes filled up with blanks.",
+        .example = {"DOUBLETOCHAR(-1234.5)", "'-1.2345E3               '"},
     },
 };
 

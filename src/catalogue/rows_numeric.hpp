@@ -16,6 +16,7 @@ inline constexpr Routine kNumericRows[] = {
         .results = {real()},
         .properties = kPure,
         .summary = "Absolute value of a double: its sign bit cleared.",
+        .example = {"ABS(-2.5)", "2.5"},
     },
     {
         .symbol = "CLI_udfABS2",
@@ -25,6 +26,7 @@ inline constexpr Routine kNumericRows[] = {
         .properties = kPure,
         .raises = {Sysfun::outOfRange},
         .summary = "Absolute value of a 32-bit integer.",
+        .example = {"ABS(-7)", "7"},
     },
     {
         .symbol = "CLI_udfABS3",
@@ -34,6 +36,7 @@ inline constexpr Routine kNumericRows[] = {
         .properties = kPure,
         .raises = {Sysfun::outOfRange},
         .summary = "Absolute value of a 16-bit integer.",
+        .example = {"ABS(-32767)", "32767"},
     },
     {
         .symbol = "CLI_udfABS4",
@@ -43,6 +46,7 @@ inline constexpr Routine kNumericRows[] = {
         .properties = kPure,
         .raises = {Sysfun::outOfRange},
         .summary = "Absolute value of a 64-bit integer.",
+        .example = {"ABS(-9223372036854775807)", "9223372036854775807"},
     },
     {
         .symbol = "CLI_udfSIGN1",
@@ -51,6 +55,7 @@ inline constexpr Routine kNumericRows[] = {
         .results = {real()},
         .properties = kPure,
         .summary = "Sign of a double: -1.0, 0.0 or 1.0.",
+        .example = {"SIGN(-2.5)", "-1"},
     },
     {
         .symbol = "CLI_udfSIGN2",
@@ -59,6 +64,7 @@ inline constexpr Routine kNumericRows[] = {
         .results = {int32()},
         .properties = kPure,
         .summary = "Sign of a 32-bit integer.",
+        .example = {"SIGN(7)", "1"},
     },
     {
         .symbol = "CLI_udfSIGN3",
@@ -67,6 +73,7 @@ inline constexpr Routine kNumericRows[] = {
         .results = {int16()},
         .properties = kPure,
         .summary = "Sign of a 16-bit integer.",
+        .example = {"SIGN(-32768)", "-1"},
     },
     {
         .symbol = "CLI_udfSIGN4",
@@ -75,6 +82,7 @@ inline constexpr Routine kNumericRows[] = {
         .results = {int64()},
         .properties = kPure,
         .summary = "Sign of a 64-bit integer.",
+        .example = {"SIGN(0)", "0"},
     },
     {
         .symbol = "CLI_udfMOD1",
@@ -84,6 +92,7 @@ inline constexpr Routine kNumericRows[] = {
         .properties = kPure,
         .raises = {Sysfun::divisionByZero},
         .summary = "Remainder of 32-bit integers, with the sign of the dividend.",
+        .example = {"MOD(-7, 3)", "-1"},
     },
     {
         .symbol = "CLI_udfMOD2",
@@ -93,6 +102,7 @@ inline constexpr Routine kNumericRows[] = {
         .properties = kPure,
         .raises = {Sysfun::overflow},
         .summary = "Remainder of 16-bit integers, with the sign of the dividend.",
+        .example = {"MOD(7, -3)", "1"},
     },
     {
         .symbol = "CLI_udfMOD3",
@@ -102,6 +112,7 @@ inline constexpr Routine kNumericRows[] = {
         .properties = kPure,
         .raises = {Sysfun::overflow},
         .summary = "Remainder of 64-bit integers, with the sign of the dividend.",
+        .example = {"MOD(-7, -3)", "-1"},
     },
     {
         .symbol = "CLI_udfCEILING1",
@@ -110,6 +121,7 @@ inline constexpr Routine kNumericRows[] = {
         .results = {real()},
         .properties = kPure,
         .summary = "Smallest whole double not below x.",
+        .example = {"CEILING(2.5)", "3"},
     },
     {
         .symbol = "CLI_udfCEILING2",
@@ -118,6 +130,7 @@ inline constexpr Routine kNumericRows[] = {
         .results = {int32()},
         .properties = kPure,
         .summary = "A 32-bit integer, unchanged.",
+        .example = {"CEILING(7)", "7"},
     },
     {
         .symbol = "CLI_udfCEILING3",
@@ -126,6 +139,7 @@ inline constexpr Routine kNumericRows[] = {
         .results = {int16()},
         .properties = kPure,
         .summary = "A 16-bit integer, unchanged.",
+        .example = {"CEILING(-32768)", "-32768"},
     },
     {
         .symbol = "CLI_udfCEILING4",
@@ -134,6 +148,7 @@ inline constexpr Routine kNumericRows[] = {
         .results = {int64()},
         .properties = kPure,
         .summary = "A 64-bit integer, unchanged.",
+        .example = {"CEILING(9007199254740993)", "9007199254740993"},
     },
     {
         .symbol = "CLI_udfFLOOR1",
@@ -142,6 +157,7 @@ inline constexpr Routine kNumericRows[] = {
         .results = {real()},
         .properties = kPure,
         .summary = "Largest whole double not above x.",
+        .example = {"FLOOR(-2.5)", "-3"},
     },
     {
         .symbol = "CLI_udfFLOOR2",
@@ -150,6 +166,7 @@ inline constexpr Routine kNumericRows[] = {
         .results = {int32()},
         .properties = kPure,
         .summary = "A 32-bit integer, unchanged.",
+        .example = {"FLOOR(2147483647)", "2147483647"},
     },
     {
         .symbol = "CLI_udfFLOOR3",
@@ -158,6 +175,7 @@ inline constexpr Routine kNumericRows[] = {
         .results = {int16()},
         .properties = kPure,
         .summary = "A 16-bit integer, unchanged.",
+        .example = {"FLOOR(-7)", "-7"},
     },
     {
         .symbol = "CLI_udfFLOOR4",
@@ -166,6 +184,7 @@ inline constexpr Routine kNumericRows[] = {
         .results = {int64()},
         .properties = kPure,
         .summary = "A 64-bit integer, unchanged.",
+        .example = {"FLOOR(-9007199254740993)", "-9007199254740993"},
     },
     // Cutting digits
     {
@@ -176,6 +195,7 @@ inline constexpr Routine kNumericRows[] = {
         .properties = kPure,
         .raises = {Sysfun::overflow},
         .summary = "A double rounded to n decimal places (n < 0: left of the point).",
+        .example = {"ROUND(1250.0, -2)", "1300"},
     },
     {
         .symbol = "CLI_udfROUND2",
@@ -185,6 +205,7 @@ inline constexpr Routine kNumericRows[] = {
         .properties = kPure,
         .raises = {Sysfun::overflow},
         .summary = "A 32-bit integer rounded to n decimal places.",
+        .example = {"ROUND(150, -2)", "200"},
     },
     {
         .symbol = "CLI_udfROUND5",
@@ -194,6 +215,7 @@ inline constexpr Routine kNumericRows[] = {
         .properties = kPure,
         .raises = {Sysfun::overflow},
         .summary = "A 64-bit integer rounded to n decimal places, without floating point.",
+        .example = {"ROUND(1450, -2)", "1500"},
     },
     {
         .symbol = "CLI_udfTRUNCATE1",
@@ -203,6 +225,7 @@ inline constexpr Routine kNumericRows[] = {
         .properties = kPure,
         .raises = {Sysfun::overflow},
         .summary = "A double cut to n decimal places.",
+        .example = {"TRUNCATE(1.29, 1)", "1.2"},
     },
     {
         .symbol = "CLI_udfTRUNCATE2",
@@ -212,6 +235,7 @@ inline constexpr Routine kNumericRows[] = {
         .properties = kPure,
         .raises = {Sysfun::overflow},
         .summary = "A 32-bit integer cut to n decimal places.",
+        .example = {"TRUNCATE(1299, -2)", "1200"},
     },
     {
         .symbol = "CLI_udfTRUNCATE5",
@@ -220,6 +244,7 @@ inline constexpr Routine kNumericRows[] = {
         .results = {int64()},
         .properties = kPure,
         .summary = "A 64-bit integer cut to n decimal places, without floating point.",
+        .example = {"TRUNCATE(-1299, -2)", "-1200"},
     },
     // Powers
     {
@@ -230,6 +255,7 @@ inline constexpr Routine kNumericRows[] = {
         .properties = kPure,
         .raises = {Sysfun::outOfRange, Sysfun::overflow},
         .summary = "x to the power y, in doubles.",
+        .example = {"POWER(4.0, 0.5)", "2"},
     },
     {
         .symbol = "CLI_udfPOWER2",
@@ -239,6 +265,7 @@ inline constexpr Routine kNumericRows[] = {
         .properties = kPure,
         .raises = {Sysfun::outOfRange, Sysfun::overflow},
         .summary = "A double to a whole power.",
+        .example = {"POWER(2.0, -2)", "0.25"},
     },
     {
         .symbol = "CLI_udfPOWER3",
@@ -248,6 +275,7 @@ inline constexpr Routine kNumericRows[] = {
         .properties = kPure,
         .raises = {Sysfun::outOfRange, Sysfun::overflow},
         .summary = "A 32-bit integer to a whole power, rounded to 32 bits.",
+        .example = {"POWER(2, 10)", "1024"},
     },
     {
         .symbol = "CLI_udfPOWER4",
@@ -257,6 +285,7 @@ inline constexpr Routine kNumericRows[] = {
         .properties = kPure,
         .raises = {Sysfun::outOfRange, Sysfun::overflow},
         .summary = "A 64-bit integer to a whole power, by exact multiplication.",
+        .example = {"POWER(3, 39)", "4052555153018976267"},
     },
 };
 

@@ -16,6 +16,7 @@ inline constexpr Routine kStringRows[] = {
         .properties = kPure,
         .raises = {Sysfun::outOfRange},
         .summary = "A text of count blanks, count from 0 to 4000.",
+        .example = {"SPACE(3)", "'   '"},
     },
     {
         .symbol = "CLI_udfLCASE1",
@@ -24,6 +25,7 @@ inline constexpr Routine kStringRows[] = {
         .results = {textOf(kText)},
         .properties = kPure,
         .summary = "The string with each byte lowered by the process's locale.",
+        .example = {"LCASE('ABC')", "'abc'"},
     },
     {
         .symbol = "CLI_udfLCASE2",
@@ -32,6 +34,7 @@ inline constexpr Routine kStringRows[] = {
         .results = {lobOf(kLob)},
         .properties = kPure,
         .summary = "The string with each byte lowered by the process's locale; NUL bytes are data.",
+        .example = {"LCASE('Hello World')", "'hello world'"},
     },
     {
         .symbol = "CLI_udfRTRIM1",
@@ -40,6 +43,7 @@ inline constexpr Routine kStringRows[] = {
         .results = {textOf(kText)},
         .properties = kPure,
         .summary = "The string without trailing blanks and tabs.",
+        .example = {"RTRIM('ab  ')", "'ab'"},
     },
     {
         .symbol = "CLI_udfRTRIM2",
@@ -48,6 +52,7 @@ inline constexpr Routine kStringRows[] = {
         .results = {lobOf(kLob)},
         .properties = kPure,
         .summary = "The string without trailing blanks and tabs.",
+        .example = {"RTRIM(' ab ')", "' ab'"},
     },
     {
         .symbol = "CLI_udfLTRIM1",
@@ -56,6 +61,7 @@ inline constexpr Routine kStringRows[] = {
         .results = {textOf(kText)},
         .properties = kPure,
         .summary = "The string without leading blanks and tabs.",
+        .example = {"LTRIM('  ab')", "'ab'"},
     },
     {
         .symbol = "CLI_udfLTRIM2",
@@ -64,6 +70,7 @@ inline constexpr Routine kStringRows[] = {
         .results = {lobOf(kLob)},
         .properties = kPure,
         .summary = "The string without leading blanks and tabs.",
+        .example = {"LTRIM(' ab ')", "'ab '"},
     },
     {
         .symbol = "CLI_udfLEFT1",
@@ -73,6 +80,7 @@ inline constexpr Routine kStringRows[] = {
         .properties = kPure,
         .raises = {Sysfun::outOfRange},
         .summary = "The first n bytes, filled up with blanks; n from 0 to 4000.",
+        .example = {"LEFT('abc', 5)", "'abc  '"},
     },
     {
         .symbol = "CLI_udfLEFT2",
@@ -82,6 +90,7 @@ inline constexpr Routine kStringRows[] = {
         .properties = kPure,
         .raises = {Sysfun::outOfRange},
         .summary = "The first n bytes, filled up with blanks; n from 0 to the capacity minus 1.",
+        .example = {"LEFT('abcdef', 3)", "'abc'"},
     },
     {
         .symbol = "CLI_udfRIGHT1",
@@ -91,6 +100,7 @@ inline constexpr Routine kStringRows[] = {
         .properties = kPure,
         .raises = {Sysfun::outOfRange},
         .summary = "The last n bytes, or the string followed by blanks up to n; n from 0 to 4000.",
+        .example = {"RIGHT('abc', 5)", "'abc  '"},
     },
     {
         .symbol = "CLI_udfRIGHT2",
@@ -101,6 +111,7 @@ inline constexpr Routine kStringRows[] = {
         .raises = {Sysfun::outOfRange},
         .summary =
             "The last n bytes, or the string followed by blanks up to n; n from 0 to the capacity.",
+        .example = {"RIGHT('abcdef', 2)", "'ef'"},
     },
     {
         .symbol = "CLI_udfREPEAT1",
@@ -110,6 +121,7 @@ inline constexpr Routine kStringRows[] = {
         .properties = kPure,
         .raises = {Sysfun::tooLong},
         .summary = "The string count times; the result at most 4000 bytes.",
+        .example = {"REPEAT('ab', 3)", "'ababab'"},
     },
     {
         .symbol = "CLI_udfREPEAT2",
@@ -119,6 +131,7 @@ inline constexpr Routine kStringRows[] = {
         .properties = kPure,
         .raises = {Sysfun::tooLong},
         .summary = "The string count times; the result at most 1048576 bytes.",
+        .example = {"REPEAT('xyz', 2)", "'xyzxyz'"},
     },
     {
         .symbol = "CLI_udfCHAR",
@@ -127,6 +140,7 @@ inline constexpr Routine kStringRows[] = {
         .results = {textOf(1)},
         .properties = kPure,
         .summary = "The byte of a code 1 to 255; 0 gives a blank, anything else 0xFF.",
+        .example = {"CHAR(65)", "'A'"},
     },
     {
         .symbol = "CLI_udfASCII1",
@@ -135,6 +149,7 @@ inline constexpr Routine kStringRows[] = {
         .results = {int32()},
         .properties = kPure,
         .summary = "The first byte as a number 0 to 255; 0 for empty text.",
+        .example = {"ASCII('A')", "65"},
     },
     {
         .symbol = "CLI_udfASCII2",
@@ -143,6 +158,7 @@ inline constexpr Routine kStringRows[] = {
         .results = {int32()},
         .properties = kPure,
         .summary = "The first byte as a number 0 to 255; 0 for empty text.",
+        .example = {"ASCII('abc')", "97"},
     },
     {
         .symbol = "CLI_udfASCII3",
@@ -151,6 +167,7 @@ inline constexpr Routine kStringRows[] = {
         .results = {int32()},
         .properties = kPure,
         .summary = "The first byte as a number 0 to 255; 0 for an empty string.",
+        .example = {"ASCII('B')", "66"},
     },
     // Searching
     {
@@ -161,6 +178,7 @@ inline constexpr Routine kStringRows[] = {
         .properties = kPure,
         .raises = {Sysfun::outOfRange},
         .summary = "Position of the first match at or after start, counted from 1; 0 for none.",
+        .example = {"LOCATE('b', 'abcb', 3)", "4"},
     },
     {
         .symbol = "CLI_udfLOCATE2",
@@ -170,6 +188,7 @@ inline constexpr Routine kStringRows[] = {
         .properties = kPure,
         .raises = {Sysfun::outOfRange},
         .summary = "Position of the first match at or after start, counted from 1; 0 for none.",
+        .example = {"LOCATE('cb', 'abcb', 1)", "3"},
     },
     {
         .symbol = "CLI_udfLOCATE3",
@@ -178,6 +197,7 @@ inline constexpr Routine kStringRows[] = {
         .results = {int32()},
         .properties = kPure,
         .summary = "Position of the first match, counted from 1; 0 for none.",
+        .example = {"LOCATE('b', 'abcb')", "2"},
     },
     {
         .symbol = "CLI_udfLOCATE4",
@@ -186,6 +206,7 @@ inline constexpr Routine kStringRows[] = {
         .results = {int32()},
         .properties = kPure,
         .summary = "Position of the first match, counted from 1; 0 for none.",
+        .example = {"LOCATE('aab', 'aaab')", "2"},
     },
     // Rebuilding
     {
@@ -196,6 +217,7 @@ inline constexpr Routine kStringRows[] = {
         .properties = kPure,
         .raises = {Sysfun::tooLong},
         .summary = "The source with every match of search, left to right, replaced.",
+        .example = {"REPLACE('aXbXc', 'X', 'YY')", "'aYYbYYc'"},
     },
     {
         .symbol = "CLI_udfREPLACE2",
@@ -205,6 +227,7 @@ inline constexpr Routine kStringRows[] = {
         .properties = kPure,
         .raises = {Sysfun::tooLong},
         .summary = "The source with every match of search, left to right, replaced.",
+        .example = {"REPLACE('banana', 'an', 'AN')", "'bANANa'"},
     },
     {
         .symbol = "CLI_udfINSERT1",
@@ -214,6 +237,7 @@ inline constexpr Routine kStringRows[] = {
         .properties = kPure,
         .raises = {Sysfun::outOfRange, Sysfun::tooLong},
         .summary = "The source with length bytes from start replaced by the new string.",
+        .example = {"INSERT('abcdef', 3, 2, 'XY')", "'abXYef'"},
     },
     {
         .symbol = "CLI_udfINSERT2",
@@ -223,6 +247,7 @@ inline constexpr Routine kStringRows[] = {
         .properties = kPure,
         .raises = {Sysfun::outOfRange, Sysfun::tooLong},
         .summary = "The source with length bytes from start replaced by the new string.",
+        .example = {"INSERT('abcdef', 6, 5, 'XY')", "'abcdeXY'"},
     },
     // Phonetic
     {
@@ -232,6 +257,7 @@ inline constexpr Routine kStringRows[] = {
         .results = {textOf(4)},
         .properties = kPure,
         .summary = "Four-character Soundex code; Z000 for a text without a letter.",
+        .example = {"SOUNDEX('Robert')", "'R163'"},
     },
     {
         .symbol = "CLI_udfDIFFERENCE",
@@ -240,6 +266,7 @@ inline constexpr Routine kStringRows[] = {
         .results = {int32()},
         .properties = kPure,
         .summary = "How many of the four Soundex positions agree, 0 to 4.",
+        .example = {"DIFFERENCE('Lee', 'Leigh')", "3"},
     },
 };
 
