@@ -208,6 +208,18 @@ TEST_F(SqliteHost, AnswersQueries) {
   EXPECT_EQ(eval("SELECT count(*) || column1 FROM fmpthreads(" + self + ".0)"), "1" + self);
 }
 
+// Every row's example gives its result through the export's own name: each
+// line of the script that tools/examples_sql.cpp writes gives 'ok', or what
+// the export gave instead.
+TEST_F(SqliteHost, GivesEveryExampleItsResult) {
+  std::ifstream script(ORV_EXAMPLES_SCRIPT);
+  int examples = 0;
+  for (std::string line; std::getline(script, line); ++examples) {
+    EXPECT_EQ(eval(line), "ok") << line;
+  }
+  EXPECT_GT(examples, 0) << "no examples in " << ORV_EXAMPLES_SCRIPT;
+}
+
 // The snapshot is read where the instance path says, one row per fetch.
 TEST_F(SqliteHost, ReadsTheSnapshotAsATable) {
   namespace fs = std::filesystem;
