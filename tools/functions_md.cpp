@@ -8,6 +8,7 @@
 #include <set>
 #include <sstream>
 #include <string>
+#include <string_view>
 
 #include "builtin_names.hpp"
 #include "frame/cliudf.h"
@@ -38,6 +39,20 @@ std::string results(const Routine &r) {
 }
 
 std::string codes(const Routine &r) { return r.raises.empty() ? "none" : r.raises.digits(); }
+
+// The example: the call and its result, or a condition on a result that
+// changes from call to call.
+std::string example(const Routine &r) {
+  const std::string_view result = r.example.result;
+  std::string out = "`";
+  out += r.example.call;
+  out += "` gives ";
+  if (result.starts_with("LIKE ") || result.starts_with("BETWEEN ")) out += "a result ";
+  out += "`";
+  out += result;
+  out += "`";
+  return out;
+}
 
 constexpr const char *kIntroduction = R"(# Function reference
 
@@ -89,6 +104,15 @@ call them quoted, as `"LEFT"(s, n)`, or as `sysfun_left`, `sysfun_right` and
 `sysfun_insert`.
 
 ## Functions in this build
+
+Each export's example is a call written with the function's SQL name and
+literals, and its result. The tests make every example through both the
+SQLite and the PostgreSQL extension by the export's own name
+(`sysfun_abs3(-7)`, `sysfun.abs3(-7::int2)`), which reaches that export and
+no other. Where the result changes from call to call (today's date, RAND),
+the example gives a condition on it instead, in which `_` stands for any
+one character. Blanks in a quoted result are part of it, and a double
+result is held to 12 digits.
 )";
 
 // The introduction with the limits and the SYSFUN codes filled in from the
@@ -155,13 +179,13 @@ int main(int argc, char **argv) {
       out << ", `" << g.label << "`";
     }
     out << "\n\n| Export | Reached | Own name | Arguments | Result | SYSFUN errors | What it "
-           "gives |\n"
-        << "|---|---|---|---|---|---|---|\n";
+           "gives | Example |\n"
+        << "|---|---|---|---|---|---|---|---|\n";
     for (std::size_t row : g.rows) {
       const Routine &r = kRoutines[row];
       out << "| `" << r.symbol << "` | " << reachedWhen(g, row) << " | `"
           << orv::host::exportName(r) << "` | " << arguments(r) << " | " << results(r) << " | "
-          << codes(r) << " | " << r.summary << " |\n";
+          << codes(r) << " | " << r.summary << " | " << example(r) << " |\n";
     }
   }
 
@@ -169,7 +193,8 @@ int main(int argc, char **argv) {
       << "Table functions are table-valued functions in SQLite, one row per fetch: "
       << "`SELECT * FROM sqlcache_snapshot`, `SELECT * FROM fmpthreads(0)`. Their "
       << "columns are `column1` and on, in the order of the results; an argument is "
-      << "the hidden column that follows them.\n\n"
+      << "the hidden column that follows them. Their rows are the engine's data, so they have no "
+      << "example.\n\n"
       << "| Export | In SQLite | Argument | Columns | What it gives |\n"
       << "|---|---|---|---|---|\n";
   for (const Routine &r : kRoutines) {
