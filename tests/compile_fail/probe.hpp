@@ -16,7 +16,7 @@
 namespace probe {
 
 constexpr std::size_t rowOf(std::string_view symbol) {
-  return static_cast<std::size_t>(cli::catalogue::find(symbol) - cli::catalogue::kRoutines);
+  return static_cast<std::size_t>(cli::catalogue::find(symbol) - cli::catalogue::kRoutines.data());
 }
 
 // ABS2: a 32-bit integer in, and out in an Answer<std::int32_t>.
