@@ -28,6 +28,13 @@ namespace orv::host {
 
 namespace cat = cli::catalogue;
 
+// The C++ type of a numeric layout.
+template <cat::Layout L>
+using NumberOf = std::conditional_t<
+    L == cat::Layout::int16, std::int16_t,
+    std::conditional_t<L == cat::Layout::int32, std::int32_t,
+                       std::conditional_t<L == cat::Layout::int64, std::int64_t, double>>>;
+
 // The bits of an integer layout of type T.
 template <typename T>
 inline constexpr int kBits = std::numeric_limits<T>::digits + 1;
@@ -57,14 +64,9 @@ struct NumberInput {
   void setNull() { value = 0; }
   void *pointer() { return &value; }
 };
-template <std::uint32_t S>
-struct Input<cat::Layout::int16, S> : NumberInput<std::int16_t> {};
-template <std::uint32_t S>
-struct Input<cat::Layout::int32, S> : NumberInput<std::int32_t> {};
-template <std::uint32_t S>
-struct Input<cat::Layout::int64, S> : NumberInput<std::int64_t> {};
-template <std::uint32_t S>
-struct Input<cat::Layout::real, S> : NumberInput<double> {};
+template <cat::Layout L, std::uint32_t S>
+requires(isNumber(L)) struct Input<L, S> : NumberInput<NumberOf<L>> {
+};
 
 // Terminated text, copied into an area of its own: for a routine that may
 // write into its inputs, or an engine whose text has no terminator.  The
@@ -91,7 +93,8 @@ struct BorrowedText {
   char *text;
   // The routine's parameter is char * by the frame's C signature; a
   // routine not marked kWritesInputs only reads through it.
-  void set(const char *terminated) { text = const_cast<char *>(terminated); }
+  // The text of `size` bytes at `bytes`, with its terminator behind them.
+  void set(const char *bytes, std::size_t /*size*/) { text = const_cast<char *>(bytes); }
   void setNull() { text = const_cast<char *>(""); }
   [[nodiscard]] void *pointer() const { return text; }
 };
@@ -172,14 +175,9 @@ struct NumberResult {
   void prepare(Allocate && /*allocate*/) {}
   void *pointer() { return &value; }
 };
-template <std::uint32_t S>
-struct Result<cat::Layout::int16, S> : NumberResult<std::int16_t> {};
-template <std::uint32_t S>
-struct Result<cat::Layout::int32, S> : NumberResult<std::int32_t> {};
-template <std::uint32_t S>
-struct Result<cat::Layout::int64, S> : NumberResult<std::int64_t> {};
-template <std::uint32_t S>
-struct Result<cat::Layout::real, S> : NumberResult<double> {};
+template <cat::Layout L, std::uint32_t S>
+requires(isNumber(L)) struct Result<L, S> : NumberResult<NumberOf<L>> {
+};
 
 template <std::uint32_t Longest>
 struct Result<cat::Layout::text, Longest> {

@@ -92,67 +92,55 @@ inline const char *argumentName(std::size_t row, int i) {
   return name != nullptr ? name : "";
 }
 
-// Integers of the export's width: from an INTEGER in range, or from a REAL
-// with a whole value in range; never cut to fit.
+// Numbers: a double from an INTEGER or a REAL; integers of the export's
+// width from an INTEGER in range, or from a REAL with a whole value in
+// range, never cut to fit.
 template <typename T>
 bool load(const Call &c, std::size_t row, int i, host::NumberInput<T> &in) {
   sqlite3_value *v = c.argv[i];
   const int type = c.arguments[static_cast<std::size_t>(i)].type;
-  if constexpr (std::is_same_v<T, double>) {
-    if (type != SQLITE_INTEGER && type != SQLITE_FLOAT) {
-      fail(c.context, "%s: argument %d (%s) is not a number", c.function.label.c_str(), i + 1,
-           argumentName(row, i));
-      return false;
-    }
-    in.set(sqlite3_value_double(v));
-    return true;
-  } else {
-    if (type == SQLITE_INTEGER) {
-      const sqlite3_int64 x = sqlite3_value_int64(v);
-      if (host::fitsInteger<T>(x)) {
-        in.set(static_cast<T>(x));
-        return true;
-      }
-      fail(c.context, "%s: argument %d (%s) is %lld, outside the %d-bit range",
-           c.function.label.c_str(), i + 1, argumentName(row, i), x, host::kBits<T>);
-      return false;
-    }
-    if (type == SQLITE_FLOAT) {
-      const double d = sqlite3_value_double(v);
-      if (host::wholeInteger<T>(d)) {
-        in.set(static_cast<T>(d));
-        return true;
-      }
-      fail(c.context, "%s: argument %d (%s) is %!.17g, not a whole number in the %d-bit range",
-           c.function.label.c_str(), i + 1, argumentName(row, i), d, host::kBits<T>);
-      return false;
-    }
+  if (type != SQLITE_INTEGER && type != SQLITE_FLOAT) {
     fail(c.context, "%s: argument %d (%s) is not a number", c.function.label.c_str(), i + 1,
          argumentName(row, i));
     return false;
   }
+  if constexpr (std::is_same_v<T, double>) {
+    in.set(sqlite3_value_double(v));
+    return true;
+  } else if (type == SQLITE_INTEGER) {
+    const sqlite3_int64 x = sqlite3_value_int64(v);
+    if (host::fitsInteger<T>(x)) {
+      in.set(static_cast<T>(x));
+      return true;
+    }
+    fail(c.context, "%s: argument %d (%s) is %lld, outside the %d-bit range",
+         c.function.label.c_str(), i + 1, argumentName(row, i), x, host::kBits<T>);
+    return false;
+  } else {
+    const double d = sqlite3_value_double(v);
+    if (host::wholeInteger<T>(d)) {
+      in.set(static_cast<T>(d));
+      return true;
+    }
+    fail(c.context, "%s: argument %d (%s) is %!.17g, not a whole number in the %d-bit range",
+         c.function.label.c_str(), i + 1, argumentName(row, i), d, host::kBits<T>);
+    return false;
+  }
 }
 
-// Terminated text, copied: for a routine that may write into its inputs.
-inline bool load(const Call &c, std::size_t /*row*/, int i, host::CopiedText &in) {
+// Terminated text: copied for a routine that may write into its inputs,
+// and otherwise SQLite's own buffer, which sqlite3_value_text ends with a
+// NUL, handed over without a copy.
+template <class Text>
+requires(std::is_base_of_v<host::CopiedText, Text> ||
+         std::is_same_v<Text, host::BorrowedText>) bool load(const Call &c, std::size_t /*row*/,
+                                                             int i, Text &in) {
   const Argument &a = c.arguments[static_cast<std::size_t>(i)];
   if (!a.fitsText) {
     failNotText(c, i);
     return false;
   }
   in.set(a.bytes, a.size);
-  return true;
-}
-
-// Terminated text for a routine that only reads it: SQLite's own buffer,
-// which sqlite3_value_text ends with a NUL, handed over without a copy.
-inline bool load(const Call &c, std::size_t /*row*/, int i, host::BorrowedText &in) {
-  const Argument &a = c.arguments[static_cast<std::size_t>(i)];
-  if (!a.fitsText) {
-    failNotText(c, i);
-    return false;
-  }
-  in.set(a.bytes);
   return true;
 }
 
