@@ -59,11 +59,12 @@ struct ScalarCall {
   static constexpr std::size_t kInputs = cat::inputCount(kRow);
   static_assert(cat::resultCount(kRow) == 1);
 
+  // What starts cleared comes first, in one run of bytes.
+  cli::call::StatusBuffers status;
+  std::int16_t resultIndicator = 0;
+  std::int16_t inputIndicators[kInputs + 1] = {};
   InputsOf<Row, Borrow> inputs;
   ResultOf<Row> result;
-  std::int16_t inputIndicators[kInputs + 1] = {};
-  std::int16_t resultIndicator = 0;
-  cli::call::StatusBuffers status;
 
   template <std::size_t I>
   auto &input() {
@@ -80,15 +81,20 @@ struct ScalarCall {
   // Calls `fn`, the export, with the inputs as they are set, the prepared
   // result and, where the row's frame has them, the database information
   // block or the scratchpad.
-  [[gnu::always_inline]] Outcome run(void *fn, bool longForm, const void *dbinfo = nullptr,
-                                     void *scratchpad = nullptr) {
-    return run(fn, longForm, dbinfo, scratchpad, std::make_index_sequence<kInputs>{});
+  [[gnu::always_inline]] void run(void *fn, const void *dbinfo = nullptr,
+                                  void *scratchpad = nullptr) {
+    run(fn, dbinfo, scratchpad, std::make_index_sequence<kInputs>{});
+  }
+
+  // What the call came to; `longForm` as for outcomeOf.
+  [[nodiscard]] Outcome outcome(bool longForm) const {
+    return outcomeOf(status, resultIndicator, longForm);
   }
 
  private:
   template <std::size_t... I>
-  [[gnu::always_inline]] Outcome run(void *fn, bool longForm, const void *dbinfo, void *scratchpad,
-                                     std::index_sequence<I...>) {
+  [[gnu::always_inline]] void run(void *fn, const void *dbinfo, void *scratchpad,
+                                  std::index_sequence<I...>) {
     void *values[] = {input<I>().pointer()..., nullptr};
     void *results[] = {result.pointer()};
     std::int16_t *inputNulls[] = {&inputIndicators[I]..., nullptr};
@@ -97,7 +103,6 @@ struct ScalarCall {
     if constexpr (kRow.frame == cat::Frame::dbinfo) f.dbinfo = dbinfo;
     if constexpr (kRow.frame == cat::Frame::scratchpad) f.scratchpad = scratchpad;
     cli::call::call<Row>(fn, f);
-    return outcomeOf(status, resultIndicator, longForm);
   }
 };
 

@@ -118,7 +118,8 @@ Outcome callRow(FunctionCallInfo fcinfo, const Argument *arguments, bool longFor
   [[maybe_unused]] void *scratchpad = nullptr;
   if constexpr (r.frame == cat::Frame::dbinfo) dbinfo = databaseInfo(fcinfo);
   if constexpr (r.frame == cat::Frame::scratchpad) scratchpad = statementScratchpad(fcinfo);
-  const Outcome o = call.run(gExports[Row], longForm, dbinfo, scratchpad);
+  call.run(gExports[Row], dbinfo, scratchpad);
+  const Outcome o = call.outcome(longForm);
   if (o == Outcome::status) reportStatus(fcinfo, call.status);
   if (o == Outcome::value) out = deliver<Result>(fcinfo, call.result);
   return o;

@@ -45,6 +45,9 @@ struct Call {
   Connection &connection;
   const Function &function;
   bool blobResult = false;  // the first string argument was a BLOB
+  // A CLI_udfLob form serves the call if the chosen form refuses it for a
+  // length rule (SYSFUN:10).
+  bool longForm = false;
 };
 
 template <typename... Args>
@@ -96,7 +99,8 @@ inline const char *argumentName(std::size_t row, int i) {
 // width from an INTEGER in range, or from a REAL with a whole value in
 // range, never cut to fit.
 template <typename T>
-bool load(const Call &c, std::size_t row, int i, host::NumberInput<T> &in) {
+[[gnu::always_inline]] inline bool load(const Call &c, std::size_t row, int i,
+                                        host::NumberInput<T> &in) {
   sqlite3_value *v = c.argv[i];
   const int type = c.arguments[static_cast<std::size_t>(i)].type;
   if (type != SQLITE_INTEGER && type != SQLITE_FLOAT) {
@@ -131,10 +135,11 @@ bool load(const Call &c, std::size_t row, int i, host::NumberInput<T> &in) {
 // Terminated text: copied for a routine that may write into its inputs,
 // and otherwise SQLite's own buffer, which sqlite3_value_text ends with a
 // NUL, handed over without a copy.
-template <class Text>
-requires(std::is_base_of_v<host::CopiedText, Text> ||
-         std::is_same_v<Text, host::BorrowedText>) bool load(const Call &c, std::size_t /*row*/,
-                                                             int i, Text &in) {
+template <class T>
+concept TextInput = std::is_base_of_v<host::CopiedText, T> || std::is_same_v<T, host::BorrowedText>;
+
+template <TextInput Text>
+[[gnu::always_inline]] inline bool load(const Call &c, std::size_t /*row*/, int i, Text &in) {
   const Argument &a = c.arguments[static_cast<std::size_t>(i)];
   if (!a.fitsText) {
     failNotText(c, i);
@@ -146,7 +151,8 @@ requires(std::is_base_of_v<host::CopiedText, Text> ||
 
 // A CLI_udfLob in the connection's area for argument i.
 template <std::uint32_t S>
-bool load(const Call &c, std::size_t row, int i, host::Input<Layout::lob, S> &in) {
+[[gnu::always_inline]] inline bool load(const Call &c, std::size_t row, int i,
+                                        host::Input<Layout::lob, S> &in) {
   const Argument &a = c.arguments[static_cast<std::size_t>(i)];
   const std::size_t size = a.size;
   if (size > kLobLimit) {
@@ -161,7 +167,8 @@ bool load(const Call &c, std::size_t row, int i, host::Input<Layout::lob, S> &in
 }
 
 template <std::uint32_t Size>
-bool load(const Call &c, std::size_t row, int i, host::Input<Layout::fixedBytes, Size> &in) {
+[[gnu::always_inline]] inline bool load(const Call &c, std::size_t row, int i,
+                                        host::Input<Layout::fixedBytes, Size> &in) {
   const Argument &a = c.arguments[static_cast<std::size_t>(i)];
   if (a.size != Size) {
     fail(c.context, "%s: argument %d (%s) must be exactly %d bytes", c.function.label.c_str(),
@@ -176,7 +183,7 @@ bool load(const Call &c, std::size_t row, int i, host::Input<Layout::fixedBytes,
 // TEXT, a CLI_udfLob as TEXT or, when the first string argument was a BLOB,
 // as a BLOB.
 template <Layout L, std::uint32_t Size>
-void deliver(const Call &c, const host::Result<L, Size> &result) {
+[[gnu::always_inline]] inline void deliver(const Call &c, const host::Result<L, Size> &result) {
   if constexpr (L == Layout::real) {
     sqlite3_result_double(c.context, result.value);
   } else if constexpr (host::isNumber(L)) {

@@ -70,13 +70,12 @@ alignas(8) std::array<unsigned char, 512> kDatabaseInfo = [] {
   return block;
 }();
 
-// One call of the export of `Row`, its result or error given to SQLite;
-// `longForm`: a CLI_udfLob form could serve the call if this one refuses
-// it for a length rule, and then nothing is given yet.  An argument that
-// cannot be laid out is reported, as Outcome::status.
+// One call of the export of `Row`, its result or error given to SQLite,
+// but nothing yet where it refuses the call for a length rule and the
+// call has a long form (Call::longForm).  An argument that cannot be laid
+// out is reported, as Outcome::status.
 template <std::size_t Row, std::size_t... Is>
-[[gnu::always_inline]] inline Outcome callRow(const Call &c, bool longForm,
-                                              std::index_sequence<Is...>) {
+[[gnu::always_inline]] inline Outcome callRow(const Call &c, std::index_sequence<Is...>) {
   constexpr const Routine &r = kRoutines[Row];
   host::ScalarCall<Row, true> call;  // no braces: the inputs are left as they are
 
@@ -101,29 +100,30 @@ template <std::size_t Row, std::size_t... Is>
       return Outcome::status;
     }
   }
-  const Outcome o = call.run(c.connection.exports[Row], longForm, dbinfo, scratchpad);
-  switch (o) {
+  call.run(c.connection.exports[Row], dbinfo, scratchpad);
+  // Each case gives back its own Outcome, a constant where it returns.
+  switch (call.outcome(c.longForm)) {
     case Outcome::value:
       deliver(c, call.result);
-      break;
+      return Outcome::value;
     case Outcome::null:
       sqlite3_result_null(c.context);
-      break;
+      return Outcome::null;
     case Outcome::status:
-      reportStatus(c, call.status);
       break;
     case Outcome::refusedForLength:
-      break;  // the caller tries the CLI_udfLob form
+      return Outcome::refusedForLength;  // the caller tries the CLI_udfLob form
   }
-  return o;
+  reportStatus(c, call.status);
+  return Outcome::status;
 }
 
-using RowCall = Outcome (*)(const Call &, bool);
+using RowCall = Outcome (*)(const Call &);
 
 template <std::size_t Row>
-[[gnu::always_inline]] inline Outcome callRow(const Call &c, bool longForm) {
+[[gnu::always_inline]] inline Outcome callRow(const Call &c) {
   if constexpr (orv::sqlite::hostable(kRoutines[Row])) {
-    return callRow<Row>(c, longForm, std::make_index_sequence<inputCount(kRoutines[Row])>{});
+    return callRow<Row>(c, std::make_index_sequence<inputCount(kRoutines[Row])>{});
   } else {
     return Outcome::status;  // never registered
   }
@@ -180,10 +180,12 @@ namespace {
 // length rule, the CLI_udfLob form `wide`, whose error is the one reported
 // if it fails too.
 template <class First>
-void callWithRetry(const Call &call, First first, int wide) {
+[[gnu::always_inline]] inline void callWithRetry(Call &call, First first, int wide) {
   try {
-    host::withLongForm(
-        first, [&call, wide] { return kRowCalls[static_cast<std::size_t>(wide)](call, false); });
+    host::withLongForm(first, [&call, wide] {
+      call.longForm = false;
+      return kRowCalls[static_cast<std::size_t>(wide)](call);
+    });
   } catch (const std::bad_alloc &) {
     sqlite3_result_error_nomem(call.context);
   }
@@ -191,7 +193,7 @@ void callWithRetry(const Call &call, First first, int wide) {
 
 // The rest of a call whose arguments are classified: the form that serves
 // them, or the error that says why none does.
-void callForm(const Call &call, int argc, KindMask mask) {
+void callForm(Call &call, int argc, KindMask mask) {
   const Function &f = call.function;
   const int row = f.formFor[mask];
   if (row == orv::sqlite::kNoForm) {
@@ -206,11 +208,9 @@ void callForm(const Call &call, int argc, KindMask mask) {
   }
   // The form follows what fits: see callWithRetry.
   const int wide = f.formFor[mask | f.stringArguments];
-  const bool longForm = wide != row && wide != orv::sqlite::kNoForm;
+  call.longForm = wide != row && wide != orv::sqlite::kNoForm;
   callWithRetry(
-      call,
-      [&call, row, longForm] { return kRowCalls[static_cast<std::size_t>(row)](call, longForm); },
-      wide);
+      call, [&call, row] { return kRowCalls[static_cast<std::size_t>(row)](call); }, wide);
 }
 
 // The SQL function of a name whose plain arguments reach `Row`: the
@@ -231,9 +231,9 @@ void entryWith(sqlite3_context *context, sqlite3_value **argv, std::index_sequen
     return callForm(call, static_cast<int>(sizeof...(Is)), mask);
   }
   const int wide = f.formFor[mask | f.stringArguments];
-  const bool longForm = wide != static_cast<int>(Row) && wide != orv::sqlite::kNoForm;
+  call.longForm = wide != static_cast<int>(Row) && wide != orv::sqlite::kNoForm;
   callWithRetry(
-      call, [&call, longForm] { return callRow<Row>(call, longForm); }, wide);
+      call, [&call]() __attribute__((always_inline)) { return callRow<Row>(call); }, wide);
 }
 
 template <std::size_t Row>
