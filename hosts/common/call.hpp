@@ -36,7 +36,8 @@ inline Outcome outcomeOf(const cli::call::StatusBuffers &status, std::int16_t re
                ? Outcome::refusedForLength
                : Outcome::status;
   }
-  return resultIndicator < 0 ? Outcome::null : Outcome::value;
+  if (resultIndicator < 0) return Outcome::null;
+  return Outcome::value;
 }
 
 // Calls `shortForm`, and where its Outcome is refusedForLength, `longForm`
@@ -59,8 +60,9 @@ struct ScalarCall {
   static constexpr std::size_t kInputs = cat::inputCount(kRow);
   static_assert(cat::resultCount(kRow) == 1);
 
-  // What starts cleared comes first, in one run of bytes.
-  cli::call::StatusBuffers status;
+  // What starts cleared comes first, in one run of bytes that a few wide
+  // stores clear.
+  alignas(16) cli::call::StatusBuffers status;
   std::int16_t resultIndicator = 0;
   std::int16_t inputIndicators[kInputs + 1] = {};
   InputsOf<Row, Borrow> inputs;

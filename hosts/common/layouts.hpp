@@ -188,9 +188,10 @@ struct Result<cat::Layout::text, Longest> {
   }
   void *pointer() { return text; }
   [[nodiscard]] const char *data() const { return text; }
-  // A short area is measured inline; a call to strnlen costs more.
+  // An area of a few bytes is measured inline; for a longer one the C
+  // library's strnlen costs less than a loop.
   [[nodiscard]] std::size_t length() const {
-    if constexpr (Longest <= 32) {
+    if constexpr (Longest <= 8) {
       std::size_t n = 0;
       while (n < Longest && text[n] != '\0') ++n;
       return n;

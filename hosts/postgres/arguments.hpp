@@ -37,7 +37,7 @@ struct Argument {
 // The arguments are not zeroed first, as that costs more on every call
 // than a short routine does: this sets every member.
 template <Type T>
-void readArgument(FunctionCallInfo fcinfo, int i, Argument &a) {
+[[gnu::always_inline]] inline void readArgument(FunctionCallInfo fcinfo, int i, Argument &a) {
   a.null = PG_ARGISNULL(i);
   a.datetime = Datetime::none;
   a.integer = 0;
@@ -106,7 +106,7 @@ inline void writeDatetime(const Argument &a, char *out) {
 // keep it out has been checked before: the text fits terminated text,
 // fixed bytes have their length.
 template <typename T>
-void load(host::NumberInput<T> &in, const Argument &a) {
+[[gnu::always_inline]] inline void load(host::NumberInput<T> &in, const Argument &a) {
   if constexpr (std::is_same_v<T, double>) {
     in.set(a.real);
   } else {
@@ -116,7 +116,7 @@ void load(host::NumberInput<T> &in, const Argument &a) {
 
 // Terminated text, copied: PostgreSQL's text has no terminator.  A date or
 // time value is written there in its text form.
-inline void load(host::CopiedText &in, const Argument &a) {
+[[gnu::always_inline]] inline void load(host::CopiedText &in, const Argument &a) {
   if (a.datetime != Datetime::none) {
     writeDatetime(a, in.area());
     in.written(a.size);
@@ -127,12 +127,13 @@ inline void load(host::CopiedText &in, const Argument &a) {
 
 // A CLI_udfLob in memory of the call.
 template <std::uint32_t S>
-void load(host::Input<cat::Layout::lob, S> &in, const Argument &a) {
+[[gnu::always_inline]] inline void load(host::Input<cat::Layout::lob, S> &in, const Argument &a) {
   in.set(palloc(CLI_LOB_AREA_SIZE(a.size)), a.bytes, a.size);
 }
 
 template <std::uint32_t Size>
-void load(host::Input<cat::Layout::fixedBytes, Size> &in, const Argument &a) {
+[[gnu::always_inline]] inline void load(host::Input<cat::Layout::fixedBytes, Size> &in,
+                                        const Argument &a) {
   in.set(a.bytes);
 }
 

@@ -130,13 +130,18 @@ bool plainAscii(const char *data, std::size_t size) {
   return true;
 }
 
-bool readDigits(const char *p, int width, std::int64_t &out) {
-  out = 0;
-  for (int i = 0; i < width; ++i) {
-    if (p[i] < '0' || p[i] > '9') return false;
-    out = out * 10 + (p[i] - '0');
+// The number that the Width digits at `p` spell; `bad` is set when a byte
+// among them is no digit.  Without a branch per byte: the text is nearly
+// always right.
+template <int Width>
+std::int64_t digitsAt(const char *p, bool &bad) {
+  std::int64_t out = 0;
+  for (int i = 0; i < Width; ++i) {
+    const unsigned digit = static_cast<unsigned char>(p[i]) - unsigned{'0'};
+    bad |= digit > 9;
+    out = out * 10 + digit;
   }
-  return true;
+  return out;
 }
 
 }  // namespace
@@ -213,22 +218,32 @@ std::size_t timestampText(Timestamp stamp, char *out) {
 }
 
 bool timestampOf(const char *text, std::size_t size, Timestamp &out) {
-  std::int64_t y = 0, mo = 0, d = 0, h = 0, mi = 0, s = 0, f = 0;
   if (size != 26 || text[4] != '-' || text[7] != '-' || text[10] != '-' || text[13] != '.' ||
-      text[16] != '.' || text[19] != '.' || !readDigits(text, 4, y) ||
-      !readDigits(text + 5, 2, mo) || !readDigits(text + 8, 2, d) || !readDigits(text + 11, 2, h) ||
-      !readDigits(text + 14, 2, mi) || !readDigits(text + 17, 2, s) ||
-      !readDigits(text + 20, 6, f)) {
+      text[16] != '.' || text[19] != '.') [[unlikely]] {
     return false;
   }
+  // The text comes from the library, which writes the form it should: the
+  // paths that refuse it are the unlikely ones.
+  bool bad = false;
+  const std::int64_t y = digitsAt<4>(text, bad), mo = digitsAt<2>(text + 5, bad),
+                     d = digitsAt<2>(text + 8, bad), mi = digitsAt<2>(text + 14, bad),
+                     s = digitsAt<2>(text + 17, bad), f = digitsAt<6>(text + 20, bad);
+  std::int64_t h = digitsAt<2>(text + 11, bad);
+  if (bad) [[unlikely]]
+    return false;
   // The library ends a day at 24.00.00.000000 (TIMESTAMPTIME of 24:00:00,
   // which PostgreSQL's time takes too): the next day's midnight.
   const bool endOfDay = h == 24 && mi == 0 && s == 0 && f == 0;
   if (endOfDay) h = 0;
-  if (y < 1 || mo < 1 || mo > 12 || d < 1 || h > 23 || mi > 59 || s > 59) return false;
+  if (y < 1 || mo < 1 || mo > 12 || d < 1 || h > 23 || mi > 59 || s > 59) [[unlikely]] {
+    return false;
+  }
   const auto year = static_cast<std::int32_t>(y), month = static_cast<std::int32_t>(mo),
              day = static_cast<std::int32_t>(d);
-  if (day > cli::CLI_monthLengthTable[cli::CLI_isLeapYear(year)][month]) return false;
+  // Every month has 28 days; only the few days beyond look up the month.
+  if (day > 28 && day > cli::CLI_monthLengthTable[cli::CLI_isLeapYear(year)][month]) [[unlikely]] {
+    return false;
+  }
   const std::int64_t days = cli::CLI_dayNumber(year, month, day) - kDayNumberOfDayZero;
   out = (days + (endOfDay ? 1 : 0)) * kDay + ((h * 60 + mi) * 60 + s) * USECS_PER_SEC + f;
   return true;

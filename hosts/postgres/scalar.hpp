@@ -36,7 +36,8 @@ using host::Outcome;
 // (valid in the database's encoding) or bytea, and a timestamp from the
 // library's timestamp text.
 template <Type R, cat::Layout L, std::uint32_t Size>
-Datum deliver(FunctionCallInfo fcinfo, const host::Result<L, Size> &result) {
+[[gnu::always_inline]] inline Datum deliver(FunctionCallInfo fcinfo,
+                                            const host::Result<L, Size> &result) {
   if constexpr (host::isNumber(L)) {
     if constexpr (R == Type::int2) {
       return Int16GetDatum(result.value);

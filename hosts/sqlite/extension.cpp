@@ -2,10 +2,11 @@
 // function, registered from the catalogue.
 //
 // The extension plays the engine's part.  It finds each export by its name
-// in the library and registers one SQL function per name and argument
-// count (registry.hpp); the call path (forms.cpp) lays the SQL arguments
-// out in the export's value layouts, calls it through the frame caller and
-// turns the result, or the status, into an SQLite result or error.
+// in the library (common/exports.hpp) and registers one SQL function per
+// name and argument count (registry.hpp); the call path (forms.cpp) lays
+// the SQL arguments out in the export's value layouts, calls it
+// (common/call.hpp) and turns the result, or the status, into an SQLite
+// result or error.
 #include <sqlite3ext.h>
 SQLITE_EXTENSION_INIT1
 
