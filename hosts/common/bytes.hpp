@@ -1,8 +1,8 @@
 // Short strings, read and written a word at a time.
 //
 // Most SQL strings are short: these read and write them in at most four
-// overlapping words each way, never outside [from, from + size), and call
-// the C library only for longer ones.
+// overlapping words (or bytes) each way, never outside [from, from + size),
+// and call the C library only for longer ones.
 #pragma once
 
 #include <cstddef>
@@ -40,7 +40,7 @@ constexpr bool hasZeroByte(std::uint64_t w) {
 }
 
 // Copies `size` bytes from `from` to `to`.
-inline void copyShort(char *to, const char *from, std::size_t size) {
+[[gnu::always_inline]] inline void copyShort(char *to, const char *from, std::size_t size) {
   if (size >= 8 && size <= 16) {
     const std::uint64_t head = word(from), tail = word(from + size - 8);
     std::memcpy(to, &head, 8);
@@ -52,6 +52,15 @@ inline void copyShort(char *to, const char *from, std::size_t size) {
     std::memcpy(to + 8, &b, 8);
     std::memcpy(to + size - 16, &c, 8);
     std::memcpy(to + size - 8, &d, 8);
+  } else if (size >= 4 && size < 8) {
+    const std::uint32_t head = halfWord(from), tail = halfWord(from + size - 4);
+    std::memcpy(to, &head, 4);
+    std::memcpy(to + size - 4, &tail, 4);
+  } else if (size != 0 && size < 4) {
+    // One, two or three bytes: the first, the middle and the last.
+    to[0] = from[0];
+    to[size / 2] = from[size / 2];
+    to[size - 1] = from[size - 1];
   } else if (size != 0) {
     std::memcpy(to, from, size);
   }

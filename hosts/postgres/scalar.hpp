@@ -39,7 +39,9 @@ template <Type R, cat::Layout L, std::uint32_t Size>
 [[gnu::always_inline]] inline Datum deliver(FunctionCallInfo fcinfo,
                                             const host::Result<L, Size> &result) {
   if constexpr (host::isNumber(L)) {
-    if constexpr (R == Type::int2) {
+    // The integer macros are alike where a Datum has 64 bits; each names
+    // the width it is for.
+    if constexpr (R == Type::int2) {  // NOLINT(bugprone-branch-clone)
       return Int16GetDatum(result.value);
     } else if constexpr (R == Type::int4) {
       return Int32GetDatum(result.value);
