@@ -53,10 +53,6 @@ inline bool wholeInteger(double d) {
   return d == std::trunc(d) && d >= -limit && d < limit;
 }
 
-// An input in the layout L; Size is the byte count of fixed bytes.
-template <cat::Layout L, std::uint32_t Size>
-struct Input;
-
 template <typename T>
 struct NumberInput {
   T value;
@@ -64,8 +60,12 @@ struct NumberInput {
   void setNull() { value = 0; }
   void *pointer() { return &value; }
 };
-template <cat::Layout L, std::uint32_t S>
-requires(isNumber(L)) struct Input<L, S> : NumberInput<NumberOf<L>> {
+
+// An input in the layout L: a number of its width, or one of the string
+// layouts below; Size is the byte count of fixed bytes.
+template <cat::Layout L, std::uint32_t Size>
+struct Input : NumberInput<NumberOf<L>> {
+  static_assert(isNumber(L));
 };
 
 // Terminated text, copied into an area of its own: for a routine that may
@@ -162,12 +162,6 @@ using InputsOf =
     typename InputsOfRow<Row, Borrow,
                          std::make_index_sequence<cat::inputCount(cat::kRoutines[Row])>>::type;
 
-// A result in the layout L; Size is the longest text, the capacity of a
-// CLI_udfLob or the byte count of fixed text.  prepare() takes a function
-// that gives an area of a byte count, which only a CLI_udfLob asks for.
-template <cat::Layout L, std::uint32_t Size>
-struct Result;
-
 template <typename T>
 struct NumberResult {
   T value;
@@ -175,8 +169,14 @@ struct NumberResult {
   void prepare(Allocate && /*allocate*/) {}
   void *pointer() { return &value; }
 };
-template <cat::Layout L, std::uint32_t S>
-requires(isNumber(L)) struct Result<L, S> : NumberResult<NumberOf<L>> {
+
+// A result in the layout L: a number of its width, or one of the string
+// layouts below; Size is the longest text, the capacity of a CLI_udfLob or
+// the byte count of fixed text.  prepare() takes a function that gives an
+// area of a byte count, which only a CLI_udfLob asks for.
+template <cat::Layout L, std::uint32_t Size>
+struct Result : NumberResult<NumberOf<L>> {
+  static_assert(isNumber(L));
 };
 
 template <std::uint32_t Longest>
