@@ -7,6 +7,7 @@
 
 #include <cstddef>
 #include <cstdint>
+#include <cstring>
 #include <utility>
 
 #include "catalogue/catalogue.hpp"
@@ -51,9 +52,9 @@ template <class Short, class Long>
 
 // One call of the export of catalogue row Row, laid out as the frame
 // caller wants it.  Borrow: text that the routine only reads is the
-// engine's own, terminated (see InputOf).  Declare it without braces, so
-// that the inputs and the result stay uninitialised; the indicators and
-// the status buffers start cleared.
+// engine's own, terminated (see InputOf).  The indicators and the status
+// buffers start cleared; the inputs and the result are left as they are
+// until the host sets and prepares them.
 template <std::size_t Row, bool Borrow>
 struct ScalarCall {
   static constexpr const cat::Routine &kRow = cat::kRoutines[Row];
@@ -61,12 +62,17 @@ struct ScalarCall {
   static_assert(cat::resultCount(kRow) == 1);
 
   // What starts cleared comes first, in one run of bytes that a few wide
-  // stores clear.
+  // stores clear (see the constructor).
   alignas(16) cli::call::StatusBuffers status;
   std::int16_t resultIndicator = 0;
   std::int16_t inputIndicators[kInputs + 1] = {};
   InputsOf<Row, Borrow> inputs;
   ResultOf<Row> result;
+
+  // The status buffers cleared as one block of bytes, which the compiler
+  // joins with the indicators into a few wide stores in place of the
+  // buffers' own clearing, member by member.
+  ScalarCall() noexcept { std::memset(static_cast<void *>(&status), 0, sizeof status); }
 
   template <std::size_t I>
   auto &input() {

@@ -111,8 +111,8 @@ Outcome callRow(FunctionCallInfo fcinfo, const Argument *arguments, bool longFor
   };
   (checkSize(I), ...);
 
-  // Plain data only: no destructor to skip, and no braces, so that nothing
-  // is zeroed.
+  // Plain data only: no destructor to skip, and only the status buffers and
+  // indicators cleared.
   host::ScalarCall<Row, false> call;
   (...,
    (arguments[I].null ? call.template setNull<I>() : load(call.template input<I>(), arguments[I])));

@@ -77,7 +77,7 @@ alignas(8) std::array<unsigned char, 512> kDatabaseInfo = [] {
 template <std::size_t Row, std::size_t... Is>
 [[gnu::always_inline]] inline Outcome callRow(const Call &c, std::index_sequence<Is...>) {
   constexpr const Routine &r = kRoutines[Row];
-  host::ScalarCall<Row, true> call;  // no braces: the inputs are left as they are
+  host::ScalarCall<Row, true> call;
 
   // NULL reaches the routine only when it reads its indicators itself.
   [[maybe_unused]] const auto load = [&]<std::size_t I>(std::integral_constant<std::size_t, I>) {
