@@ -1,9 +1,9 @@
 // Date and time routines: every date of the calendar against a model built
-// on <chrono> (tests/models/calendar.hpp), trimming, timestamps and
-// durations, and the grammar of the texts: JULIAN_DAY and MIDNIGHT_SECONDS
-// against a small model of it (tests/models/date_text.hpp), on texts at the
-// edges of the grammar and on valid texts of every shape with a few bytes
-// changed.
+// on <chrono> (tests/models/calendar.hpp), and the calendar's date of each
+// day number against <chrono>'s; trimming, timestamps and durations, and
+// the grammar of the texts: JULIAN_DAY and MIDNIGHT_SECONDS against a small
+// model of it (tests/models/date_text.hpp), on texts at the edges of the
+// grammar and on valid texts of every shape with a few bytes changed.
 #include <gtest/gtest.h>
 
 #include <algorithm>
@@ -18,6 +18,7 @@
 #include <string_view>
 #include <vector>
 
+#include "calendar/calendar.hpp"
 #include "catalogue/catalogue.hpp"
 #include "frame/table_call.hpp"
 #include "models/calendar.hpp"
@@ -71,9 +72,20 @@ TEST(DateNumbers, AgreeWithChronoOnEveryDateOfTheCalendar) {
   // it; trailing blanks on some.  The time must not change the number.
   const char *times[] = {"", "-23.59.59.999999", " 12:30:15", "   "};
   int failures = 0;
-  for (sys_days day = sys_days{year{1} / January / 1}; day <= sys_days{year{9999} / December / 31};
-       day += days{1}) {
+  const sys_days first = sys_days{year{1} / January / 1};
+  for (sys_days day = first; day <= sys_days{year{9999} / December / 31}; day += days{1}) {
     const Numbers want = orv::model::numbersOf(day);
+    // The calendar's own way back from a day number, which the hosts use.
+    const year_month_day ymd{day};
+    const cli::CLI_date date =
+        cli::CLI_dateOfDayNumber(static_cast<std::int32_t>((day - first).count() + 1));
+    if (date != cli::CLI_date{static_cast<int>(ymd.year()),
+                              static_cast<int>(static_cast<unsigned>(ymd.month())),
+                              static_cast<int>(static_cast<unsigned>(ymd.day()))} &&
+        ++failures <= 10) {
+      ADD_FAILURE() << "CLI_dateOfDayNumber of " << (day - first).count() + 1 << ": " << date.year
+                    << "-" << date.month << "-" << date.day;
+    }
     const auto n = static_cast<unsigned>(day.time_since_epoch().count());
     unsigned k = 0;
     for (cli::call::TableCall &c : calls) {

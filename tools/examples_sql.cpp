@@ -101,8 +101,8 @@ std::string check(const Routine &r, const std::string &result, const char *great
 
 std::string sqliteStatement(std::size_t row, const std::vector<Literal> &arguments) {
   const Routine &r = kRoutines[row];
-  std::string call = orv::host::exportName(r) + "(";
-  orv::host::KindMask mask = 0;
+  std::string call = orv::sqlite::ownName(r) + "(";
+  orv::sqlite::KindMask mask = 0;
   for (std::size_t i = 0; i < arguments.size(); ++i) {
     const Literal &a = arguments[i];
     call += (i == 0 ? "" : ", ") + a.text;
@@ -113,10 +113,10 @@ std::string sqliteStatement(std::size_t row, const std::vector<Literal> &argumen
   call += ")";
   // The export's own name reaches the row, by the host's own rules.
   bool reached = false;
-  for (const orv::host::Group &g : orv::host::groups()) {
-    reached = reached || (g.sysfunName == orv::host::exportName(r) &&
+  for (const orv::sqlite::Group &g : orv::sqlite::groups()) {
+    reached = reached || (g.sysfunName == orv::sqlite::ownName(r) &&
                           g.argumentCount == static_cast<int>(arguments.size()) &&
-                          orv::host::chooseForm(g, mask) == static_cast<int>(row));
+                          orv::sqlite::chooseForm(g, mask) == static_cast<int>(row));
   }
   if (!reached) return "";
   return "SELECT CASE WHEN " + check(r, r.example.result, "max") +

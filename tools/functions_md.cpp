@@ -18,7 +18,7 @@ namespace {
 
 using cli::catalogue::kRoutines;
 using cli::catalogue::Routine;
-using orv::host::describe;
+using orv::sqlite::describe;
 
 std::string arguments(const Routine &r) {
   std::string out;
@@ -134,14 +134,14 @@ std::string introduction() {
 
 // When the function's names reach export `row`, by the extension's own
 // choice rule (chooseForm) over every kind of the arguments.
-std::string reachedWhen(const orv::host::Group &g, std::size_t row) {
+std::string reachedWhen(const orv::sqlite::Group &g, std::size_t row) {
   unsigned strings = 0;
   for (int i = 0; i < g.argumentCount; ++i) {
-    if (!orv::host::isNumber(kRoutines[row].inputs[i].layout)) strings |= 1u << i;
+    if (!orv::sqlite::isNumber(kRoutines[row].inputs[i].layout)) strings |= 1u << i;
   }
   bool plain = false, longStrings = false, reals = false;
-  for (orv::host::KindMask m = 0; m < (1u << g.argumentCount); ++m) {
-    if (orv::host::chooseForm(g, m) != static_cast<int>(row)) continue;
+  for (orv::sqlite::KindMask m = 0; m < (1u << g.argumentCount); ++m) {
+    if (orv::sqlite::chooseForm(g, m) != static_cast<int>(row)) continue;
     plain = plain || m == 0;
     longStrings = longStrings || (m & strings) != 0;
     reals = reals || (m & ~strings) != 0;
@@ -164,12 +164,12 @@ int main(int argc, char **argv) {
 
   std::ostringstream out;
   out << introduction() << sqlite3_libversion() << kPicking;
-  const auto groups = orv::host::groups();
-  const orv::host::KnownFunctions known(db);
+  const auto groups = orv::sqlite::groups();
+  const orv::sqlite::KnownFunctions known(db);
   for (const auto &g : groups) {
     if (g.plainName.empty()) continue;
     // The summary of the export that plain arguments reach.
-    const int preferred = orv::host::chooseForm(g, 0);
+    const int preferred = orv::sqlite::chooseForm(g, 0);
     const Routine &first =
         kRoutines[preferred >= 0 ? static_cast<std::size_t>(preferred) : g.rows.front()];
     out << "\n### " << g.label << " (" << g.argumentCount
@@ -183,9 +183,9 @@ int main(int argc, char **argv) {
         << "|---|---|---|---|---|---|---|---|\n";
     for (std::size_t row : g.rows) {
       const Routine &r = kRoutines[row];
-      out << "| `" << r.symbol << "` | " << reachedWhen(g, row) << " | `"
-          << orv::host::exportName(r) << "` | " << arguments(r) << " | " << results(r) << " | "
-          << codes(r) << " | " << r.summary << " | " << example(r) << " |\n";
+      out << "| `" << r.symbol << "` | " << reachedWhen(g, row) << " | `" << orv::sqlite::ownName(r)
+          << "` | " << arguments(r) << " | " << results(r) << " | " << codes(r) << " | "
+          << r.summary << " | " << example(r) << " |\n";
     }
   }
 
@@ -201,9 +201,9 @@ int main(int argc, char **argv) {
     const bool table =
         r.frame == cli::catalogue::Frame::table || r.frame == cli::catalogue::Frame::tableCallback;
     if (!table) continue;
-    const std::string plain = orv::host::lowerCase(r.sqlName);
-    out << "| `" << r.symbol << "` | `" << orv::host::kPrefix << plain << "`, `" << plain << "` | "
-        << arguments(r) << " | " << results(r) << " | " << r.summary << " |\n";
+    const std::string plain = orv::sqlite::lowerCase(r.sqlName);
+    out << "| `" << r.symbol << "` | `" << orv::sqlite::kPrefix << plain << "`, `" << plain
+        << "` | " << arguments(r) << " | " << results(r) << " | " << r.summary << " |\n";
   }
 
   sqlite3_close(db);

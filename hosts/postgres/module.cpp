@@ -1,16 +1,16 @@
 // The PostgreSQL extension's module: loading, the reports of statuses and
 // bad arguments, the database information block and the date and time
-// values in the library's text forms.
+// values in the library's text forms, by the calendar's day numbers.
 #include "server.hpp"
 // server.hpp first: PostgreSQL's headers want to come before any other.
-#include <dlfcn.h>
-
 #include <array>
 #include <cstddef>
 #include <cstdint>
 #include <cstdio>
 #include <cstring>
 
+#include "calendar/calendar.hpp"
+#include "common/exports.hpp"
 #include "frame/cliudf.h"
 #include "frame/status.hpp"
 #include "module.hpp"
@@ -25,26 +25,24 @@ PGDLLEXPORT void _PG_init(void);
 
 namespace orv::pg {
 
-std::array<void *, cli::catalogue::kRoutineCount> gExports{};
+host::Exports gExports{};
 
 namespace {
 
-// The library that defines the data export: the one this module was
-// linked with.  Opened again by its path so that every export is found by
-// its name, as an engine finds them.
+// Every export of the catalogue, found by its name in the library that the
+// module was linked with; the module cannot be loaded without all of them.
 void findExports() {
-  Dl_info info{};
-  if (dladdr(&sqlzThisIsAORVLibrary, &info) == 0 || info.dli_fname == nullptr) {
+  const host::Library library = host::openLibrary();
+  if (library.failure == host::Library::Failure::whereabouts) {
     ereport(ERROR, (errmsg("orvclifn: cannot tell where the library was loaded from")));
   }
-  void *library = dlopen(info.dli_fname, RTLD_NOW | RTLD_LOCAL);
-  if (library == nullptr) ereport(ERROR, (errmsg("orvclifn: %s", dlerror())));
-  for (std::size_t i = 0; i < cli::catalogue::kRoutineCount; ++i) {
-    gExports[i] = dlsym(library, cli::catalogue::kRoutines[i].symbol);
-    if (gExports[i] == nullptr) {
-      ereport(ERROR, (errmsg("orvclifn: the library %s has no export %s", info.dli_fname,
-                             cli::catalogue::kRoutines[i].symbol)));
-    }
+  if (library.failure == host::Library::Failure::open) {
+    ereport(ERROR, (errmsg("orvclifn: %s", library.error)));
+  }
+  host::findExports(library, gExports);
+  if (const cli::catalogue::Routine *missing = host::firstMissing(gExports)) {
+    ereport(ERROR,
+            (errmsg("orvclifn: the library %s has no export %s", library.path, missing->symbol)));
   }
 }
 
@@ -55,19 +53,7 @@ const char *functionName(FunctionCallInfo fcinfo) {
 
 int sqlstateCode(const char *s) { return MAKE_SQLSTATE(s[0], s[1], s[2], s[3], s[4]); }
 
-// Days since 1970-01-01 of a date of the proleptic Gregorian calendar (the
-// era-based method: 400-year eras of 146097 days).
-constexpr std::int64_t daysFromCivil(std::int64_t y, unsigned m, unsigned d) {
-  y -= m <= 2 ? 1 : 0;
-  const std::int64_t era = (y >= 0 ? y : y - 399) / 400;
-  const auto yoe = static_cast<unsigned>(y - era * 400);
-  const unsigned doy = (153 * (m > 2 ? m - 3 : m + 9) + 2) / 5 + d - 1;
-  const unsigned doe = yoe * 365 + yoe / 4 - yoe / 100 + doy;
-  return era * 146097 + static_cast<std::int64_t>(doe) - 719468;
-}
-
-// PostgreSQL counts days and microseconds from 2000-01-01.
-constexpr std::int64_t kEpochShift = 10957;  // days from 1970-01-01 to 2000-01-01
+// PostgreSQL counts microseconds from 2000-01-01 too.
 constexpr std::int64_t kDay = USECS_PER_DAY;
 
 void digits(char *out, std::int64_t value, int width) {
@@ -91,35 +77,19 @@ void twoDigits(char *out, std::uint32_t value) {
   std::memcpy(out, &kDigitPairs[2 * std::size_t{value}], 2);
 }
 
-static_assert(kFirstDay == daysFromCivil(1, 1, 1) - kEpochShift);
-static_assert(kLastDay == daysFromCivil(9999, 12, 31) - kEpochShift);
-
 // YYYY-MM-DD for days since 2000-01-01; 0 outside the years 1 to 9999.
-// The hot path of every date argument.  Within those years the days since
-// 0000-03-01 are positive and below 2^22, so the date comes from Neri and
-// Schneider's Euclidean affine functions in unsigned arithmetic: a product
-// and a shift where the era method divides (a year runs from March, so
-// that its leap day comes last).
+// The hot path of every date argument.
 std::size_t writeDate(std::int64_t days, char *out) {
   if (days < kFirstDay || days > kLastDay) return 0;
-  const auto n = static_cast<std::uint32_t>(days + kEpochShift + 719468);
-  const std::uint32_t n1 = 4 * n + 3;
-  const std::uint32_t century = n1 / 146097;
-  const std::uint32_t n2 = n1 % 146097 | 3;
-  const std::uint64_t p2 = std::uint64_t{2939745} * n2;
-  const auto yearOfCentury = static_cast<std::uint32_t>(p2 >> 32);
-  const std::uint32_t dayOfYear = static_cast<std::uint32_t>(p2) / 2939745 / 4;
-  const std::uint32_t n3 = 2141 * dayOfYear + 197913;
-  const bool january = dayOfYear >= 306;  // January or February: the next year
-  const std::uint32_t year = 100 * century + yearOfCentury + (january ? 1 : 0);
-  const std::uint32_t month = (n3 >> 16) - (january ? 12 : 0);
-  const std::uint32_t day = (n3 & 0xffff) / 2141 + 1;
+  const cli::CLI_date date =
+      cli::CLI_dateOfDayNumber(static_cast<std::int32_t>(days) + kDayNumberOfDayZero);
+  const auto year = static_cast<std::uint32_t>(date.year);
   twoDigits(out, year / 100);
   twoDigits(out + 2, year % 100);
   out[4] = '-';
-  twoDigits(out + 5, month);
+  twoDigits(out + 5, static_cast<std::uint32_t>(date.month));
   out[7] = '-';
-  twoDigits(out + 8, day);
+  twoDigits(out + 8, static_cast<std::uint32_t>(date.day));
   return 10;
 }
 
@@ -160,13 +130,18 @@ bool plainAscii(const char *data, std::size_t size) {
   return true;
 }
 
-bool readDigits(const char *p, int width, std::int64_t &out) {
-  out = 0;
-  for (int i = 0; i < width; ++i) {
-    if (p[i] < '0' || p[i] > '9') return false;
-    out = out * 10 + (p[i] - '0');
+// The number that the Width digits at `p` spell; `bad` is set when a byte
+// among them is no digit.  Without a branch per byte: the text is nearly
+// always right.
+template <int Width>
+std::int64_t digitsAt(const char *p, bool &bad) {
+  std::int64_t out = 0;
+  for (int i = 0; i < Width; ++i) {
+    const unsigned digit = static_cast<unsigned char>(p[i]) - unsigned{'0'};
+    bad |= digit > 9;
+    out = out * 10 + digit;
   }
-  return true;
+  return out;
 }
 
 }  // namespace
@@ -243,21 +218,33 @@ std::size_t timestampText(Timestamp stamp, char *out) {
 }
 
 bool timestampOf(const char *text, std::size_t size, Timestamp &out) {
-  std::int64_t y = 0, mo = 0, d = 0, h = 0, mi = 0, s = 0, f = 0;
   if (size != 26 || text[4] != '-' || text[7] != '-' || text[10] != '-' || text[13] != '.' ||
-      text[16] != '.' || text[19] != '.' || !readDigits(text, 4, y) ||
-      !readDigits(text + 5, 2, mo) || !readDigits(text + 8, 2, d) || !readDigits(text + 11, 2, h) ||
-      !readDigits(text + 14, 2, mi) || !readDigits(text + 17, 2, s) ||
-      !readDigits(text + 20, 6, f)) {
+      text[16] != '.' || text[19] != '.') [[unlikely]] {
     return false;
   }
+  // The text comes from the library, which writes the form it should: the
+  // paths that refuse it are the unlikely ones.
+  bool bad = false;
+  const std::int64_t y = digitsAt<4>(text, bad), mo = digitsAt<2>(text + 5, bad),
+                     d = digitsAt<2>(text + 8, bad), mi = digitsAt<2>(text + 14, bad),
+                     s = digitsAt<2>(text + 17, bad), f = digitsAt<6>(text + 20, bad);
+  std::int64_t h = digitsAt<2>(text + 11, bad);
+  if (bad) [[unlikely]]
+    return false;
   // The library ends a day at 24.00.00.000000 (TIMESTAMPTIME of 24:00:00,
   // which PostgreSQL's time takes too): the next day's midnight.
   const bool endOfDay = h == 24 && mi == 0 && s == 0 && f == 0;
   if (endOfDay) h = 0;
-  if (y < 1 || mo < 1 || mo > 12 || d < 1 || d > 31 || h > 23 || mi > 59 || s > 59) return false;
-  const std::int64_t days =
-      daysFromCivil(y, static_cast<unsigned>(mo), static_cast<unsigned>(d)) - kEpochShift;
+  if (y < 1 || mo < 1 || mo > 12 || d < 1 || h > 23 || mi > 59 || s > 59) [[unlikely]] {
+    return false;
+  }
+  const auto year = static_cast<std::int32_t>(y), month = static_cast<std::int32_t>(mo),
+             day = static_cast<std::int32_t>(d);
+  // Every month has 28 days; only the few days beyond look up the month.
+  if (day > 28 && day > cli::CLI_monthLengthTable[cli::CLI_isLeapYear(year)][month]) [[unlikely]] {
+    return false;
+  }
+  const std::int64_t days = cli::CLI_dayNumber(year, month, day) - kDayNumberOfDayZero;
   out = (days + (endOfDay ? 1 : 0)) * kDay + ((h * 60 + mi) * 60 + s) * USECS_PER_SEC + f;
   return true;
 }

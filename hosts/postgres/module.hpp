@@ -5,18 +5,18 @@
 // Include after server.hpp.
 #pragma once
 
-#include <array>
 #include <cstddef>
 #include <cstdint>
 
-#include "catalogue/catalogue.hpp"
+#include "calendar/calendar.hpp"
+#include "common/exports.hpp"
 #include "frame/call.hpp"
 
 namespace orv::pg {
 
 // The export of each catalogue row, found by its name in the library when
 // the module is loaded.
-extern std::array<void *, cli::catalogue::kRoutineCount> gExports;
+extern host::Exports gExports;
 
 // Raises the status that a routine stored as an ERROR: a SYSFUN error with
 // SQLSTATE 38552 and its code in words, any other status with its own
@@ -44,8 +44,14 @@ std::size_t timestampText(Timestamp stamp, char *out);
 // reads it.
 inline constexpr std::size_t kDateSize = 10, kTimeSize = 8, kTimestampSize = 26;
 
+// PostgreSQL counts days from 2000-01-01, the library from day number 1,
+// 0001-01-01.
+inline constexpr std::int32_t kDayNumberOfDayZero = cli::CLI_dayNumber(2000, 1, 1);
+
 // 0001-01-01 and 9999-12-31 in PostgreSQL's days since 2000-01-01.
-inline constexpr std::int64_t kFirstDay = -730119, kLastDay = 2921939;
+inline constexpr std::int64_t kFirstDay = cli::CLI_dayNumber(1, 1, 1) - kDayNumberOfDayZero;
+inline constexpr std::int64_t kLastDay = cli::CLI_dayNumber(9999, 12, 31) - kDayNumberOfDayZero;
+static_assert(kFirstDay == -730119 && kLastDay == 2921939);
 
 inline bool dateFits(DateADT date) {
   return !DATE_NOT_FINITE(date) && date >= kFirstDay && date <= kLastDay;

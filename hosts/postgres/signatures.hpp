@@ -11,8 +11,8 @@
 //  - text reaches the terminated-text form while every text argument fits
 //    (at most 4000 bytes), and the CLI_udfLob form otherwise; a call that
 //    the terminated-text form refuses for a length rule (SYSFUN:10) is
-//    served by the CLI_udfLob form too.  bytea reaches the CLI_udfLob form
-//    only, and gives bytea back.
+//    served by the CLI_udfLob form too (common/forms.hpp).  bytea reaches
+//    the CLI_udfLob form only, and gives bytea back.
 //  - Of two exports of the same layouts, the one that reads its whole text
 //    serves the plain name (see kNarrowerForm).
 //  - The date routines also take date, timestamp, timestamp with time zone
@@ -22,14 +22,14 @@
 //    (left2, ascii3), which reaches that export and no other.
 #pragma once
 
-#include <algorithm>
-#include <cctype>
 #include <cstddef>
 #include <string>
 #include <string_view>
 #include <vector>
 
 #include "catalogue/catalogue.hpp"
+#include "common/forms.hpp"
+#include "common/names.hpp"
 
 namespace orv::pg {
 
@@ -38,6 +38,10 @@ using cat::Frame;
 using cat::kRoutines;
 using cat::Layout;
 using cat::Routine;
+using host::exportName;
+using host::isString;
+using host::lowerCase;
+using host::takesLob;
 
 // The PostgreSQL types that the extension's functions take and give.
 enum class Type : unsigned char {
@@ -109,20 +113,6 @@ struct Signature {
   [[nodiscard]] bool table() const { return !scalar(kRoutines[row()]); }
 };
 
-inline std::string lowerCase(std::string_view s) {
-  std::string out(s);
-  std::transform(out.begin(), out.end(), out.begin(),
-                 [](unsigned char c) { return static_cast<char>(std::tolower(c)); });
-  return out;
-}
-
-// The name of an export by itself: left2 for CLI_udfLEFT2.
-inline std::string exportName(const Routine &r) {
-  std::string_view symbol = r.symbol;
-  if (symbol.starts_with("CLI_udf")) symbol.remove_prefix(7);
-  return lowerCase(symbol);
-}
-
 constexpr Type numberType(Layout l) {
   switch (l) {
     case Layout::int16:
@@ -134,10 +124,6 @@ constexpr Type numberType(Layout l) {
     default:
       return Type::float8;
   }
-}
-
-constexpr bool isString(Layout l) {
-  return l == Layout::text || l == Layout::lob || l == Layout::fixedBytes;
 }
 
 // The PostgreSQL type of an input of `layout` when strings come as `string`.
@@ -165,13 +151,6 @@ inline bool sameShape(const Routine &a, const Routine &b) {
     if (isString(x) != isString(y) || (!isString(x) && x != y)) return false;
   }
   return true;
-}
-
-inline bool takesLob(const Routine &r) {
-  for (std::size_t i = 0; i < cat::inputCount(r); ++i) {
-    if (r.inputs[i].layout == Layout::lob) return true;
-  }
-  return false;
 }
 
 // The date and time types that a date routine's text input also takes,
@@ -216,7 +195,7 @@ inline std::vector<Signature> signatures() {
       done[j] = true;
       std::size_t &slot = takesLob(r) ? lobRow : textRow;
       // Of two rows of one layout, the one that reads its whole text.
-      if (slot == kNoRow || (kRoutines[slot].properties & cat::kNarrowerForm) != 0) slot = j;
+      if (slot == kNoRow || host::narrower(kRoutines[slot])) slot = j;
     }
     const std::string name = lowerCase(first.sqlName);
     const Routine &main = kRoutines[textRow != kNoRow ? textRow : lobRow];

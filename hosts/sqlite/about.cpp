@@ -12,7 +12,7 @@ SQLITE_EXTENSION_INIT3
 #include "about.hpp"
 #include "module.hpp"
 
-namespace orv::host {
+namespace orv::sqlite {
 namespace {
 
 // One row of sysfun_functions.
@@ -164,4 +164,4 @@ int registerAbout(sqlite3 *db, const std::vector<Group> &groups, const std::vect
                                     version, nullptr, nullptr, nullptr);
 }
 
-}  // namespace orv::host
+}  // namespace orv::sqlite

@@ -8,10 +8,10 @@
 
 struct sqlite3;
 
-namespace orv::host {
+namespace orv::sqlite {
 
 // Registers both; `plain[g]` tells whether group g also has its plain
 // name on this connection.  SQLite result code.
 int registerAbout(sqlite3 *db, const std::vector<Group> &groups, const std::vector<bool> &plain);
 
-}  // namespace orv::host
+}  // namespace orv::sqlite

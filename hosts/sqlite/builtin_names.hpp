@@ -9,7 +9,7 @@
 #include <string>
 #include <utility>
 
-namespace orv::host {
+namespace orv::sqlite {
 
 class KnownFunctions {
  public:
@@ -48,4 +48,4 @@ class KnownFunctions {
   bool asked_ = false;
 };
 
-}  // namespace orv::host
+}  // namespace orv::sqlite

@@ -10,8 +10,9 @@
 #include <string>
 
 #include "catalogue/catalogue.hpp"
+#include "common/exports.hpp"
 
-namespace orv::host {
+namespace orv::sqlite {
 
 // A buffer that grows to the largest size asked of it and is kept for the
 // connection's life, so that long strings cost no allocation per row.
@@ -34,7 +35,7 @@ class Area {
 // areas for CLI_udfLob arguments and results.  Shared by all of the
 // connection's functions and freed with the last of them.
 struct Connection {
-  std::array<void *, cli::catalogue::kRoutineCount> exports{};
+  host::Exports exports{};
   std::array<Area, cli::catalogue::kMaxInputs> lobInputs;
   Area lobResult;
   int functions = 0;
@@ -59,4 +60,4 @@ struct Function {
 using Entry = void (*)(sqlite3_context *context, int argc, sqlite3_value **argv);
 extern const std::array<Entry, cli::catalogue::kRoutineCount> kEntries;
 
-}  // namespace orv::host
+}  // namespace orv::sqlite

@@ -2,14 +2,13 @@
 // function, registered from the catalogue.
 //
 // The extension plays the engine's part.  It finds each export by its name
-// in the library and registers one SQL function per name and argument
-// count (registry.hpp); the call path (forms.cpp) lays the SQL arguments
-// out in the export's value layouts, calls it through the frame caller and
-// turns the result, or the status, into an SQLite result or error.
+// in the library (common/exports.hpp) and registers one SQL function per
+// name and argument count (registry.hpp); the call path (forms.cpp) lays
+// the SQL arguments out in the export's value layouts, calls it
+// (common/call.hpp) and turns the result, or the status, into an SQLite
+// result or error.
 #include <sqlite3ext.h>
 SQLITE_EXTENSION_INIT1
-
-#include <dlfcn.h>
 
 #include <memory>
 #include <mutex>
@@ -20,18 +19,17 @@ SQLITE_EXTENSION_INIT1
 
 #include "about.hpp"
 #include "builtin_names.hpp"
+#include "common/exports.hpp"
 #include "connection.hpp"
-#include "frame/cliudf.h"
 #include "registry.hpp"
 #include "tables.hpp"
 
 namespace {
 
-using cli::catalogue::kRoutineCount;
 using cli::catalogue::kRoutines;
-using orv::host::Connection;
-using orv::host::Function;
-using orv::host::KindMask;
+using orv::sqlite::Connection;
+using orv::sqlite::Function;
+using orv::sqlite::KindMask;
 
 void release(void *p) {
   const auto *f = static_cast<Function *>(p);
@@ -40,21 +38,7 @@ void release(void *p) {
   if (--connection->functions == 0) delete connection;
 }
 
-// The library that defines the data export: the one this extension was
-// linked with.  Opened again by its path so that exports are found by
-// name, as an engine finds them.
-void *openLibrary(char **error) {
-  Dl_info info{};
-  if (dladdr(&sqlzThisIsAORVLibrary, &info) == 0 || info.dli_fname == nullptr) {
-    *error = sqlite3_mprintf("orvclifn: cannot tell where the library was loaded from");
-    return nullptr;
-  }
-  void *library = dlopen(info.dli_fname, RTLD_NOW | RTLD_LOCAL);
-  if (library == nullptr) *error = sqlite3_mprintf("orvclifn: %s", dlerror());
-  return library;
-}
-
-int registerFunction(sqlite3 *db, const std::string &name, const orv::host::Group &g,
+int registerFunction(sqlite3 *db, const std::string &name, const orv::sqlite::Group &g,
                      Connection *connection) {
   auto f = std::make_unique<Function>();
   f->connection = connection;
@@ -69,44 +53,53 @@ int registerFunction(sqlite3 *db, const std::string &name, const orv::host::Grou
   for (int i = 0; i < g.argumentCount; ++i) {
     if (!orv::host::isNumber(kRoutines[g.rows[0]].inputs[i].layout)) f->stringArguments |= 1u << i;
   }
-  for (KindMask m = 0; m < f->formFor.size(); ++m) f->formFor[m] = orv::host::chooseForm(g, m);
+  for (KindMask m = 0; m < f->formFor.size(); ++m) f->formFor[m] = orv::sqlite::chooseForm(g, m);
   for (int i = 0; i < g.argumentCount; ++i) {
     f->argumentNames[static_cast<std::size_t>(i)] = kRoutines[g.rows[0]].inputs[i].name;
   }
-  f->longerForm = orv::host::longerForm(g);
+  f->longerForm = orv::sqlite::longerForm(g);
 
   // Every group takes plain arguments (short text, integers); the row they
   // reach names the SQL function's entry.
   const int usual = f->formFor[0];
-  if (usual == orv::host::kNoForm) return SQLITE_INTERNAL;
+  if (usual == orv::sqlite::kNoForm) return SQLITE_INTERNAL;
 
   int flags = SQLITE_UTF8;
   if (properties & cli::catalogue::kDeterministic) flags |= SQLITE_DETERMINISTIC;
   flags |= (properties & cli::catalogue::kInnocuous) ? SQLITE_INNOCUOUS : SQLITE_DIRECTONLY;
   ++connection->functions;
   return sqlite3_create_function_v2(db, name.c_str(), g.argumentCount, flags, f.release(),
-                                    orv::host::kEntries[static_cast<std::size_t>(usual)], nullptr,
+                                    orv::sqlite::kEntries[static_cast<std::size_t>(usual)], nullptr,
                                     nullptr, release);
 }
 
 int initialise(sqlite3 *db, char **error) {
-  void *library = openLibrary(error);
-  if (library == nullptr) return SQLITE_ERROR;
-
-  auto connection = std::make_unique<Connection>();
-  for (std::size_t row = 0; row < kRoutineCount; ++row) {
-    if (!orv::host::hostable(kRoutines[row])) continue;
-    connection->exports[row] = dlsym(library, kRoutines[row].symbol);
-    if (connection->exports[row] == nullptr) {
-      *error = sqlite3_mprintf("orvclifn: the library has no export %s", kRoutines[row].symbol);
-      return SQLITE_ERROR;
-    }
+  const orv::host::Library library = orv::host::openLibrary();
+  if (library.failure == orv::host::Library::Failure::whereabouts) {
+    *error = sqlite3_mprintf("orvclifn: cannot tell where the library was loaded from");
+    return SQLITE_ERROR;
   }
+  if (library.failure == orv::host::Library::Failure::open) {
+    *error = sqlite3_mprintf("orvclifn: %s", library.error);
+    return SQLITE_ERROR;
+  }
+
+  orv::host::Exports exports{};
+  orv::host::findExports(library, exports);
+  // The scalar functions' exports first; the tables' are asked for when
+  // they are registered.
+  if (const cli::catalogue::Routine *missing =
+          orv::host::firstMissing(exports, orv::sqlite::hostable)) {
+    *error = sqlite3_mprintf("orvclifn: the library has no export %s", missing->symbol);
+    return SQLITE_ERROR;
+  }
+  auto connection = std::make_unique<Connection>();
+  connection->exports = exports;
 
   // Decide on the plain names before registering anything, so that our own
   // functions don't hide a name from the check.
-  static const std::vector<orv::host::Group> groups = orv::host::groups();
-  const orv::host::KnownFunctions known(db);
+  static const std::vector<orv::sqlite::Group> groups = orv::sqlite::groups();
+  const orv::sqlite::KnownFunctions known(db);
   std::vector<bool> plain(groups.size());
   for (std::size_t g = 0; g < groups.size(); ++g) {
     plain[g] = !groups[g].plainName.empty() &&
@@ -123,12 +116,12 @@ int initialise(sqlite3 *db, char **error) {
       rc = registerFunction(db, groups[g].plainName, groups[g], shared);
   }
   if (--shared->functions == 0) delete shared;
-  if (rc == SQLITE_OK) rc = orv::host::registerAbout(db, groups, plain);
+  if (rc == SQLITE_OK) rc = orv::sqlite::registerAbout(db, groups, plain);
   if (rc != SQLITE_OK) {
     *error = sqlite3_mprintf("orvclifn: %s", sqlite3_errmsg(db));
     return rc;
   }
-  return orv::host::registerTables(db, library, error);
+  return orv::sqlite::registerTables(db, exports, error);
 }
 
 }  // namespace

@@ -5,26 +5,27 @@
 #include <sqlite3ext.h>
 SQLITE_EXTENSION_INIT3
 
-#include <algorithm>
 #include <array>
 #include <cstdint>
 #include <cstring>
 #include <new>
-#include <tuple>
+#include <type_traits>
 #include <utility>
 
 #include "arguments.hpp"
+#include "common/call.hpp"
 #include "connection.hpp"
 #include "frame/call.hpp"
 #include "frame/cliudf.h"
 #include "registry.hpp"
 
-namespace orv::host {
+namespace orv::sqlite {
 namespace {
 
 using cli::catalogue::Frame;
 using cli::catalogue::kRoutineCount;
 using cli::catalogue::Routine;
+using host::Outcome;
 
 // Turns the status that a routine stored into an SQLite error: a SYSFUN
 // error with its code in words, any other status with its message.
@@ -49,13 +50,11 @@ void reportStatus(const Call &c, const cli::call::StatusBuffers &status) {
 // only as auxiliary data of an argument, and keeps it across rows only
 // while that argument is a constant; with a varying argument each row gets
 // a fresh scratchpad.
-constexpr std::size_t kScratchpadSize = 4 + 100;
-
 unsigned char *statementScratchpad(sqlite3_context *context) {
   if (auto *kept = static_cast<unsigned char *>(sqlite3_get_auxdata(context, 0))) return kept;
-  auto *fresh = static_cast<unsigned char *>(sqlite3_malloc(kScratchpadSize));
+  auto *fresh = static_cast<unsigned char *>(sqlite3_malloc(CLI_SCRATCHPAD_SIZE));
   if (fresh == nullptr) return nullptr;
-  std::memset(fresh, 0, kScratchpadSize);
+  std::memset(fresh, 0, CLI_SCRATCHPAD_SIZE);
   sqlite3_set_auxdata(context, 0, fresh, sqlite3_free);
   // set_auxdata frees the block at once when it cannot keep it; ask again.
   return static_cast<unsigned char *>(sqlite3_get_auxdata(context, 0));
@@ -71,58 +70,62 @@ alignas(8) std::array<unsigned char, 512> kDatabaseInfo = [] {
   return block;
 }();
 
+// One call of the export of `Row`, its result or error given to SQLite,
+// but nothing yet where it refuses the call for a length rule and the
+// call has a long form (Call::longForm).  An argument that cannot be laid
+// out is reported, as Outcome::status.
 template <std::size_t Row, std::size_t... Is>
-[[gnu::always_inline]] inline void callRow(const Call &c, std::index_sequence<Is...>) {
+[[gnu::always_inline]] inline Outcome callRow(const Call &c, std::index_sequence<Is...>) {
   constexpr const Routine &r = kRoutines[Row];
-  constexpr std::size_t n = sizeof...(Is);
-  std::tuple<InputOf<Row, Is>...> inputs;
-  Result<r.results[0].layout, r.results[0].size> result;
-  std::array<std::int16_t, n + 1> inputIndicators{};
-  std::int16_t resultIndicator = 0;
+  host::ScalarCall<Row, true> call;
 
   // NULL reaches the routine only when it reads its indicators itself.
-  [[maybe_unused]] const auto load = [&](auto &input, int i) {
-    if (c.arguments[static_cast<std::size_t>(i)].type == SQLITE_NULL) {
-      inputIndicators[static_cast<std::size_t>(i)] = -1;
+  [[maybe_unused]] const auto load = [&]<std::size_t I>(std::integral_constant<std::size_t, I>) {
+    if (c.arguments[I].type == SQLITE_NULL) {
+      call.template setNull<I>();
       return true;
     }
-    return input.load(c, Row, i);
+    return orv::sqlite::load(c, Row, static_cast<int>(I), call.template input<I>());
   };
-  if (!(load(std::get<Is>(inputs), static_cast<int>(Is)) && ...)) return;
-  if (!result.prepare(c)) return;
+  if (!(load(std::integral_constant<std::size_t, Is>{}) && ...)) return Outcome::status;
+  call.result.prepare([&c](std::size_t size) { return c.connection.lobResult.get(size); });
 
-  void *values[] = {std::get<Is>(inputs).pointer()..., nullptr};
-  void *results[] = {result.pointer()};
-  std::int16_t *inputNulls[] = {&inputIndicators[Is]..., nullptr};
-  std::int16_t *resultNulls[] = {&resultIndicator};
-  cli::call::StatusBuffers status;
-  cli::call::Frame f = cli::call::frameOf(r, values, results, inputNulls, resultNulls, status);
-  if constexpr (r.frame == Frame::dbinfo) f.dbinfo = kDatabaseInfo.data();
+  [[maybe_unused]] const void *dbinfo = nullptr;
+  [[maybe_unused]] void *scratchpad = nullptr;
+  if constexpr (r.frame == Frame::dbinfo) dbinfo = kDatabaseInfo.data();
   if constexpr (r.frame == Frame::scratchpad) {
-    f.scratchpad = statementScratchpad(c.context);
-    if (f.scratchpad == nullptr) return sqlite3_result_error_nomem(c.context);
-  }
-  cli::call::call<Row>(c.connection.exports[Row], f);
-
-  if (status.stored()) {
-    if (c.mayGrow && cli::call::sysfunIn(status.sqlstate, status.message) == cli::Sysfun::tooLong) {
-      c.refusedForLength = true;  // the caller tries the CLI_udfLob form
-      return;
+    scratchpad = statementScratchpad(c.context);
+    if (scratchpad == nullptr) {
+      sqlite3_result_error_nomem(c.context);
+      return Outcome::status;
     }
-    reportStatus(c, status);
-  } else if (resultIndicator < 0) {
-    sqlite3_result_null(c.context);
-  } else {
-    result.deliver(c);
   }
+  call.run(c.connection.exports[Row], dbinfo, scratchpad);
+  // Each case gives back its own Outcome, a constant where it returns.
+  switch (call.outcome(c.longForm)) {
+    case Outcome::value:
+      deliver(c, call.result);
+      return Outcome::value;
+    case Outcome::null:
+      sqlite3_result_null(c.context);
+      return Outcome::null;
+    case Outcome::status:
+      break;
+    case Outcome::refusedForLength:
+      return Outcome::refusedForLength;  // the caller tries the CLI_udfLob form
+  }
+  reportStatus(c, call.status);
+  return Outcome::status;
 }
 
-using RowCall = void (*)(const Call &);
+using RowCall = Outcome (*)(const Call &);
 
 template <std::size_t Row>
-[[gnu::always_inline]] inline void callRow(const Call &c) {
-  if constexpr (orv::host::hostable(kRoutines[Row])) {
-    callRow<Row>(c, std::make_index_sequence<inputCount(kRoutines[Row])>{});
+[[gnu::always_inline]] inline Outcome callRow(const Call &c) {
+  if constexpr (orv::sqlite::hostable(kRoutines[Row])) {
+    return callRow<Row>(c, std::make_index_sequence<inputCount(kRoutines[Row])>{});
+  } else {
+    return Outcome::status;  // never registered
   }
 }
 
@@ -161,28 +164,28 @@ namespace {
     return true;
   }
   if (a.type == SQLITE_BLOB) {
-    a.bytes = static_cast<const unsigned char *>(sqlite3_value_blob(v));
+    a.bytes = static_cast<const char *>(sqlite3_value_blob(v));
     call.blobResult = call.blobResult || firstString;
   } else {
-    a.bytes = sqlite3_value_text(v);
+    a.bytes = reinterpret_cast<const char *>(sqlite3_value_text(v));
   }
   a.size = static_cast<std::size_t>(sqlite3_value_bytes(v));
-  a.fitsText = a.type != SQLITE_BLOB && a.size <= kTextLimit && !holdsNul(a.bytes, a.size);
+  a.fitsText = a.type != SQLITE_BLOB && host::fitsText(a.bytes, a.size);
   if (!a.fitsText) mask |= bit;
   firstString = false;
   return true;
 }
 
-// Calls `row`, and, where it refuses the call only for a length rule, the
-// CLI_udfLob form `wide`, whose error is the one reported if it fails too.
+// Calls a form through `first`, and, where it refuses the call only for a
+// length rule, the CLI_udfLob form `wide`, whose error is the one reported
+// if it fails too.
 template <class First>
-void callWithRetry(Call &call, First first, int wide) {
+[[gnu::always_inline]] inline void callWithRetry(Call &call, First first, int wide) {
   try {
-    first(call);
-    if (call.refusedForLength) {
-      call.mayGrow = false;
-      kRowCalls[static_cast<std::size_t>(wide)](call);
-    }
+    host::withLongForm(first, [&call, wide] {
+      call.longForm = false;
+      return kRowCalls[static_cast<std::size_t>(wide)](call);
+    });
   } catch (const std::bad_alloc &) {
     sqlite3_result_error_nomem(call.context);
   }
@@ -193,7 +196,7 @@ void callWithRetry(Call &call, First first, int wide) {
 void callForm(Call &call, int argc, KindMask mask) {
   const Function &f = call.function;
   const int row = f.formFor[mask];
-  if (row == orv::host::kNoForm) {
+  if (row == orv::sqlite::kNoForm) {
     // The first string argument that terminated text cannot carry.
     for (int i = 0; i < argc; ++i) {
       const Argument &a = call.arguments[static_cast<std::size_t>(i)];
@@ -205,8 +208,9 @@ void callForm(Call &call, int argc, KindMask mask) {
   }
   // The form follows what fits: see callWithRetry.
   const int wide = f.formFor[mask | f.stringArguments];
-  call.mayGrow = wide != row && wide != orv::host::kNoForm;
-  callWithRetry(call, kRowCalls[static_cast<std::size_t>(row)], wide);
+  call.longForm = wide != row && wide != orv::sqlite::kNoForm;
+  callWithRetry(
+      call, [&call, row] { return kRowCalls[static_cast<std::size_t>(row)](call); }, wide);
 }
 
 // The SQL function of a name whose plain arguments reach `Row`: the
@@ -227,9 +231,9 @@ void entryWith(sqlite3_context *context, sqlite3_value **argv, std::index_sequen
     return callForm(call, static_cast<int>(sizeof...(Is)), mask);
   }
   const int wide = f.formFor[mask | f.stringArguments];
-  call.mayGrow = wide != static_cast<int>(Row) && wide != orv::host::kNoForm;
+  call.longForm = wide != static_cast<int>(Row) && wide != orv::sqlite::kNoForm;
   callWithRetry(
-      call, [](const Call &c) { callRow<Row>(c); }, wide);
+      call, [&call]() __attribute__((always_inline)) { return callRow<Row>(call); }, wide);
 }
 
 template <std::size_t Row>
@@ -239,7 +243,7 @@ void entry(sqlite3_context *context, int /*argc*/, sqlite3_value **argv) {
 
 template <std::size_t Row>
 constexpr Entry entryOf() {
-  if constexpr (orv::host::hostable(kRoutines[Row])) {
+  if constexpr (orv::sqlite::hostable(kRoutines[Row])) {
     return &entry<Row>;
   } else {
     return nullptr;
@@ -256,4 +260,4 @@ constexpr std::array<Entry, sizeof...(Rows)> entries(std::index_sequence<Rows...
 const std::array<Entry, kRoutineCount> kEntries =
     entries(std::make_index_sequence<kRoutineCount>{});
 
-}  // namespace orv::host
+}  // namespace orv::sqlite

@@ -5,7 +5,7 @@
 // Include after sqlite3ext.h.
 #pragma once
 
-namespace orv::host {
+namespace orv::sqlite {
 
 using Connect = decltype(sqlite3_module::xConnect);
 using BestIndex = decltype(sqlite3_module::xBestIndex);
@@ -35,4 +35,4 @@ inline sqlite3_module readOnlyModule(Connect connect, BestIndex bestIndex, Disco
   return m;
 }
 
-}  // namespace orv::host
+}  // namespace orv::sqlite

@@ -15,19 +15,23 @@
 #pragma once
 
 #include <algorithm>
-#include <cctype>
 #include <cstddef>
 #include <string>
+#include <string_view>
 #include <vector>
 
 #include "catalogue/catalogue.hpp"
+#include "common/forms.hpp"
+#include "common/names.hpp"
 
-namespace orv::host {
+namespace orv::sqlite {
 
 using cli::catalogue::Frame;
 using cli::catalogue::kRoutines;
 using cli::catalogue::Layout;
 using cli::catalogue::Routine;
+using host::isNumber;
+using host::lowerCase;
 
 // Frames that the host knows how to call.
 constexpr bool hostable(const Routine &r) {
@@ -36,10 +40,6 @@ constexpr bool hostable(const Routine &r) {
   const bool frameKnown = r.frame == Frame::plain || r.frame == Frame::dbinfo ||
                           (r.frame == Frame::scratchpad && inputCount(r) >= 1);
   return frameKnown && resultCount(r) == 1;
-}
-
-constexpr bool isNumber(Layout l) {
-  return l == Layout::int16 || l == Layout::int32 || l == Layout::int64 || l == Layout::real;
 }
 
 // Functions of one name and argument count must agree on which arguments
@@ -57,21 +57,10 @@ consteval bool argumentClassesAgree() {
 }
 static_assert(argumentClassesAgree());
 
-inline std::string lowerCase(std::string_view s) {
-  std::string out(s);
-  std::transform(out.begin(), out.end(), out.begin(),
-                 [](unsigned char c) { return static_cast<char>(std::tolower(c)); });
-  return out;
-}
-
 inline constexpr std::string_view kPrefix = "sysfun_";
 
-// The name of an export by itself: sysfun_left2 for CLI_udfLEFT2.
-inline std::string exportName(const Routine &r) {
-  std::string_view symbol = r.symbol;
-  if (symbol.starts_with("CLI_udf")) symbol.remove_prefix(7);
-  return std::string(kPrefix) + lowerCase(symbol);
-}
+// The SQL name of an export by itself: sysfun_left2 for CLI_udfLEFT2.
+inline std::string ownName(const Routine &r) { return std::string(kPrefix) + host::exportName(r); }
 
 // A layout in words: an argument's ("text"), or a result's, with its size
 // ("text of at most 4000 bytes").
@@ -128,7 +117,7 @@ inline std::vector<Group> groups() {
   const std::size_t functions = out.size();
   for (std::size_t g = 0; g < functions; ++g) {
     for (std::size_t i : out[g].rows) {
-      std::string own = exportName(kRoutines[i]);
+      std::string own = ownName(kRoutines[i]);
       if (own != out[g].sysfunName) out.push_back({own, own, "", out[g].argumentCount, {i}});
     }
   }
@@ -143,9 +132,7 @@ inline std::string longerForm(const Group &g) {
   const Routine &own = kRoutines[g.rows[0]];
   for (const Routine &r : kRoutines) {
     if (std::string_view(r.sqlName) != own.sqlName || inputCount(r) != inputCount(own)) continue;
-    for (std::size_t i = 0; i < inputCount(r); ++i) {
-      if (r.inputs[i].layout == Layout::lob) return exportName(r);
-    }
+    if (host::takesLob(r)) return ownName(r);
   }
   return "";
 }
@@ -188,8 +175,8 @@ constexpr int cost(Layout layout, bool numberArgument, bool maskBit) {
 // The export that serves a call with these kinds: integers go to the
 // widest integer form, reals to the double form, short text to the
 // terminated-text form and anything longer to the CLI_udfLob form.  Of two
-// exports with the same layouts the one that reads more of its text wins.  kNoForm when no form can
-// take the arguments.
+// exports with the same layouts the one that reads more of its text wins
+// (common/forms.hpp).  kNoForm when no form can take the arguments.
 inline int chooseForm(const Group &g, KindMask mask) {
   int best = kNoForm;
   int bestCost = 0;
@@ -201,7 +188,7 @@ inline int chooseForm(const Group &g, KindMask mask) {
       const int c = cost(l, isNumber(l), ((mask >> i) & 1u) != 0);
       total = c < 0 ? -1 : total + c;
     }
-    if (total >= 0 && (r.properties & cli::catalogue::kNarrowerForm) != 0) ++total;
+    if (total >= 0 && host::narrower(r)) ++total;
     if (total >= 0 && (best == kNoForm || total < bestCost)) {
       best = static_cast<int>(row);
       bestCost = total;
@@ -210,4 +197,4 @@ inline int chooseForm(const Group &g, KindMask mask) {
   return best;
 }
 
-}  // namespace orv::host
+}  // namespace orv::sqlite

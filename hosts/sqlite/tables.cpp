@@ -11,22 +11,21 @@
 #include <sqlite3ext.h>
 SQLITE_EXTENSION_INIT3
 
-#include <dlfcn.h>
-
-#include <cmath>
 #include <cstdint>
 #include <memory>
 #include <string>
 #include <string_view>
 
 #include "catalogue/catalogue.hpp"
+#include "common/layouts.hpp"
+#include "common/names.hpp"
 #include "fmp_tables.hpp"
 #include "frame/table_call.hpp"
 #include "module.hpp"
 #include "registry.hpp"
 #include "tables.hpp"
 
-namespace orv::host {
+namespace orv::sqlite {
 namespace {
 
 using cli::catalogue::Frame;
@@ -134,7 +133,7 @@ Hidden hiddenInput(sqlite3_vtab_cursor *cur, sqlite3_value *v, std::int32_t &out
       return Hidden::null;
     case SQLITE_INTEGER: {
       const sqlite3_int64 x = sqlite3_value_int64(v);
-      if (x >= INT32_MIN && x <= INT32_MAX) {
+      if (host::fitsInteger<std::int32_t>(x)) {
         out = static_cast<std::int32_t>(x);
         return Hidden::value;
       }
@@ -144,7 +143,7 @@ Hidden hiddenInput(sqlite3_vtab_cursor *cur, sqlite3_value *v, std::int32_t &out
     }
     case SQLITE_FLOAT: {
       const double d = sqlite3_value_double(v);
-      if (d == std::trunc(d) && d >= INT32_MIN && d <= INT32_MAX) {
+      if (host::wholeInteger<std::int32_t>(d)) {
         out = static_cast<std::int32_t>(d);
         return Hidden::value;
       }
@@ -247,12 +246,12 @@ void releaseModule(void *module) { delete static_cast<Module *>(module); }
 
 }  // namespace
 
-int registerTables(sqlite3 *db, void *library, char **error) {
+int registerTables(sqlite3 *db, const host::Exports &exports, char **error) {
   for (std::size_t row = 0; row < std::size(kRoutines); ++row) {
     const Routine &r = kRoutines[row];
     const bool table = r.frame == Frame::table || r.frame == Frame::tableCallback;
     if (!table) continue;
-    void *routine = dlsym(library, r.symbol);
+    void *routine = exports[row];
     if (routine == nullptr) {
       *error = sqlite3_mprintf("orvclifn: the library has no export %s", r.symbol);
       return SQLITE_ERROR;
@@ -273,4 +272,4 @@ int registerTables(sqlite3 *db, void *library, char **error) {
   return SQLITE_OK;
 }
 
-}  // namespace orv::host
+}  // namespace orv::sqlite

@@ -1,8 +1,10 @@
 // Day arithmetic of the proleptic Gregorian calendar, years 1 to 9999.
 //
 // Day number 1 is 0001-01-01, a Monday; 9999-12-31 is day 3652059.  Every
-// function takes a date that a parser has already validated and needs no
-// range checks.  No intermediate value comes near 32 bits.
+// function takes a date that a parser has already validated (or a day
+// number of those years) and needs no range checks.  No intermediate value
+// comes near 32 bits but the one product that CLI_dateOfDayNumber takes
+// in 64 bits.
 #pragma once
 
 #include <cstdint>
@@ -97,6 +99,52 @@ constexpr std::int32_t CLI_dayNumber(std::int32_t year, std::int32_t month, std:
   return CLI_daysBeforeYear(year) + CLI_dayOfYear(year, month, day);
 }
 
+// A date by its fields.
+struct CLI_date {
+  std::int32_t year, month, day;
+  friend constexpr bool operator==(const CLI_date &, const CLI_date &) = default;
+};
+
+// The date of a day number, 1 to 3652059: the inverse of CLI_dayNumber.
+// Counted from 0000-03-01 (day number -305), so that a year runs from
+// March and its leap day comes last, Neri and Schneider's Euclidean affine
+// functions find the century, the year in it and the day in the year with
+// a product and a shift where a division by 1461 or 153 would stand.  The
+// count stays below 2^22, so all of it is unsigned 32-bit arithmetic but
+// the one 64-bit product.
+constexpr CLI_date CLI_dateOfDayNumber(std::int32_t dayNumber) {
+  const auto n = static_cast<std::uint32_t>(dayNumber + 305);
+  const std::uint32_t n1 = 4 * n + 3;
+  const std::uint32_t century = n1 / 146097;
+  const std::uint32_t n2 = n1 % 146097 | 3;
+  const std::uint64_t p2 = std::uint64_t{2939745} * n2;
+  const auto yearOfCentury = static_cast<std::uint32_t>(p2 >> 32);
+  const std::uint32_t dayOfYear = static_cast<std::uint32_t>(p2) / 2939745 / 4;
+  const std::uint32_t n3 = 2141 * dayOfYear + 197913;
+  const bool january = dayOfYear >= 306;  // January or February: the next year
+  return {static_cast<std::int32_t>(100 * century + yearOfCentury + (january ? 1 : 0)),
+          static_cast<std::int32_t>((n3 >> 16) - (january ? 12 : 0)),
+          static_cast<std::int32_t>((n3 & 0xffff) / 2141 + 1)};
+}
+
+// The first and the last day of every month of the first 400 years, which
+// the later ones repeat day for day, and of the last year come back from
+// their day numbers.
+consteval bool dateOfDayNumberInvertsDayNumber() {
+  for (std::int32_t y = 1; y <= 401; ++y) {
+    const std::int32_t year = y == 401 ? 9999 : y;
+    for (std::int32_t m = 1; m <= 12; ++m) {
+      const std::int32_t last = CLI_monthLengthTable[CLI_isLeapYear(year)][m];
+      if (CLI_dateOfDayNumber(CLI_dayNumber(year, m, 1)) != CLI_date{year, m, 1} ||
+          CLI_dateOfDayNumber(CLI_dayNumber(year, m, last)) != CLI_date{year, m, last}) {
+        return false;
+      }
+    }
+  }
+  return true;
+}
+static_assert(dateOfDayNumberInvertsDayNumber());
+
 // The table holds what its rule says: the months before m, plus d, with 0
 // for days that no year has.
 consteval bool dayOfYearTableFollowsItsRule() {
@@ -127,5 +175,11 @@ static_assert(CLI_dayNumber(2000, 2, 29) == 730179 && CLI_dayNumber(2000, 3, 1) 
 static_assert(CLI_dayNumber(9999, 12, 31) == 3652059);
 static_assert(CLI_dayNumber(9999, 12, 31) + kJulianDayOfDayZero == 5373484);
 static_assert(CLI_dayOfYear(2000, 12, 31) == 366 && CLI_dayOfYear(2001, 12, 31) == 365);
+static_assert(CLI_dateOfDayNumber(1) == CLI_date{1, 1, 1});
+static_assert(CLI_dateOfDayNumber(1155) == CLI_date{4, 2, 29});
+static_assert(CLI_dateOfDayNumber(719163) == CLI_date{1970, 1, 1});
+static_assert(CLI_dateOfDayNumber(730179) == CLI_date{2000, 2, 29});
+static_assert(CLI_dateOfDayNumber(730180) == CLI_date{2000, 3, 1});
+static_assert(CLI_dateOfDayNumber(3652059) == CLI_date{9999, 12, 31});
 
 }  // namespace cli

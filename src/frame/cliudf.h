@@ -60,6 +60,8 @@ typedef struct CLI_udfLob {
 
 /* The scratchpad's first word belongs to the engine; routine data follows. */
 #define CLI_SCRATCHPAD_DATA_OFFSET 4
+/* Bytes of a scalar routine's scratchpad: the engine's word and 100 bytes of data. */
+#define CLI_SCRATCHPAD_SIZE (CLI_SCRATCHPAD_DATA_OFFSET + 100)
 /* Byte offset of the database code page in the database information block. */
 #define CLI_DBINFO_CODEPAGE_OFFSET 268
 

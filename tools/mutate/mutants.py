@@ -18,7 +18,7 @@ from pathlib import Path
 # from the library's.
 LIBRARY_FOLDERS = ("src/calendar", "src/datetime", "src/numeric", "src/string", "src/engine",
                    "src/frame")
-HOST_FOLDERS = ("hosts/sqlite", "hosts/postgres")
+HOST_FOLDERS = ("hosts/common", "hosts/sqlite", "hosts/postgres")
 FOLDERS = LIBRARY_FOLDERS + HOST_FOLDERS
 
 KINDS = ("relational", "constant", "arithmetic", "logical", "negate", "branch", "bound")
